@@ -1,0 +1,50 @@
+/**
+ * @file
+ * The API lock and the toolkit's registries, for class operations. All but the lock functions expect
+ * the lock to be held.
+ */
+#ifndef QLX_CLASS_TOOLKIT_H
+#define QLX_CLASS_TOOLKIT_H
+
+#include <qlx/types.h>
+
+QLX_BEGIN_DECLS
+
+/**
+ * Takes the API lock, made by the first call. The lock is not recursive: the thread that holds it
+ * must call nothing that takes it.
+ *
+ * @return 1 when the lock is held, 0 when it cannot be made or taken
+ */
+QLX_API uint8_t qlxAPIMutexLock(void);
+
+/** Releases the API lock; without one does nothing. */
+QLX_API void qlxAPIMutexUnlock(void);
+
+/** @return the toolkit logger, borrowed; null while the toolkit is closed */
+QLX_API QlxObject *qlxToolkitLogger(void);
+
+/** @return the registered class, borrowed, or null; null for a null name */
+QLX_API ObjClass *qlxToolkitGetClassDef(const char *className);
+
+/** Registers a class record, which the registry then owns; a null record is ignored. */
+QLX_API void qlxToolkitAddClassDef(const char *className, ObjClass *objClass);
+
+/** Makes the registries and registers the built-in classes, once. */
+QLX_API void qlxToolkitInitObjClasses(void);
+
+/** @return an iterator over the class names of a kind; null (empty) for any other number */
+QLX_API StringGroupNode *qlxToolkitFetchClassnames(int32_t kind);
+
+/** Registers an object; the registry takes a reference. Null name or object: ignored. */
+QLX_API void qlxToolkitAddObjInstance(const char *objectName, QlxObject *object);
+
+/** @return the object of that name with a reference for the caller, or null */
+QLX_API QlxObject *qlxToolkitGetObjInstance(const char *objectName);
+
+/** Removes a name and releases the registry's reference; an unknown name is ignored. */
+QLX_API void qlxToolkitRemObjInstance(const char *objectName);
+
+QLX_END_DECLS
+
+#endif

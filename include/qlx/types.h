@@ -1,7 +1,8 @@
 /**
  * @file
- * The plain types that the subsystems share. Records are open: hosts and host classes read and write
- * their fields. A field says unit, owner, initial value and who changes it where that is not plain.
+ * The plain types that the subsystems share. Records are open: hosts and host classes read and
+ * write their fields. A field says unit, owner, initial value and who changes it where that is not
+ * plain.
  *
  * "Owned" means: allocated with OslMemoryMalloc() and freed together with the record.
  */
@@ -21,8 +22,8 @@ typedef struct CxStatus {
   int32_t code; /**< 0 on success, else the system's error number */
 } CxStatus;
 
-typedef int32_t CxFile;          /**< a file descriptor; -1 is closed */
-typedef void *CxDirectory;       /**< an open directory; null is closed */
+typedef int32_t CxFile;           /**< a file descriptor; -1 is closed */
+typedef void *CxDirectory;        /**< an open directory; null is closed */
 typedef pthread_mutex_t *CxMutex; /**< null means that there is no mutex */
 typedef pthread_t CxThread;
 
@@ -136,7 +137,8 @@ typedef enum Level {
   UNSPECIFIED = -9999 /**< no level: passes every threshold, and as a threshold passes all */
 } Level;
 
-/* ---- Objects ----------------------------------------------------------------------------------- */
+/* ---- Objects -----------------------------------------------------------------------------------
+ */
 
 typedef struct ObjCfg ObjCfg; /**< a named configuration, opaque */
 typedef struct ObjClass ObjClass;
@@ -152,7 +154,7 @@ typedef enum ObjKind { Logger = 101, Filter = 102, Handler = 103, Formatter = 10
  * lock: the qlxIntl... twins, the qlx... helpers and the Qlx<Class>F<Operation> operations. `args`
  * is the argument list of the log call, may be null, and is consumed only through a va_copy.
  */
-typedef void *(*fAllocVars)(void);    /**< variables of a new object, or null */
+typedef void *(*fAllocVars)(void);     /**< variables of a new object, or null */
 typedef void (*fFreeVars)(void *vars); /**< frees them; also called with null */
 typedef void (*fCfgChange)(QlxObject *object, const char *key);
 typedef void (*fLog)(QlxObject *object, Event *event, va_list *args);
@@ -223,13 +225,13 @@ struct QlxObject {
 
 /** A message: a bundle and a key that select a pattern, or the pattern itself. */
 struct I18Msg {
-  char *bundle;      /**< owned or null: name or path of an ICU resource bundle */
-  char *key;         /**< owned or null: key of the pattern in the bundle */
-  UChar *text;       /**< owned or null: the pattern when bundle is null */
-  ParmList *parms;   /**< owned, null until asked for */
-  char *locale;      /**< null is ICU's default locale; copies share it */
-  int32_t error;     /**< ICU's code of the last failed bind, else 0 */
-  uint8_t shared;    /**< private: 1 when a copy shares `locale` */
+  char *bundle;    /**< owned or null: name or path of an ICU resource bundle */
+  char *key;       /**< owned or null: key of the pattern in the bundle */
+  UChar *text;     /**< owned or null: the pattern when bundle is null */
+  ParmList *parms; /**< owned, null until asked for */
+  char *locale;    /**< null is ICU's default locale; copies share it */
+  int32_t error;   /**< ICU's code of the last failed bind, else 0 */
+  uint8_t shared;  /**< private: 1 when a copy shares `locale` */
 };
 
 /** One log request on its way; lives for the one call. */

@@ -1,7 +1,7 @@
 /**
  * @file
- * The API lock and the toolkit's registries, for class operations. All but the lock functions expect
- * the lock to be held.
+ * The API lock and the toolkit's registries, for class operations. All but the lock functions
+ * expect the lock to be held.
  */
 #ifndef QLX_CLASS_TOOLKIT_H
 #define QLX_CLASS_TOOLKIT_H

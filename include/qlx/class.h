@@ -1,0 +1,23 @@
+/**
+ * @file
+ * For hosts that bring classes of their own. Operations of a class run with the API lock held, so
+ * they call only what takes no lock: the twins (qlxIntl...), the helpers (qlx...) and the
+ * operations of the built-in classes (Qlx<Class>F<Operation>) declared here, besides the platform
+ * layer and the functions whose headers say that they take no lock.
+ */
+#ifndef QLX_CLASS_H
+#define QLX_CLASS_H
+
+#include <qlx/class/config.h>
+#include <qlx/class/containers.h>
+#include <qlx/class/event.h>
+#include <qlx/class/filter.h>
+#include <qlx/class/formatter.h>
+#include <qlx/class/handler.h>
+#include <qlx/class/logger.h>
+#include <qlx/class/message.h>
+#include <qlx/class/object.h>
+#include <qlx/class/props.h>
+#include <qlx/class/toolkit.h>
+
+#endif

@@ -1,0 +1,39 @@
+/**
+ * @file
+ * The way of a log call below the lock, for class operations and for code that takes the lock
+ * itself (qlx/class/toolkit.h). None of these takes the lock or tests the threshold, unless it says
+ * so. `result` must not be null; `args` may be.
+ */
+#ifndef QLX_CLASS_LOGGER_H
+#define QLX_CLASS_LOGGER_H
+
+#include <qlx/types.h>
+
+QLX_BEGIN_DECLS
+
+/** @return as QlxLoggerGetFLog() */
+QLX_API fLog qlxIntlLoggerGetFLog(QlxObject *logger);
+
+/** Deliberate: always 0, a placeholder. Use QlxIsLoggable(), which takes no lock. */
+QLX_API uint8_t qlxIntlIsLoggable(QlxObject *logger, int32_t level);
+
+/** Logs a bundle's message at a level of the caller's choice. */
+QLX_API void qlxLogUMessageEntry(QlxLogResult *result, QlxObject *logger, int32_t level,
+                                 const char *bundle, const char *key, va_list *args);
+
+/** Logs a text (a pattern) at a level of the caller's choice. */
+QLX_API void qlxLogUDebugEntry(QlxLogResult *result, QlxObject *logger, int32_t level,
+                               const char *file, const char *function, int32_t line,
+                               const UChar *text, va_list *args);
+
+/** Logs through the toolkit logger, after its threshold test; nothing while the toolkit is closed.
+ */
+QLX_API void qlxIntlLogVA(QlxLogResult *result, int32_t level, const char *bundle, const char *key,
+                          ...);
+
+/** The basic logger's keys: "level", and the common ones. */
+QLX_API void QlxBasicLoggerFCfgChange(QlxObject *logger, const char *key);
+
+QLX_END_DECLS
+
+#endif

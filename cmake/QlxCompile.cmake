@@ -1,0 +1,20 @@
+# How everything here is compiled: warnings for all targets that ask for them, sanitizers for all.
+
+add_library(qlxwarnings INTERFACE)
+target_compile_options(qlxwarnings INTERFACE -Wall -Wextra $<$<BOOL:${QLX_WERROR}>:-Werror>)
+
+set(QLX_INSTRUMENTED OFF)
+if(QLX_SANITIZE)
+  set(QLX_INSTRUMENTED ON)
+  add_compile_options(-fsanitize=${QLX_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+  add_link_options(-fsanitize=${QLX_SANITIZE})
+endif()
+if(QLX_FUZZ)
+  if(NOT CMAKE_CXX_COMPILER_ID MATCHES Clang OR QLX_SANITIZE)
+    message(FATAL_ERROR "QLX_FUZZ needs clang, and brings its own sanitizers")
+  endif()
+  set(QLX_INSTRUMENTED ON)
+  add_compile_options(-fsanitize=fuzzer-no-link,address,undefined -fno-sanitize-recover=all
+                      -fno-omit-frame-pointer)
+  add_link_options(-fsanitize=address,undefined)
+endif()

@@ -1,0 +1,18 @@
+/**
+ * @file
+ * The groups, lists and maps of the library: doubly linked nodes in the order of insertion. A group
+ * holds no element twice, a list may and counts its nodes, a map finds values by name.
+ */
+#ifndef QLX_CONTAINERS_H
+#define QLX_CONTAINERS_H
+
+#include <qlx/containers/ListenerGroup.h>
+#include <qlx/containers/ParmList.h>
+#include <qlx/containers/StringGroup.h>
+#include <qlx/containers/StringList.h>
+#include <qlx/containers/StringToObjCfgMap.h>
+#include <qlx/containers/StringToObjClassMap.h>
+#include <qlx/containers/StringToObjMap.h>
+#include <qlx/containers/StringToStringMap.h>
+
+#endif

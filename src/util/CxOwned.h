@@ -1,5 +1,5 @@
-// Ownership: what must be released is held by a unique_ptr whose deleter is the release function, so
-// no function needs a cleanup ladder. Header only; nothing here allocates.
+// Ownership: what must be released is held by a unique_ptr whose deleter is the release function,
+// so no function needs a cleanup ladder. Header only; nothing here allocates.
 #ifndef QLX_SRC_CXOWNED_H
 #define QLX_SRC_CXOWNED_H
 

@@ -1,0 +1,244 @@
+// The log manager: the one registry of configurations. It links each to its parent by the dots of
+// the names, makes unknown ones on first reference, and applies them to objects.
+#include "QlxLogManager.h"
+
+#include <qlx/class/containers.h>
+#include <qlx/class/object.h>
+#include <qlx/config.h>
+#include <qlx/memory.h>
+
+#include "QlxLocked.h"
+#include "QlxObjConfig.h"
+
+static constexpr const char *kRoot = "/";
+
+static struct {
+  StringToObjCfgMap *configs;  // one counted reference to each
+  StringGroup *configNames;    // the same names, in order of registration
+  bool initialised;
+} gLogMgr;
+
+static void freeRegistries() {
+  qlxIntlFreeStringGroup(gLogMgr.configNames);
+  qlxIntlFreeStringToObjCfgMap(gLogMgr.configs);
+  gLogMgr = {};
+}
+
+void qlxInitLogMgr(void) {
+  if (gLogMgr.initialised) return;
+  gLogMgr.configNames = qlxIntlAllocStringGroup();
+  gLogMgr.configs = qlxIntlAllocStringToObjCfgMap();
+  gLogMgr.initialised = gLogMgr.configNames && gLogMgr.configs;
+  if (!gLogMgr.initialised) freeRegistries();
+}
+
+void qlxCloseLogMgr(void) {
+  if (gLogMgr.initialised) freeRegistries();
+}
+
+static bool isRoot(const char *name) {
+  return OslStringCmp(name, kRoot) == 0;
+}
+
+uint8_t qlxIntlLogMgrHasCfg(const char *name) {
+  return qlxIntlStringToObjCfgMapHasKey(gLogMgr.configs, name);
+}
+
+// ---- Parents
+
+// The stored parent name, found and stored first when there is none; null for none.
+static const char *fetchParentName(ObjCfg *cfg) {
+  if (cfg->parentName) return cfg->parentName;
+  const OwnedStr prefix{OslStringDup(cfg->name)};
+  while (char *dot = OslStringRChr(prefix.get(), '.')) {
+    *dot = '\0';
+    if (!qlxIntlLogMgrHasCfg(prefix.get())) continue;
+    qlxSetParentName(cfg, prefix.get());
+    break;
+  }
+  return cfg->parentName;
+}
+
+char *qlxLogMgrGetParentConfigName(ObjCfg *cfg) {
+  if (!cfg) return nullptr;
+  const char *name = fetchParentName(cfg);
+  return OslStringDup(name ? name : kRoot);
+}
+
+// A configuration that names itself as its parent counts as having none.
+static ObjCfg *fetchParent(ObjCfg *cfg) {
+  const char *name = fetchParentName(cfg);
+  return OslStringCmp(name, cfg->name) == 0 ? nullptr : qlxIntlLogMgrGetCfg(name);
+}
+
+// ---- Children. They are walked over a snapshot of their names, since the walk moves them.
+
+using NameList = Owned<StringList, qlxIntlFreeStringList>;
+
+static NameList copyChildrenNames(ObjCfg *cfg) {
+  NameList names{qlxIntlAllocStringList()};
+  for (StringGroupNode *it = qlxIntlObjCfgChildrenNames(cfg); it; it = it->next) {
+    qlxIntlStringListAppend(names.get(), it->value);
+  }
+  return names;
+}
+
+template <typename Visit>
+static void forEachChild(ObjCfg *cfg, Visit visit) {
+  const NameList names = copyChildrenNames(cfg);
+  for (StringListNode *it = qlxIntlStringListIterator(names.get()); it; it = it->next) {
+    if (const ObjCfgRef child{qlxIntlLogMgrGetCfg(it->value)}) visit(child.get());
+  }
+}
+
+static void moveChild(ObjCfg *from, ObjCfg *to, ObjCfg *child) {
+  qlxIntlObjCfgRemChild(from, child);
+  qlxIntlObjCfgAddChild(to, child);
+}
+
+// ---- Registry
+
+void qlxIntlLogMgrAddCfg(ObjCfg *cfg) {
+  if (!cfg || !gLogMgr.initialised || isRoot(cfg->name) || qlxIntlLogMgrHasCfg(cfg->name)) return;
+  if (!qlxIntlStringToObjCfgMapPut(gLogMgr.configs, cfg->name, cfg)) return;
+  if (const ObjCfgRef parent{fetchParent(cfg)}) {
+    qlxIntlObjCfgSetParent(cfg, parent.get());
+    forEachChild(parent.get(), [&](ObjCfg *child) {
+      const char *parentName = fetchParentName(child);
+      if (OslStringCmp(parentName, parent->name) != 0) moveChild(parent.get(), cfg, child);
+    });
+    qlxIntlObjCfgAddChild(parent.get(), cfg);
+  }
+  qlxIntlStringGroupAdd(gLogMgr.configNames, cfg->name);
+}
+
+ObjCfg *qlxIntlLogMgrGetCfg(const char *name) {
+  if (!name || !gLogMgr.initialised || isRoot(name)) return nullptr;
+  if (ObjCfg *known = qlxIntlStringToObjCfgMapGet(gLogMgr.configs, name)) return known;
+  ObjCfgRef made{qlxIntlAllocObjCfg(name)};
+  qlxIntlLogMgrAddCfg(made.get());
+  return qlxIntlLogMgrHasCfg(name) ? made.release() : nullptr;
+}
+
+void qlxIntlLogMgrRemCfg(ObjCfg *cfg) {
+  if (!cfg || !qlxIntlLogMgrHasCfg(cfg->name)) return;
+  const ObjCfgRef removed{qlxIntlStringToObjCfgMapGet(gLogMgr.configs, cfg->name)};
+  qlxIntlStringToObjCfgMapRem(gLogMgr.configs, removed->name);
+  if (removed->parentName) {
+    if (const ObjCfgRef parent{fetchParent(removed.get())}) {
+      qlxIntlObjCfgRemChild(parent.get(), removed.get());
+      forEachChild(removed.get(),
+                   [&](ObjCfg *child) { moveChild(removed.get(), parent.get(), child); });
+    }
+  }
+  qlxIntlStringGroupRem(gLogMgr.configNames, removed->name);
+}
+
+void qlxIntlLogMgrUpdateCfg(ObjCfg *cfg) {
+  if (!cfg || !qlxIntlLogMgrHasCfg(cfg->name)) return;
+  const ObjCfgRef held{qlxIntlAcquireObjCfg(cfg)};
+  qlxIntlLogMgrRemCfg(cfg);
+  qlxIntlLogMgrAddCfg(cfg);
+}
+
+StringGroupNode *qlxIntlLogMgrConfigNames(void) {
+  return qlxIntlStringGroupIterator(gLogMgr.configNames);
+}
+
+uint8_t qlxLogMgrAddCfgFromFile(const char *configName, const char *propertyName,
+                                const char *value) {
+  if (!configName || !*configName || !propertyName || !*propertyName || !value) return 0;
+  const uint8_t existed = qlxIntlLogMgrHasCfg(configName);
+  const ObjCfgRef cfg{qlxIntlLogMgrGetCfg(configName)};
+  if (!cfg) return 0;
+  if (!existed) qlxIntlObjCfgSetFromFile(cfg.get(), 1);
+  return qlxIntlSetObjCfgProp(cfg.get(), propertyName, value);
+}
+
+// ---- Applying
+
+namespace {
+
+// A configuration and its ancestors, nearest first, each counted; a chain of parents that comes
+// back to one already in it ends there.
+class Lineage {
+ public:
+  explicit Lineage(ObjCfg *cfg) {
+    for (ObjCfgRef next{cfg}; next && !contains(next.get()); next.reset(fetchParent(top()))) {
+      if (!reserve()) break;
+      members_.get()[count_++] = next.release();
+    }
+  }
+  ~Lineage() {
+    for (uint32_t i = 0; i < count_; ++i) qlxIntlReleaseObjCfg(members_.get()[i]);
+  }
+  Lineage(const Lineage &) = delete;
+  Lineage &operator=(const Lineage &) = delete;
+
+  uint32_t count() const { return count_; }
+  ObjCfg *operator[](uint32_t i) const { return members_.get()[i]; }
+
+ private:
+  ObjCfg *top() const { return members_.get()[count_ - 1]; }
+
+  bool contains(const ObjCfg *cfg) const {
+    for (uint32_t i = 0; i < count_; ++i) {
+      if (members_.get()[i] == cfg) return true;
+    }
+    return false;
+  }
+
+  bool reserve() {
+    if (count_ < capacity_) return true;
+    const uint32_t wanted = capacity_ ? capacity_ * 2 : 8;
+    void *grown = OslMemoryRealloc(members_.get(), wanted * sizeof(ObjCfg *));
+    if (!grown) return false;
+    (void)members_.release();
+    members_.reset(static_cast<ObjCfg **>(grown));
+    capacity_ = wanted;
+    return true;
+  }
+
+  Owned<ObjCfg *, OslMemoryFree> members_;
+  uint32_t count_ = 0, capacity_ = 0;
+};
+
+}  // namespace
+
+uint8_t qlxIntlLogMgrApplyCfg(QlxObject *object, const char *name) {
+  if (!object) return 0;
+  const Lineage lineage{qlxIntlLogMgrGetCfg(name)};
+  // Ancestors first, so that the value set nearest to the object's own configuration is the last.
+  for (uint32_t i = lineage.count(); i-- > 0;) {
+    for (StringToStringMapNode *it = qlxIntlObjCfgProperties(lineage[i]); it; it = it->next) {
+      qlxIntlSetObjProp(object, it->key, it->value);
+    }
+  }
+  return lineage.count() > 0;
+}
+
+// Public functions
+
+void QlxLogMgrAddCfg(ObjCfg *cfg) {
+  qlxLocked<qlxIntlLogMgrAddCfg>(cfg);
+}
+void QlxLogMgrRemCfg(ObjCfg *cfg) {
+  qlxLocked<qlxIntlLogMgrRemCfg>(cfg);
+}
+void QlxLogMgrUpdateCfg(ObjCfg *cfg) {
+  qlxLocked<qlxIntlLogMgrUpdateCfg>(cfg);
+}
+ObjCfg *QlxLogMgrGetCfg(const char *name) {
+  return qlxLocked<qlxIntlLogMgrGetCfg>(name);
+}
+uint8_t QlxLogMgrHasCfg(const char *name) {
+  return qlxLocked<qlxIntlLogMgrHasCfg>(name);
+}
+
+uint8_t QlxLogMgrApplyCfg(QlxObject *object, const char *name) {
+  return qlxLocked<qlxIntlLogMgrApplyCfg>(object, name);
+}
+
+StringGroupNode *QlxLogMgrConfigNames(void) {
+  return qlxLocked<qlxIntlLogMgrConfigNames>();
+}

@@ -1,0 +1,23 @@
+// The record of a configuration, and readers that hand out what it holds without a copy.
+#ifndef QLX_SRC_QLXOBJCONFIG_H
+#define QLX_SRC_QLXOBJCONFIG_H
+
+#include <qlx/class/config.h>
+
+#include "util/CxOwned.h"
+
+struct ObjCfg {
+  uint32_t refCount;
+  char *name;                // owned, never null
+  char *parentName;          // owned; null directly under "/"
+  StringGroup *children;     // owned names, null until the first child
+  StringToStringMap *props;  // owned, null until the first property
+  uint8_t fromFile;          // 1: made while the properties file was read
+};
+
+using ObjCfgRef = Owned<ObjCfg, qlxIntlReleaseObjCfg>;  // one counted reference
+
+/** Replaces the stored parent name by a copy. */
+void qlxSetParentName(ObjCfg *cfg, const char *parentName);
+
+#endif

@@ -1,0 +1,194 @@
+// Objects: found by name or made, configured, counted, destroyed. Properties and listeners have
+// modules of their own.
+#include "QlxObject.h"
+
+#include <qlx/class/config.h>
+#include <qlx/class/containers.h>
+#include <qlx/class/handler.h>
+#include <qlx/class/message.h>
+#include <qlx/memory.h>
+#include <qlx/object.h>
+
+#include "QlxLocked.h"
+#include "QlxLogManager.h"
+
+static constexpr const char *kDefaultFormatterName = "quill.defaultFormatter";
+static constexpr const char *kDefaultFormatterClass = "qlx_basicformatter";
+
+static ObjClass *configuredClass(const char *objectName) {
+  const Owned<ObjCfg, qlxIntlReleaseObjCfg> cfg{qlxIntlLogMgrGetCfg(objectName)};
+  const OwnedStr className{qlxIntlGetInheritedObjCfgProp(cfg.get(), "className", nullptr)};
+  return qlxToolkitGetClassDef(className.get());
+}
+
+static void initKindFields(QlxObject *object) {
+  switch (object->objClass->kind) {
+    case Logger:
+      storeLevel(object, DEBUG_MIN);
+      break;
+    case Handler:  // every handler starts with the shared default formatter, made on first need
+      object->kind2.formatter = qlxIntlGetObject(kDefaultFormatterName, kDefaultFormatterClass);
+      break;
+    default:  // a filter's level is 0, everything else null
+      break;
+  }
+}
+
+// Frees an object that was never registered.
+static void discardObject(QlxObject *object) {
+  qlxRetireObject(object);
+  OslMemoryFree(object);
+}
+
+static QlxObject *makeObject(const char *objectName, ObjClass *objClass) {
+  auto *object = static_cast<QlxObject *>(OslMemoryCalloc(1, sizeof(QlxObject)));
+  if (!object) return nullptr;
+  object->objClass = objClass;
+  object->name = OslStringDup(objectName);
+  storeEnabled(object, 1);
+  initKindFields(object);
+  if (objClass->fAllocVars) object->vars = objClass->fAllocVars();
+
+  // The class's own operations may have made an object of this name meanwhile: that one stays.
+  const ObjectRef other{qlxToolkitGetObjInstance(objectName)};
+  if (!other) qlxToolkitAddObjInstance(object->name, object);
+  if (object->refCount == 1) return object;
+  discardObject(object);
+  return nullptr;
+}
+
+QlxObject *qlxIntlGetObject(const char *objectName, const char *className) {
+  if (!objectName) return nullptr;
+  if (ObjectRef existing{qlxToolkitGetObjInstance(objectName)}) {
+    const ObjClass *objClass = existing->objClass;
+    const bool fits = objClass && (!className || OslStringCmp(objClass->name, className) == 0);
+    return fits ? existing.release() : nullptr;
+  }
+
+  ObjClass *objClass = className ? qlxToolkitGetClassDef(className) : configuredClass(objectName);
+  if (!objClass) return nullptr;
+  QlxObject *object = makeObject(objectName, objClass);
+  if (!object) return nullptr;
+  // The caller's reference comes first: a "listenerNames" that names the object itself takes and
+  // gives back references while the configuration is applied.
+  qlxIntlAcquireObject(object);
+  qlxIntlLogMgrApplyCfg(object, objectName);
+  return object;
+}
+
+QlxObject *qlxIntlAcquireObject(QlxObject *object) {
+  if (object) ++object->refCount;
+  return object;
+}
+
+void qlxCloseHandlerOnce(QlxObject *object) {
+  if (!isKind(object, Handler) || (object->marks & kMarkClosed)) return;
+  object->marks |= kMarkClosed;
+  if (object->objClass->op3.fClose) object->objClass->op3.fClose(object);
+}
+
+static void freeContents(QlxObject *object) {
+  qlxIntlFreeStringToStringMap(object->props);
+  qlxFreeListeners(object);
+  OslMemoryFree(object->name);
+  const ObjClass *objClass = object->objClass;
+  if (objClass->fFreeVars) objClass->fFreeVars(object->vars);
+  if (objClass->kind == Handler) qlxIntlReleaseObject(object->kind2.formatter);
+  if (objClass->kind == Formatter) {
+    OslMemoryFree(object->kind1.separator);
+    OslMemoryFree(object->kind2.dateTimeFormat);
+    OslMemoryFree(object->kind3.locale);
+  }
+}
+
+void qlxRetireObject(QlxObject *object) {
+  freeContents(object);
+  object->name = nullptr;
+  object->props = nullptr;
+  object->vars = nullptr;
+  object->kind1.word = object->kind2.word = object->kind3.word = 0;
+  storeEnabled(object, 0);
+  object->objClass = nullptr;
+}
+
+static void removeFromRegistry(QlxObject *object) {
+  const ObjectRef registered{qlxToolkitGetObjInstance(object->name)};
+  if (registered.get() == object) qlxToolkitRemObjInstance(object->name);
+}
+
+static void destroyObject(QlxObject *object) {
+  object->marks |= kMarkDying;
+  removeFromRegistry(object);
+  qlxCloseHandlerOnce(object);
+  qlxRetireObject(object);
+}
+
+void qlxIntlReleaseObject(QlxObject *object) {
+  if (!object || object->refCount == 0) return;
+  --object->refCount;
+  // Deliberate: destroyed at one, since the registry's own reference keeps nothing alive.
+  if (object->objClass && object->refCount == 1 && !(object->marks & kMarkDying)) {
+    destroyObject(object);
+  }
+  if (!object->objClass && object->refCount == 0) OslMemoryFree(object);
+}
+
+char *qlxIntlGetObjectName(QlxObject *object) {
+  return object ? OslStringDup(object->name) : nullptr;
+}
+
+UChar *qlxIntlGetObjectDesc(QlxObject *object) {
+  if (!object || !object->objClass) return nullptr;
+  return qlxIntlBindUI18Msg(object->objClass->description, nullptr);
+}
+
+uint8_t qlxIntlIsObjectEnabled(QlxObject *object) {
+  return object ? loadEnabled(object) : 0;
+}
+
+void qlxIntlSetObjectEnabled(QlxObject *object, uint32_t flag) {
+  if (object && object->objClass) storeEnabled(object, static_cast<uint8_t>(flag));
+}
+
+uint8_t qlxIntlIsLoggableByFilter(QlxObject *filter, Event *event, va_list *args) {
+  if (!event || !isKind(filter, Filter) || !filter->objClass->op2.fIsLoggable) return 0;
+  return filter->objClass->op2.fIsLoggable(filter, event, args);
+}
+
+uint8_t QlxAreObjectsEqual(QlxObject *a, QlxObject *b) {
+  return a == b;
+}
+
+// Public functions
+
+QlxObject *QlxGetObject(const char *objectName, const char *className) {
+  return qlxLocked<qlxIntlGetObject>(objectName, className);
+}
+
+QlxObject *QlxAcquireObject(QlxObject *object) {
+  return qlxLocked<qlxIntlAcquireObject>(object);
+}
+
+void QlxReleaseObject(QlxObject *object) {
+  qlxLocked<qlxIntlReleaseObject>(object);
+}
+
+char *QlxGetObjectName(QlxObject *object) {
+  return qlxLocked<qlxIntlGetObjectName>(object);
+}
+
+UChar *QlxGetObjectDesc(QlxObject *object) {
+  return qlxLocked<qlxIntlGetObjectDesc>(object);
+}
+
+uint8_t QlxIsObjectEnabled(QlxObject *object) {
+  return qlxLocked<qlxIntlIsObjectEnabled>(object);
+}
+
+void QlxSetObjectEnabled(QlxObject *object, uint32_t flag) {
+  qlxLocked<qlxIntlSetObjectEnabled>(object, flag);
+}
+
+uint8_t QlxIsLoggableByFilter(QlxObject *filter, Event *event, va_list *args) {
+  return qlxLocked<qlxIntlIsLoggableByFilter>(filter, event, args);
+}

@@ -1,0 +1,45 @@
+// A test with an open toolkit: opened without a file before each test, closed after it.
+#ifndef QLX_TESTS_TOOLKITTEST_H
+#define QLX_TESTS_TOOLKITTEST_H
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include <qlx/qlx.h>
+
+#include "QlxObjConfig.h"
+#include "QlxObject.h"
+
+class ToolkitTest : public ::testing::Test {
+ protected:
+  void SetUp() override { ASSERT_EQ(QlxOpenToolkit(nullptr, nullptr), 1); }
+  void TearDown() override { QlxCloseToolkit(); }
+
+  // A reference like ObjectRef, but given back under the lock, as a host does.
+  struct Release {
+    void operator()(QlxObject *object) const { QlxReleaseObject(object); }
+  };
+  using Handle = std::unique_ptr<QlxObject, Release>;
+
+  static Handle get(const char *name, const char *className = nullptr) {
+    return Handle{QlxGetObject(name, className)};
+  }
+
+  // Sets a property of a configuration, made when it is missing.
+  static void configure(const char *cfg, const char *key, const char *value) {
+    ObjCfg *found = QlxLogMgrGetCfg(cfg);
+    ASSERT_NE(found, nullptr);
+    EXPECT_EQ(QlxSetObjCfgProp(found, key, value), 1);
+    QlxReleaseObjCfg(found);
+  }
+
+  // A string result as std::string; frees it. "<null>" for null.
+  static std::string take(char *text) {
+    const std::string taken = text ? text : "<null>";
+    OslMemoryFree(text);
+    return taken;
+  }
+};
+
+#endif

@@ -1,0 +1,24 @@
+// Conversion between 8-bit text and UTF-16 into room that the caller has. ASCII text is widened and
+// narrowed here when the default code page is one that keeps ASCII; all else is ICU's default
+// converter.
+#ifndef QLX_SRC_CXUSTRING_H
+#define QLX_SRC_CXUSTRING_H
+
+#include <qlx/ustring.h>
+
+QLX_BEGIN_DECLS
+
+// Whether `length` bytes are ASCII and mean themselves in the default code page, which a host may
+// change at any time: it is asked anew.
+bool cxUStringIsPlainAscii(const char *text, uint32_t length);
+
+// Widens plain ASCII to `length` code units, without a terminator.
+void cxUStringWiden(UChar *out, const char *text, uint32_t length);
+
+// Converts `length` bytes without a zero among them and terminates: `out` has room for `length` + 1
+// code units, and the result is never longer than the bytes. Returns its length.
+uint32_t cxUStringConvert(UChar *out, const char *text, uint32_t length);
+
+QLX_END_DECLS
+
+#endif

@@ -1,0 +1,15 @@
+// The room check of the UTF-16 buffer.
+#ifndef QLX_SRC_CXUSTRINGBUFF_H
+#define QLX_SRC_CXUSTRINGBUFF_H
+
+#include <qlx/buffers.h>
+
+QLX_BEGIN_DECLS
+
+// Makes room for `extra` code units and the terminator behind the text; makes the first block.
+// Returns 1, or 0 with the text unchanged.
+uint8_t cxUStringBuffHasCapacity(CxUStringBuff *buffer, uint32_t extra);
+
+QLX_END_DECLS
+
+#endif

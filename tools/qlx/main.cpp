@@ -1,0 +1,91 @@
+// The command qlx: what it understands, and its exit status. One subcommand so far, `qlx log`.
+#include <clocale>
+#include <csignal>
+#include <cstdio>
+#include <cstring>
+
+#include <fcntl.h>
+#include <langinfo.h>
+#include <unistd.h>
+
+#include <CLI/CLI.hpp>
+
+#include <qlx/level.h>
+#include <qlx/types.h>
+
+#include "LogCommand.h"
+
+static constexpr int kWrongUsage = 2;
+
+// Characters and messages follow the environment; numbers in configurations do not. The "C" locale
+// promises no more than ASCII, so there text is taken for UTF-8, which comes out as it went in.
+static void followTheEnvironmentsLocale() {
+  setlocale(LC_MESSAGES, "");
+  setlocale(LC_CTYPE, "");
+  if (strcmp(nl_langinfo(CODESET), "ANSI_X3.4-1968") == 0) setlocale(LC_CTYPE, "C.UTF-8");
+}
+
+// A log file must never be opened as the descriptor that the console handler writes to.
+static void fillMissingStandardStreams() {
+  int descriptor;
+  do {
+    descriptor = open("/dev/null", O_RDWR);
+  } while (descriptor >= 0 && descriptor <= 2);
+  if (descriptor > 2) close(descriptor);
+}
+
+// The library's answer to a word that it does not know is the level -9999; as a number that is a
+// level too.
+static std::string checkLevel(const std::string &text) {
+  int number;
+  const bool isNumber = sscanf(text.c_str(), "%d", &number) == 1;
+  if (QlxGetLevelFromString(text.c_str()) != UNSPECIFIED || isNumber) return "";
+  return "\"" + text + "\" is neither a number nor one of FATAL, ERROR, WARN, INFO, DEBUG_MIN, " +
+         "DEBUG_MID, DEBUG_MAX, ALL, OFF";
+}
+
+static void addLogCommand(CLI::App &app, LogOptions &options) {
+  CLI::App *log = app.add_subcommand("log", "Log lines of text, or one localized message");
+  log->add_option("--config", options.config, "Properties file with the configurations")
+      ->type_name("FILE");
+  log->add_option("--logger", options.logger, "The logger, by its name in the configuration")
+      ->type_name("NAME")
+      ->required();
+  log->add_option("--level", options.level, "Level of what is logged: a word or a number")
+      ->type_name("LEVEL")
+      ->capture_default_str()
+      ->check(checkLevel);
+  CLI::Option *bundle =
+      log->add_option("--bundle", options.bundle, "Log one message of this resource bundle")
+          ->type_name("BUNDLE");
+  CLI::Option *key = log->add_option("--key", options.key, "Key of the message")->type_name("KEY");
+  bundle->needs(key);
+  key->needs(bundle);
+  log->add_option("inputs", options.inputs,
+                  "Files whose lines are logged, - and none being standard input; with --bundle "
+                  "the message's arguments instead, read as its pattern wants them (a date as "
+                  "milliseconds since 1970)");
+  log->footer(
+      "Each line is one record, and only text: braces and apostrophes come out as they went in. "
+      "Bytes that are no text in the locale's encoding, and NUL, become U+FFFD; a line of more "
+      "than 1 MiB becomes several records. SIGINT and SIGTERM end the input.\n"
+      "Exit status: 0 when every record was written, 1 when one was not, 2 for wrong usage.");
+}
+
+int main(int argc, char **argv) {
+  followTheEnvironmentsLocale();
+  fillMissingStandardStreams();
+  signal(SIGPIPE, SIG_IGN);  // a reader that goes away does not end the files' records
+
+  CLI::App app{"qlx: configurable logging from the command line", "qlx"};
+  app.set_version_flag("--version", "qlx " QLX_VERSION);
+  app.require_subcommand(1);
+  LogOptions options;
+  addLogCommand(app, options);
+  try {
+    app.parse(argc, argv);
+  } catch (const CLI::ParseError &error) {
+    return app.exit(error) == 0 ? 0 : kWrongUsage;
+  }
+  return runLogCommand(options);
+}

@@ -13,11 +13,12 @@ class TempDir {
  public:
   TempDir() {
     std::string pattern = std::filesystem::temp_directory_path() / "qlxtestXXXXXX";
-    if (const char *made = mkdtemp(pattern.data())) dir_ = made;
+    if (!mkdtemp(pattern.data())) std::abort();  // else paths would begin at the root
+    dir_ = pattern;
   }
   ~TempDir() {
     std::error_code ignored;
-    if (!dir_.empty()) std::filesystem::remove_all(dir_, ignored);
+    std::filesystem::remove_all(dir_, ignored);
   }
   TempDir(const TempDir &) = delete;
   TempDir &operator=(const TempDir &) = delete;
@@ -42,7 +43,7 @@ class TempDir {
   }
 
  private:
-  std::string dir_;  // empty when it could not be made: every use then fails
+  std::string dir_;
 };
 
 #endif

@@ -91,7 +91,9 @@ QLX_API ParmListNode *QlxParmListGetLink(ParmList *list, const Parm *element);
  */
 QLX_API Parm *QlxParmListGetIndex(ParmList *list, int32_t index);
 
-/** Removes a node of this list. Takes no lock: hold it, or own the list alone. */
+/**
+ * Removes a node; one of another list is left alone. Takes no lock: hold it, or own the list alone.
+ */
 QLX_API void QlxParmListRemLink(ParmList *list, ParmListNode *node);
 
 QLX_END_DECLS

@@ -91,7 +91,9 @@ QLX_API StringListNode *QlxStringListGetLink(StringList *list, const char *eleme
  */
 QLX_API char *QlxStringListGetIndex(StringList *list, int32_t index);
 
-/** Removes a node of this list. Takes no lock: hold it, or own the list alone. */
+/**
+ * Removes a node; one of another list is left alone. Takes no lock: hold it, or own the list alone.
+ */
 QLX_API void QlxStringListRemLink(StringList *list, StringListNode *node);
 
 QLX_END_DECLS

@@ -29,7 +29,7 @@ QLX_API ObjCfg *qlxIntlStringToObjCfgMapIterGetVal(StringToObjCfgMapNode *it);
 QLX_API StringToObjCfgMapNode *qlxIntlStringToObjCfgMapGetNode(StringToObjCfgMap *map,
                                                                const char *key);
 
-/** Removes a node of this map. */
+/** Removes a node; one of another map is left alone. */
 QLX_API void qlxIntlStringToObjCfgMapRemNode(StringToObjCfgMap *map, StringToObjCfgMapNode *node);
 
 QLX_END_DECLS

@@ -30,7 +30,7 @@ QLX_API ObjClass *qlxIntlStringToObjClassMapIterGetVal(StringToObjClassMapNode *
 QLX_API StringToObjClassMapNode *qlxIntlStringToObjClassMapGetNode(StringToObjClassMap *map,
                                                                    const char *key);
 
-/** Removes a node of this map. */
+/** Removes a node; one of another map is left alone. */
 QLX_API void qlxIntlStringToObjClassMapRemNode(StringToObjClassMap *map,
                                                StringToObjClassMapNode *node);
 

@@ -28,7 +28,7 @@ QLX_API QlxObject *qlxIntlStringToObjMapIterGetVal(StringToObjMapNode *it);
 /** @return the node with that key, or null */
 QLX_API StringToObjMapNode *qlxIntlStringToObjMapGetNode(StringToObjMap *map, const char *key);
 
-/** Removes a node of this map. */
+/** Removes a node; one of another map is left alone. */
 QLX_API void qlxIntlStringToObjMapRemNode(StringToObjMap *map, StringToObjMapNode *node);
 
 QLX_END_DECLS

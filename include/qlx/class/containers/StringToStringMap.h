@@ -30,7 +30,7 @@ QLX_API char *qlxIntlStringToStringMapIterGetVal(StringToStringMapNode *it);
 QLX_API StringToStringMapNode *qlxIntlStringToStringMapGetNode(StringToStringMap *map,
                                                                const char *key);
 
-/** Removes a node of this map. */
+/** Removes a node; one of another map is left alone. */
 QLX_API void qlxIntlStringToStringMapRemNode(StringToStringMap *map, StringToStringMapNode *node);
 
 QLX_END_DECLS

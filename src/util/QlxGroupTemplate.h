@@ -1,0 +1,67 @@
+// The group: elements in the order in which they were added, none twice.
+//
+// `Elements` names the records (Head, Node), the types (Element, Parameter) and the element
+// operations: copyIn makes what is stored, handOut what a caller gets, dispose ends what is stored,
+// match compares.
+#ifndef QLX_SRC_QLXGROUPTEMPLATE_H
+#define QLX_SRC_QLXGROUPTEMPLATE_H
+
+#include "QlxNodes.h"
+
+template <typename Elements>
+struct QlxGroupTemplate : QlxNodes<typename Elements::Head, typename Elements::Node> {
+  using Head = typename Elements::Head;
+  using Node = typename Elements::Node;
+  using Element = typename Elements::Element;
+  using Parameter = typename Elements::Parameter;
+  using Nodes = QlxNodes<Head, Node>;
+
+  static Head *alloc() { return Nodes::newHead(); }
+
+  static void free(Head *group) {
+    if (!group) return;
+    while (group->head) removeNode(group->head);
+    OslMemoryFree(group);
+  }
+
+  static Node *find(Head *group, Parameter element) {
+    if (!element) return nullptr;
+    return Nodes::firstOf(group, [&](Node *node) { return Elements::match(node->value, element); });
+  }
+
+  static uint8_t add(Head *group, Parameter element) {
+    if (!group || !element || find(group, element)) return 0;
+    auto node = Nodes::newNode(group);
+    if (!node) return 0;
+    node->value = Elements::copyIn(element);
+    if (!node->value) return 0;
+    Nodes::linkAtTail(node.release());
+    return 1;
+  }
+
+  static uint8_t remove(Head *group, Parameter element) {
+    Node *node = find(group, element);
+    if (!node) return 0;
+    removeNode(node);
+    return 1;
+  }
+
+  // By value: of two nodes made equal behind the group's back the first one goes.
+  static Node *removeAt(Node *it) {
+    if (!it) return nullptr;
+    Node *successor = it->next;
+    remove(it->owner, it->value);
+    return successor;
+  }
+
+  static Element get(Node *it) { return it ? Elements::handOut(it->value) : nullptr; }
+
+ private:
+  // Out of the chain first: disposing of an element may come back to the group.
+  static void removeNode(Node *node) {
+    const auto removed = Nodes::unlink(node);
+    Elements::dispose(removed->value);
+  }
+};
+
+#endif

@@ -1,0 +1,92 @@
+// The map: values by string key, in the order in which the keys were first put, no key twice.
+//
+// `Elements` names the records (Head, Node), the types (Element, Parameter) and the operations on
+// values: copyIn makes what is stored, handOut what a caller gets, dispose ends what is stored.
+// None of them sees a null value. kCopiesFirst tells in which order a value is replaced.
+#ifndef QLX_SRC_QLXMAPTEMPLATE_H
+#define QLX_SRC_QLXMAPTEMPLATE_H
+
+#include "QlxNodes.h"
+
+template <typename Elements>
+struct QlxMapTemplate : QlxNodes<typename Elements::Head, typename Elements::Node> {
+  using Head = typename Elements::Head;
+  using Node = typename Elements::Node;
+  using Element = typename Elements::Element;
+  using Parameter = typename Elements::Parameter;
+  using Nodes = QlxNodes<Head, Node>;
+
+  static Head *alloc() { return Nodes::newHead(); }
+
+  static void free(Head *map) {
+    if (!map) return;
+    while (map->head) removeNode(map, map->head);
+    OslMemoryFree(map);
+  }
+
+  static Head *copy(Head *source) {
+    Head *map = source ? alloc() : nullptr;
+    if (!map) return nullptr;
+    for (Node *node = source->head; node; node = node->next) put(map, node->key, node->value);
+    return map;
+  }
+
+  static Node *find(Head *map, const char *key) {
+    return Nodes::firstOf(map, [&](Node *node) { return OslStringCmp(node->key, key) == 0; });
+  }
+
+  static uint8_t put(Head *map, const char *key, Parameter value) {
+    if (!map || !key) return 0;
+    Node *node = find(map, key);
+    if (!node) return putNew(map, key, value);
+    replace(node, value);
+    return 1;
+  }
+
+  static Element get(Head *map, const char *key) { return getValue(find(map, key)); }
+
+  static void remove(Head *map, const char *key) { removeNode(map, find(map, key)); }
+
+  // Out of the chain first: disposing of a value may come back to the map.
+  static void removeNode(Head *map, Node *node) {
+    if (!map || !node || node->owner != map) return;
+    const auto removed = Nodes::unlink(node);
+    dispose(removed->value);
+    OslMemoryFree(removed->key);
+  }
+
+  static uint8_t hasKey(Head *map, const char *key) { return find(map, key) != nullptr; }
+
+  static char *getKey(Node *it) { return it ? OslStringDup(it->key) : nullptr; }
+
+  static Element getValue(Node *it) {
+    return it && it->value ? Elements::handOut(it->value) : nullptr;
+  }
+
+ private:
+  static uint8_t putNew(Head *map, const char *key, Parameter value) {
+    auto node = Nodes::newNode(map);
+    if (!node) return 0;
+    node->key = OslStringDup(key);
+    if (!node->key) return 0;
+    node->value = copyIn(value);
+    Nodes::linkAtTail(node.release());
+    return 1;
+  }
+
+  // While an old value is disposed of, which may come back to the map, no node shows it.
+  static void replace(Node *node, Parameter value) {
+    Element old = node->value;
+    node->value = Elements::kCopiesFirst ? copyIn(value) : nullptr;
+    dispose(old);
+    if (!Elements::kCopiesFirst) node->value = copyIn(value);
+  }
+
+  static Element copyIn(Parameter value) { return value ? Elements::copyIn(value) : nullptr; }
+
+  static void dispose(Element value) {
+    if (value) Elements::dispose(value);
+  }
+};
+
+#endif

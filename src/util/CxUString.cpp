@@ -19,7 +19,7 @@
 #include "CxStatus.h"
 
 static constexpr uint32_t kMaxParmUnits = 256;
-static constexpr uint32_t kMaxBytesPerUnit = 4;
+static constexpr uint32_t kMaxBytesPerUnit = cxUStringNarrowRoom(0);
 
 // Code pages that are known to keep the 128 ASCII bytes, by the converter's canonical name.
 static constexpr std::string_view kAsciiCodePages[] = {"UTF-8", "US-ASCII", "ISO-8859-1"};
@@ -85,17 +85,22 @@ static void *allocText(uint32_t units, uint32_t perUnit) {
   return size > INT32_MAX ? nullptr : OslMemoryMalloc(static_cast<uint32_t>(size));
 }
 
+uint32_t cxUStringNarrow(char *out, const UChar *text, uint32_t length) {
+  if (isAscii(text, length) && defaultKeepsAscii()) {
+    copyAscii(out, text, length);
+    out[length] = 0;
+    return length;
+  }
+  const uint32_t room = cxUStringNarrowRoom(length) - 1;
+  out[room] = 0;
+  u_austrncpy(out, text, static_cast<int32_t>(room));
+  return OslStringLen(out);
+}
+
 static char *narrow(const UChar *text, uint32_t length) {
   auto *copy = static_cast<char *>(allocText(length, kMaxBytesPerUnit));
-  if (!copy) return nullptr;
-  if (isAscii(text, length) && defaultKeepsAscii()) {
-    copyAscii(copy, text, length);
-    copy[length] = 0;
-    return copy;
-  }
-  const uint32_t room = length * kMaxBytesPerUnit + kMaxBytesPerUnit - 1;
-  copy[room] = 0;
-  return u_austrncpy(copy, text, static_cast<int32_t>(room));
+  if (copy) cxUStringNarrow(copy, text, length);
+  return copy;
 }
 
 UChar *CxUStringDupStrToUChar(const char *text) {

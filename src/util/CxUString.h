@@ -19,6 +19,15 @@ void cxUStringWiden(UChar *out, const char *text, uint32_t length);
 // code units, and the result is never longer than the bytes. Returns its length.
 uint32_t cxUStringConvert(UChar *out, const char *text, uint32_t length);
 
+// The room that narrowing so many code units needs: four bytes for each and for the terminator.
+constexpr uint32_t cxUStringNarrowRoom(uint32_t length) {
+  return 4 * (length + 1);
+}
+
+// Narrows a text of `length` code units and terminates: the bytes of CxUStringDupUCharToStr() in
+// the caller's room. Returns how many they are.
+uint32_t cxUStringNarrow(char *out, const UChar *text, uint32_t length);
+
 QLX_END_DECLS
 
 #endif

@@ -1,0 +1,58 @@
+// A test with an open toolkit, the two host classes of the tests, and the logger "log".
+#ifndef QLX_TESTS_CHAINTEST_H
+#define QLX_TESTS_CHAINTEST_H
+
+#include <memory>
+#include <optional>
+
+#include "QlxLocked.h"
+#include "support/PlainFormatter.h"
+#include "support/RecordingHandler.h"
+#include "support/ToolkitTest.h"
+
+class ChainTest : public ToolkitTest {
+ protected:
+  void SetUp() override {
+    ToolkitTest::SetUp();
+    formatter.emplace();
+    recorder.emplace();
+    logger = get("log", "qlx_basiclogger");
+  }
+  void TearDown() override {
+    logger.reset();
+    ToolkitTest::TearDown();
+  }
+
+  // Makes an object of a class a listener of the logger.
+  Handle attach(const char *name, const char *className) {
+    Handle object = get(name, className);
+    EXPECT_EQ(QlxAddListener(logger.get(), object.get()), 1);
+    return object;
+  }
+
+  // Gives a handler a formatter of a class; "test_plainformatter" when it is not said.
+  void format(const Handle &handler, const char *name = "plain",
+              const char *className = PlainFormatter::kClass) {
+    const Handle object = get(name, className);
+    QlxHandlerSetFormatter(handler.get(), object.get());
+  }
+
+  QlxLogResult log(const char16_t *text) { return QlxLogUText(logger.get(), text); }
+
+  // Hands an event of a level to an object as its chain would.
+  static void process(const Handle &object, int32_t level, const char16_t *text = u"text") {
+    const ApiLock lock;
+    Event *event = QlxVaAllocUEvent(level, nullptr, nullptr, text);
+    object->objClass->op1.fProcess(object.get(), event, nullptr);
+    QlxFreeEvent(event);
+  }
+
+  std::optional<PlainFormatter> formatter;
+  std::optional<RecordingHandler> recorder;
+  Handle logger;
+};
+
+// What has come to the recording handlers, each text with "|" behind it.
+#define EXPECT_RECORDED(expected) EXPECT_EQ(recorder->texts(), expected)
+
+#endif

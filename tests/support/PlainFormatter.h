@@ -1,0 +1,51 @@
+// A host's formatter class, "test_plainformatter": the bound text and a line feed, between a header
+// and a trailer that the test sets.
+#ifndef QLX_TESTS_PLAINFORMATTER_H
+#define QLX_TESTS_PLAINFORMATTER_H
+
+#include <optional>
+#include <string>
+
+#include <qlx/qlx.h>
+
+class PlainFormatter {
+ public:
+  static constexpr const char *kClass = "test_plainformatter";
+
+  // Registers the class; the object lives until the toolkit is closed.
+  PlainFormatter() {
+    current() = this;
+    QlxAddUFormatterClass(kClass, nullptr, nullptr, nullptr, nullptr, format, getHeader, getTrailer,
+                          nullptr);
+  }
+  ~PlainFormatter() { current() = nullptr; }
+  PlainFormatter(const PlainFormatter &) = delete;
+  PlainFormatter &operator=(const PlainFormatter &) = delete;
+
+  std::optional<std::string> header, trailer;  // without a value: null
+  bool silent = false;                         // formats to null
+  int formatted = 0;                           // calls of format
+
+ private:
+  static PlainFormatter *&current() {
+    static PlainFormatter *object;
+    return object;
+  }
+
+  static UChar *format(QlxObject *, Event *event, va_list *args) {
+    ++current()->formatted;
+    if (current()->silent) return nullptr;
+    UChar *bound = QlxBindEventUMsg(event, qlxIntlBindUI18Msg, args);
+    const std::u16string line = (bound ? std::u16string(bound) : u"") + u"\n";
+    OslMemoryFree(bound);
+    return CxUStringDup(line.c_str());
+  }
+
+  static char *duplicate(const std::optional<std::string> &text) {
+    return text ? OslStringDup(text->c_str()) : nullptr;
+  }
+  static char *getHeader(QlxObject *) { return duplicate(current()->header); }
+  static char *getTrailer(QlxObject *) { return duplicate(current()->trailer); }
+};
+
+#endif

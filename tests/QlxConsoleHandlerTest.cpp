@@ -1,0 +1,172 @@
+#include "support/CaptureStdout.h"
+#include "support/ChainTest.h"
+
+namespace {
+
+class ConsoleHandlerTest : public ChainTest {
+ protected:
+  void SetUp() override {
+    ChainTest::SetUp();
+    handler = attach("console", "qlx_consolehandler");
+    format(handler);
+  }
+  void TearDown() override {
+    handler.reset();
+    ChainTest::TearDown();
+  }
+
+  void forward() {
+    const Handle next = get("recording", RecordingHandler::kClass);
+    QlxAddListener(handler.get(), next.get());
+  }
+
+  void close() {
+    const ApiLock lock;
+    QlxConsoleHandlerFClose(handler.get());
+  }
+
+  void open() {
+    const ApiLock lock;
+    QlxConsoleHandlerFOpen(handler.get());
+  }
+
+  uint8_t opened() { return *static_cast<uint8_t *>(handler->vars); }
+
+  Handle handler;
+};
+
+TEST_F(ConsoleHandlerTest, FollowsEachTextWithALineFeedOfItsOwn) {
+  CaptureStdout out;
+  log(u"first");
+  log(u"second");
+  EXPECT_EQ(out.bytes(), "first\n\nsecond\n\n");
+}
+
+TEST_F(ConsoleHandlerTest, WritesTheHeaderOnceBeforeTheFirstRecord) {
+  formatter->header = "head";
+  CaptureStdout out;
+  log(u"first");
+  log(u"second");
+  EXPECT_EQ(out.bytes(), "head\nfirst\n\nsecond\n\n");
+}
+
+TEST_F(ConsoleHandlerTest, WritesTheHeaderOnceWhenItIsOpenedFirst) {
+  formatter->header = "head";
+  CaptureStdout out;
+  open();
+  open();
+  log(u"first");
+  EXPECT_EQ(out.bytes(), "head\nfirst\n\n");
+}
+
+TEST_F(ConsoleHandlerTest, WritesTheTrailerOnceAndTheHeaderAgainAfterIt) {
+  formatter->header = "head";
+  formatter->trailer = "tail";
+  CaptureStdout out;
+  close();  // closed already
+  log(u"first");
+  close();
+  close();
+  log(u"second");
+  EXPECT_EQ(out.bytes(), "head\nfirst\n\ntail\nhead\nsecond\n\n");
+}
+
+TEST_F(ConsoleHandlerTest, ChangesItsStateWithoutHeaderAndTrailerToo) {
+  CaptureStdout out;
+  EXPECT_EQ(opened(), 0);
+  open();
+  EXPECT_EQ(opened(), 1);
+  close();
+  EXPECT_EQ(opened(), 0);
+  EXPECT_EQ(out.bytes(), "");
+}
+
+TEST_F(ConsoleHandlerTest, WritesTheTrailerWhenItGoes) {
+  formatter->trailer = "tail";
+  CaptureStdout out;
+  log(u"only");
+  QlxRemListener(logger.get(), handler.get());
+  handler.reset();
+  EXPECT_EQ(out.bytes(), "only\n\ntail\n");
+}
+
+TEST_F(ConsoleHandlerTest, WritesNothingWithoutAFormatterAndForwardsAllTheSame) {
+  forward();
+  QlxHandlerSetFormatter(handler.get(), nullptr);
+  CaptureStdout out;
+  log(u"text");
+  EXPECT_EQ(out.bytes(), "");
+  EXPECT_EQ(opened(), 1);
+  EXPECT_RECORDED(u"text|");
+}
+
+TEST_F(ConsoleHandlerTest, WritesNothingForATextOfNullAndForwardsAllTheSame) {
+  forward();
+  formatter->silent = true;
+  CaptureStdout out;
+  log(u"text");
+  EXPECT_EQ(out.bytes(), "");
+  EXPECT_RECORDED(u"text|");
+}
+
+TEST_F(ConsoleHandlerTest, ForwardsTheEventAndTheArguments) {
+  forward();
+  CaptureStdout out;
+  QlxLogUText(logger.get(), u"{0}!", u"hello");
+  EXPECT_EQ(out.bytes(), "hello!\n\n");
+  EXPECT_RECORDED(u"hello!|");
+}
+
+TEST_F(ConsoleHandlerTest, WritesAndForwardsNothingWhileItIsDisabled) {
+  forward();
+  formatter->header = "head";
+  QlxSetObjectEnabled(handler.get(), 0);
+  CaptureStdout out;
+  log(u"text");
+  EXPECT_EQ(out.bytes(), "");
+  EXPECT_RECORDED(u"");
+}
+
+TEST_F(ConsoleHandlerTest, WritesAnEmptyLineAfterEachBasicRecord) {
+  format(handler, "basic", "qlx_basicformatter");
+  const Handle basic = get("basic");
+  QlxSetObjProp(basic.get(), "dateTimeFormat", "'T'");
+  CaptureStdout out;
+  log(u"first");
+  log(u"second");
+  EXPECT_EQ(out.bytes(), "T first\n\nT second\n\n");
+}
+
+TEST_F(ConsoleHandlerTest, KeepsTheOrderWithWhatTheHostPrintsItself) {
+  CaptureStdout out;
+  std::printf("before\n");
+  log(u"text");
+  std::printf("after\n");
+  EXPECT_EQ(out.bytes(), "before\ntext\n\nafter\n");
+}
+
+TEST_F(ConsoleHandlerTest, IgnoresEveryEventWithoutVariables) {
+  forward();
+  uint8_t *vars = static_cast<uint8_t *>(handler->vars);
+  handler->vars = nullptr;
+  CaptureStdout out;
+  log(u"text");
+  open();
+  close();
+  EXPECT_EQ(out.bytes(), "");
+  EXPECT_RECORDED(u"");
+  handler->vars = vars;
+}
+
+TEST_F(ConsoleHandlerTest, IgnoresNull) {
+  QlxConsoleHandlerFOpen(nullptr);
+  QlxConsoleHandlerFClose(nullptr);
+  QlxConsoleHandlerFFreeVars(nullptr);
+  QlxConsoleUHandlerFProcess(nullptr, nullptr, nullptr);
+  formatter->header = "head";
+  CaptureStdout out;
+  QlxConsoleUHandlerFProcess(handler.get(), nullptr, nullptr);
+  EXPECT_EQ(out.bytes(), "");
+}
+
+}  // namespace

@@ -1,0 +1,468 @@
+// The command `qlx log`, started as a user starts it: its output, its files and its exit status.
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <cstdlib>
+#include <map>
+#include <string>
+#include <vector>
+
+#include <fcntl.h>
+#include <poll.h>
+#include <pty.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include "support/TempDir.h"
+
+namespace {
+
+struct Outcome {
+  int status;  // exit status; the negative number of the signal that ended it
+  std::string out, err;
+};
+
+// One run of the command. Its input is a pipe, or a descriptor that the test brings.
+class Process {
+ public:
+  using Environment = std::map<std::string, std::string>;
+
+  Process(std::vector<std::string> arguments, const std::string &folder,
+          Environment environment = {}, int input = -1, int output = -1, int error = -1)
+      : in_(input), out_(output), err_(error) {
+    int pipes[3][2] = {{-1, -1}, {-1, -1}, {-1, -1}};
+    for (auto &ends : pipes) EXPECT_EQ(pipe2(ends, O_CLOEXEC), 0);
+    const int given[] = {input, output, error};
+    const int own[] = {pipes[0][0], pipes[1][1], pipes[2][1]};
+    arguments.insert(arguments.begin(), {QLX_COMMAND, "log"});
+    pid_ = fork();
+    if (pid_ == 0) {
+      for (int i = 0; i < 3; ++i) dup2(given[i] >= 0 ? given[i] : own[i], i);
+      start(arguments, folder, environment);
+    }
+    for (const int end : own) close(end);
+    in_ = pipes[0][1];
+    out_ = pipes[1][0];
+    err_ = pipes[2][0];
+  }
+  ~Process() {
+    closeInput();
+    close(out_);
+    close(err_);
+  }
+  Process(const Process &) = delete;
+  Process &operator=(const Process &) = delete;
+
+  void write(const std::string &text) {
+    for (size_t at = 0; at < text.size();) {
+      const ssize_t count = ::write(in_, text.data() + at, text.size() - at);
+      ASSERT_GT(count, 0);
+      at += count;
+    }
+  }
+  void closeInput() {
+    if (in_ >= 0) close(in_);
+    in_ = -1;
+  }
+  void signal(int number) { kill(pid_, number); }
+
+  // Reads standard output until it ends with the text.
+  void waitForOutput(const std::string &end) {
+    while (!outcome_.out.ends_with(end)) ASSERT_TRUE(readSome(out_, outcome_.out)) << outcome_.out;
+  }
+
+  Outcome finish() {
+    closeInput();
+    while (readSome(out_, outcome_.out)) continue;
+    while (readSome(err_, outcome_.err)) continue;
+    int status = 0;
+    waitpid(pid_, &status, 0);
+    outcome_.status = WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
+    return outcome_;
+  }
+
+ private:
+  [[noreturn]] static void start(std::vector<std::string> &arguments, const std::string &folder,
+                                 const Environment &environment) {
+    for (const char *name : {"LC_ALL", "LC_CTYPE", "LC_MESSAGES", "LANG"}) unsetenv(name);
+    setenv("LC_ALL", "C.UTF-8", 1);
+    for (const auto &[name, value] : environment) setenv(name.c_str(), value.c_str(), 1);
+    std::vector<char *> argv;
+    for (std::string &argument : arguments) argv.push_back(argument.data());
+    argv.push_back(nullptr);
+    if (chdir(folder.c_str()) == 0) execv(argv[0], argv.data());
+    _exit(127);
+  }
+
+  static bool readSome(int descriptor, std::string &text) {
+    char buffer[1 << 16];
+    const ssize_t count = read(descriptor, buffer, sizeof buffer);
+    if (count > 0) text.append(buffer, count);
+    return count > 0;
+  }
+
+  pid_t pid_;
+  int in_, out_, err_;
+  Outcome outcome_ = {};
+};
+
+class LogCommandTest : public ::testing::Test {
+ protected:
+  // Records go to app.log, as the text alone.
+  void SetUp() override {
+    dir.write("app.properties", file() +
+                                    "app.logger.className=qlx_basiclogger\n"
+                                    "app.logger.listenerNames=app.file\n");
+  }
+
+  static std::string file() {
+    return "app.file.className=qlx_filehandler\n"
+           "app.file.fileName=app.log\n"
+           "app.file.formatterName=app.formatter\n" +
+           formatter();
+  }
+  static std::string formatter() {
+    return "app.formatter.className=qlx_basicformatter\n"
+           "app.formatter.dateTimeFormat='>'\n"
+           "app.formatter.separator=\n";
+  }
+
+  std::vector<std::string> arguments(const std::vector<std::string> &more) const {
+    std::vector<std::string> all = {"--config", "app.properties", "--logger", "app.logger"};
+    all.insert(all.end(), more.begin(), more.end());
+    return all;
+  }
+
+  Outcome log(const std::string &input, const std::vector<std::string> &more = {},
+              const Process::Environment &environment = {}) {
+    Process run(arguments(more), dir.path(), environment);
+    run.write(input);
+    return run.finish();
+  }
+
+  static constexpr const char *kMessages = QLX_EXAMPLE_MESSAGES;
+  const TempDir dir;
+};
+
+TEST_F(LogCommandTest, LogsEachLineOfStandardInput) {
+  const Outcome outcome = log("one\ntwo\n");
+  EXPECT_EQ(outcome.status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">one\n>two\n");
+  EXPECT_EQ(outcome.out, "");
+  EXPECT_EQ(outcome.err, "");
+}
+
+TEST_F(LogCommandTest, LogsTheLinesOfTheNamedFilesInTheirOrder) {
+  dir.write("a.txt", "a\n");
+  dir.write("b.txt", "b\n");
+  EXPECT_EQ(log("from standard input\n", {"b.txt", "-", "a.txt"}).status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">b\n>from standard input\n>a\n");
+}
+
+TEST_F(LogCommandTest, WritesToTheConsoleWithAnEmptyLineAfterEachRecord) {
+  dir.write("app.properties", formatter() +
+                                  "app.logger.className=qlx_basiclogger\n"
+                                  "app.logger.listenerNames=app.console\n"
+                                  "app.console.className=qlx_consolehandler\n"
+                                  "app.console.formatterName=app.formatter\n");
+  EXPECT_EQ(log("one\n").out, ">one\n\n");
+}
+
+TEST_F(LogCommandTest, TakesALineAsTextAndNeverAsAPattern) {
+  const std::string lines = "{0} {1} '{0}' it's }{ '' {\n";
+  EXPECT_EQ(log(lines).status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">" + lines);
+}
+
+TEST_F(LogCommandTest, KeepsEmptyLinesCarriageReturnsAndBlanks) {
+  EXPECT_EQ(log("\n  a\t\r\n\n").status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">\n>  a\t\r\n>\n");
+}
+
+TEST_F(LogCommandTest, LogsALastLineWithoutALineFeed) {
+  EXPECT_EQ(log("one\ntwo").status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">one\n>two\n");
+}
+
+TEST_F(LogCommandTest, LogsNothingForAnEmptyInput) {
+  EXPECT_EQ(log("").status, 0);
+  EXPECT_EQ(dir.read("app.log"), "<none>");
+}
+
+TEST_F(LogCommandTest, GivesUtf8BackAsItCameAlsoInTheCLocale) {
+  const std::string line = "Gr\u00FC\u00DFe, \u65E5\u672C, \U0001F600\n";
+  for (const char *locale : {"C.UTF-8", "C", "POSIX"}) {
+    dir.write("app.log", "");
+    EXPECT_EQ(log(line, {}, {{"LC_ALL", locale}}).status, 0);
+    EXPECT_EQ(dir.read("app.log"), ">" + line) << locale;
+  }
+}
+
+TEST_F(LogCommandTest, ReplacesBytesThatAreNoTextAndNul) {
+  using namespace std::string_literals;
+  EXPECT_EQ(log("a\xFFz\nb\0z\nc\xE2\x82\n"s).status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">a\uFFFDz\n>b\uFFFDz\n>c\uFFFD\n");
+}
+
+TEST_F(LogCommandTest, ReplacesACharacterThatTheEndOfTheInputCuts) {
+  EXPECT_EQ(log("a\xE2\x82").status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">a\uFFFD\n");
+}
+
+TEST_F(LogCommandTest, LogsALineOfAMebibyteWhole) {
+  const std::string line(1 << 20, 'x');
+  EXPECT_EQ(log(line + "\nnext\n").status, 0);
+  EXPECT_EQ(dir.read("app1.log"), ">" + line + "\n");  // which fills the first generation
+  EXPECT_EQ(dir.read("app.log"), ">next\n");
+}
+
+TEST_F(LogCommandTest, CutsALongerLineIntoRecordsBetweenCharacters) {
+  dir.write("app.properties", dir.read("app.properties") + "app.file.maxFiles=1\n");
+  // The two bytes of the last character stand on both sides of the limit.
+  const std::string head((1 << 20) - 1, 'x');
+  EXPECT_EQ(log(head + "\u00FC and more\nnext\n").status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">" + head + "\n>\u00FC and more\n>next\n");
+}
+
+TEST_F(LogCommandTest, LogsAtTheGivenLevelBehindTheThreshold) {
+  dir.write("app.properties", dir.read("app.properties") + "app.logger.level=WARN\n");
+  EXPECT_EQ(log("default\n").status, 0);  // INFO: suppressed, which is no failure
+  EXPECT_EQ(dir.read("app.log"), "<none>");
+  EXPECT_EQ(log("word\n", {"--level", "error"}).status, 0);
+  EXPECT_EQ(log("number\n", {"--level", "5000"}).status, 0);
+  EXPECT_EQ(log("below\n", {"--level", "4999"}).status, 0);
+  EXPECT_EQ(log("unspecified\n", {"--level=-9999"}).status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">word\n>number\n>unspecified\n");
+}
+
+TEST_F(LogCommandTest, PassesTheLevelOnToFilters) {
+  dir.write("app.properties", file() +
+                                  "app.logger.className=qlx_basiclogger\n"
+                                  "app.logger.listenerNames=app.filter\n"
+                                  "app.filter.className=qlx_levelfilter\n"
+                                  "app.filter.level=WARN\n"
+                                  "app.filter.listenerNames=app.file\n");
+  EXPECT_EQ(log("low\n").status, 0);
+  EXPECT_EQ(log("high\n", {"--level", "WARN"}).status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">high\n");
+}
+
+// ---- Messages
+
+TEST_F(LogCommandTest, LogsOneMessageWithArgumentsOfThePatternsTypes) {
+  EXPECT_EQ(log("", {"--bundle", kMessages, "--key", "copied", "disk", "1250"}).status, 0);
+  EXPECT_EQ(log("", {"--bundle", kMessages, "--key", "filling", "/var", "0.5"}).status, 0);
+  EXPECT_EQ(log("", {"--bundle", kMessages, "--key", "lost", "{0}", "too many"}).status, 0);
+  EXPECT_EQ(dir.read("app.log"),
+            ">Copied 1250 files from disk\n"
+            ">/var is 50% full\n"
+            ">Lost the connection to {0}\n");
+}
+
+TEST_F(LogCommandTest, LogsAMessageInTheFormattersLocale) {
+  dir.write("app.properties", dir.read("app.properties") + "app.formatter.locale=de\n");
+  EXPECT_EQ(log("", {"--bundle", kMessages, "--key", "copied", "disk", "1250"}).status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">1.250 Dateien von disk kopiert\n");
+}
+
+TEST_F(LogCommandTest, FailsForAKeyThatTheBundleDoesNotHave) {
+  const Outcome outcome = log("", {"--bundle", kMessages, "--key", "nothing", "a"});
+  EXPECT_EQ(outcome.status, 1);
+  EXPECT_EQ(outcome.err, "qlx: a record failed: U_MISSING_RESOURCE_ERROR\n");
+}
+
+TEST_F(LogCommandTest, TakesMissingArgumentsAsWrongUsage) {
+  const Outcome outcome = log("", {"--bundle", kMessages, "--key", "copied", "disk"});
+  EXPECT_EQ(outcome.status, 2);
+  EXPECT_EQ(outcome.err, "qlx: copied: the message has 2 arguments, not 1\n");
+  EXPECT_EQ(dir.read("app.log"), "<none>");
+}
+
+TEST_F(LogCommandTest, TakesAWordInPlaceOfANumberAsWrongUsage) {
+  for (const char *word : {"many", "12x", "1.5", "", "99999999999"}) {
+    const Outcome outcome = log("", {"--bundle", kMessages, "--key", "copied", "disk", word});
+    EXPECT_EQ(outcome.status, 2) << word;
+  }
+  EXPECT_EQ(log("", {"--bundle", kMessages, "--key", "filling", "/var", "half"}).err,
+            "qlx: filling: argument {1} is a number, not \"half\"\n");
+}
+
+TEST_F(LogCommandTest, LogsAMessageOnlyAboveTheThreshold) {
+  dir.write("app.properties", dir.read("app.properties") + "app.logger.level=WARN\n");
+  EXPECT_EQ(log("", {"--bundle", kMessages, "--key", "lost", "a"}).status, 0);
+  EXPECT_EQ(log("", {"--bundle", kMessages, "--key", "lost", "b", "--level", "WARN"}).status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">Lost the connection to b\n");
+}
+
+// ---- Failures
+
+TEST_F(LogCommandTest, TakesAnUnknownLevelWordAsWrongUsage) {
+  const Outcome outcome = log("", {"--level", "LOUD"});
+  EXPECT_EQ(outcome.status, 2);
+  EXPECT_NE(outcome.err.find("\"LOUD\" is neither a number nor"), std::string::npos);
+}
+
+TEST_F(LogCommandTest, AnswersWrongUsageWithStatusTwo) {
+  const std::vector<std::vector<std::string>> wrong = {
+      {},                                                       // no logger
+      {"--logger"},                                             // no name
+      {"--logger", "app.logger", "--color"},                    // unknown
+      {"--logger", "app.logger", "--bundle", kMessages},        // no key
+      {"--logger", "app.logger", "--key", "lost", "argument"},  // no bundle
+  };
+  for (const auto &arguments : wrong) {
+    const Outcome outcome = Process(arguments, dir.path()).finish();
+    EXPECT_EQ(outcome.status, 2) << arguments.size();
+    EXPECT_NE(outcome.err, "");
+  }
+}
+
+TEST_F(LogCommandTest, FailsWithTheSystemsTextForAConfigurationThatIsNotThere) {
+  const Outcome outcome =
+      Process({"--config", "none.properties", "--logger", "app.logger"}, dir.path()).finish();
+  EXPECT_EQ(outcome.status, 1);
+  EXPECT_EQ(outcome.err, "qlx: none.properties: No such file or directory\n");
+}
+
+TEST_F(LogCommandTest, FailsForAConfigurationThatIsRefused) {
+  dir.write("app.properties", "nodot=1\n");
+  const Outcome outcome = log("");
+  EXPECT_EQ(outcome.status, 1);
+  EXPECT_EQ(outcome.err,
+            "qlx: app.properties: a line of it cannot be read, or its key names no "
+            "configuration\n");
+}
+
+TEST_F(LogCommandTest, FailsForANameThatIsNoLogger) {
+  for (const char *name : {"app.nobody", "app.file"}) {
+    const Outcome outcome =
+        Process({"--config", "app.properties", "--logger", name}, dir.path()).finish();
+    EXPECT_EQ(outcome.status, 1);
+    EXPECT_EQ(outcome.err,
+              "qlx: " + std::string(name) + ": no logger of this name is configured\n");
+  }
+}
+
+TEST_F(LogCommandTest, FailsForAnInputThatIsNotThereAndLogsTheOthers) {
+  dir.write("a.txt", "a\n");
+  const Outcome outcome = log("", {"none.txt", ".", "a.txt"});
+  EXPECT_EQ(outcome.status, 1);
+  EXPECT_EQ(outcome.err,
+            "qlx: none.txt: No such file or directory\n"
+            "qlx: .: Is a directory\n");
+  EXPECT_EQ(dir.read("app.log"), ">a\n");
+}
+
+TEST_F(LogCommandTest, TellsTheSystemsErrorOnceWhenRecordsCannotBeWritten) {
+  dir.write("app.properties", dir.read("app.properties") + "app.file.fileName=app.d\n");
+  ASSERT_EQ(mkdir(dir.path("app.d").c_str(), 0777), 0);  // a folder cannot be opened for writing
+  const Outcome outcome = log("one\ntwo\nthree\n");
+  EXPECT_EQ(outcome.status, 1);
+  EXPECT_EQ(outcome.err, "qlx: a record failed: Is a directory\n");
+}
+
+TEST_F(LogCommandTest, FailsWhenStandardOutputCannotBeWritten) {
+  dir.write("app.properties", formatter() +
+                                  "app.logger.className=qlx_basiclogger\n"
+                                  "app.logger.listenerNames=app.console\n"
+                                  "app.console.className=qlx_consolehandler\n");
+  const int full = open("/dev/full", O_WRONLY | O_CLOEXEC);
+  Process run(arguments({}), dir.path(), {}, -1, full);
+  run.write("one\ntwo\n");
+  const Outcome outcome = run.finish();
+  close(full);
+  EXPECT_EQ(outcome.status, 1);
+  EXPECT_EQ(outcome.err, "qlx: a record failed: standard output cannot be written\n");
+}
+
+TEST_F(LogCommandTest, WritesNoRecordIntoTheConsolesPlaceWhenStandardOutputIsClosed) {
+  dir.write("app.properties", dir.read("app.properties") +
+                                  "app.logger.listenerNames=app.file app.console\n"
+                                  "app.console.className=qlx_consolehandler\n"
+                                  "app.console.formatterName=app.formatter\n");
+  const std::string shell =
+      "exec " QLX_COMMAND " log --config app.properties --logger app.logger >&- <a.txt";
+  dir.write("a.txt", "a\nb\n");
+  EXPECT_EQ(system(("cd " + dir.path() + " && " + shell).c_str()), 0);
+  EXPECT_EQ(dir.read("app.log"), ">a\n>b\n");
+}
+
+// ---- Signals and terminals
+
+class LogCommandSignalTest : public LogCommandTest, public ::testing::WithParamInterface<int> {};
+
+TEST_P(LogCommandSignalTest, EndsTheInputWithEverythingWritten) {
+  dir.write("app.properties", dir.read("app.properties") +
+                                  "app.logger.listenerNames=app.file app.console\n"
+                                  "app.console.className=qlx_consolehandler\n"
+                                  "app.console.formatterName=app.formatter\n");
+  Process run(arguments({}), dir.path());
+  run.write("one\ntwo\nunfinished");  // one write, which a single read takes over
+  run.waitForOutput(">two\n\n");
+  run.signal(GetParam());  // the input stays open
+  run.waitForOutput(">unfinished\n\n");
+  const Outcome outcome = run.finish();
+  EXPECT_EQ(outcome.status, 0);
+  EXPECT_EQ(outcome.err, "");
+  EXPECT_EQ(dir.read("app.log"), ">one\n>two\n>unfinished\n");
+}
+
+INSTANTIATE_TEST_SUITE_P(Stop, LogCommandSignalTest, ::testing::Values(SIGINT, SIGTERM));
+
+TEST_F(LogCommandTest, GoesOnForTheFilesWhenTheConsolesReaderWentAway) {
+  dir.write("app.properties", dir.read("app.properties") +
+                                  "app.logger.listenerNames=app.console app.file\n"
+                                  "app.console.className=qlx_consolehandler\n");
+  int ends[2];
+  ASSERT_EQ(pipe2(ends, O_CLOEXEC), 0);
+  close(ends[0]);
+  Process run(arguments({}), dir.path(), {}, -1, ends[1]);
+  close(ends[1]);
+  run.write("one\ntwo\n");
+  EXPECT_EQ(run.finish().status, 1);
+  EXPECT_EQ(dir.read("app.log"), ">one\n>two\n");
+}
+
+// Standard error is a terminal here; what it shows comes back.
+static std::string shownOnATerminal(const std::vector<std::string> &arguments, const TempDir &dir) {
+  int terminal, process;
+  EXPECT_EQ(openpty(&terminal, &process, nullptr, nullptr, nullptr), 0);
+  std::string shown;
+  {
+    Process run(arguments, dir.path(), {}, -1, -1, process);
+    close(process);
+    char buffer[4096];
+    ssize_t count;
+    while ((count = read(terminal, buffer, sizeof buffer)) > 0) shown.append(buffer, count);
+    EXPECT_EQ(run.finish().status, 0);
+  }
+  close(terminal);
+  return shown;
+}
+
+TEST_F(LogCommandTest, ShowsProgressOnATerminalForALongFile) {
+  std::string lines;
+  while (lines.size() < (4 << 20)) lines += std::string(4095, 'x') + "\n";
+  dir.write("long.txt", lines);
+  const std::string shown = shownOnATerminal(arguments({"long.txt"}), dir);
+  EXPECT_NE(shown.find("% of long.txt, "), std::string::npos) << shown;
+  EXPECT_TRUE(shown.ends_with("\r\033[K")) << shown;  // and takes it away
+}
+
+TEST_F(LogCommandTest, ShowsNoProgressForAShortFileOrWithoutATerminal) {
+  dir.write("short.txt", "one\n");
+  EXPECT_EQ(shownOnATerminal(arguments({"short.txt"}), dir), "");
+  dir.write("long.txt", std::string(5 << 20, '\n'));
+  dir.write("app.properties", dir.read("app.properties") + "app.logger.level=OFF\n");
+  EXPECT_EQ(log("", {"long.txt"}).err, "");
+}
+
+TEST_F(LogCommandTest, ShowsItsOptionsAndItsVersion) {
+  const Outcome help = Process({"--help"}, dir.path()).finish();
+  EXPECT_EQ(help.status, 0);
+  for (const char *option : {"--config", "--logger", "--level", "--bundle", "--key"}) {
+    EXPECT_NE(help.out.find(option), std::string::npos) << option;
+  }
+}
+
+}  // namespace

@@ -2,6 +2,7 @@
 // console and in a file.
 #include <clocale>
 #include <cstdio>
+#include <initializer_list>
 #include <memory>
 
 #include <qlx/qlx.h>

@@ -5,6 +5,7 @@
 // qlxIntl... functions, the operations of the built-in classes, and what its header says takes no
 // lock.
 #include <cstdio>
+#include <initializer_list>
 #include <cstring>
 #include <deque>
 #include <string>

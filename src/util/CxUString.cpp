@@ -7,7 +7,6 @@
 #include <array>
 #include <atomic>
 #include <cstring>
-#include <string_view>
 
 #include <unicode/ucnv.h>
 #include <unicode/ustdio.h>
@@ -21,14 +20,10 @@
 static constexpr uint32_t kMaxParmUnits = 256;
 static constexpr uint32_t kMaxBytesPerUnit = cxUStringNarrowRoom(0);
 
-// Code pages that are known to keep the 128 ASCII bytes, by the converter's canonical name.
-static constexpr std::string_view kAsciiCodePages[] = {"UTF-8", "US-ASCII", "ISO-8859-1"};
-
-static bool defaultKeepsAscii() {
-  const std::string_view name = ucnv_getDefaultName();
-  for (const std::string_view known : kAsciiCodePages)
-    if (name == known) return true;
-  return false;
+// ICU on this platform is built for UTF-8 as the default code page and then never changes it; built
+// otherwise, all text takes the way over its converter.
+static bool defaultIsUtf8() {
+  return std::strcmp(ucnv_getDefaultName(), "UTF-8") == 0;
 }
 
 // Whether no unit has a bit of `mask`, which is the mask of one unit repeated over eight bytes.
@@ -54,7 +49,7 @@ static bool isAscii(const UChar *text, uint32_t length) {
 }
 
 bool cxUStringIsPlainAscii(const char *text, uint32_t length) {
-  return isAscii(text, length) && defaultKeepsAscii();
+  return isAscii(text, length) && defaultIsUtf8();
 }
 
 // Copies ASCII between the two widths. The inner loop of a fixed length is what compilers make
@@ -86,7 +81,7 @@ static void *allocText(uint32_t units, uint32_t perUnit) {
 }
 
 uint32_t cxUStringNarrow(char *out, const UChar *text, uint32_t length) {
-  if (isAscii(text, length) && defaultKeepsAscii()) {
+  if (isAscii(text, length) && defaultIsUtf8()) {
     copyAscii(out, text, length);
     out[length] = 0;
     return length;

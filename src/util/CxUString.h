@@ -8,8 +8,7 @@
 
 QLX_BEGIN_DECLS
 
-// Whether `length` bytes are ASCII and mean themselves in the default code page, which a host may
-// change at any time: it is asked anew.
+// Whether `length` bytes are ASCII and mean themselves in the default code page.
 bool cxUStringIsPlainAscii(const char *text, uint32_t length);
 
 // Widens plain ASCII to `length` code units, without a terminator.

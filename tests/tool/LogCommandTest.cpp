@@ -3,6 +3,7 @@
 
 #include <csignal>
 #include <cstdlib>
+#include <filesystem>
 #include <map>
 #include <string>
 #include <vector>
@@ -140,6 +141,8 @@ class LogCommandTest : public ::testing::Test {
     return run.finish();
   }
 
+  bool hasLogged() const { return std::filesystem::exists(dir.path("app.log")); }
+
   static constexpr const char *kMessages = QLX_EXAMPLE_MESSAGES;
   const TempDir dir;
 };
@@ -186,7 +189,7 @@ TEST_F(LogCommandTest, LogsALastLineWithoutALineFeed) {
 
 TEST_F(LogCommandTest, LogsNothingForAnEmptyInput) {
   EXPECT_EQ(log("").status, 0);
-  EXPECT_EQ(dir.read("app.log"), "<none>");
+  EXPECT_FALSE(hasLogged());
 }
 
 TEST_F(LogCommandTest, GivesUtf8BackAsItCameAlsoInTheCLocale) {
@@ -227,7 +230,7 @@ TEST_F(LogCommandTest, CutsALongerLineIntoRecordsBetweenCharacters) {
 TEST_F(LogCommandTest, LogsAtTheGivenLevelBehindTheThreshold) {
   dir.write("app.properties", dir.read("app.properties") + "app.logger.level=WARN\n");
   EXPECT_EQ(log("default\n").status, 0);  // INFO: suppressed, which is no failure
-  EXPECT_EQ(dir.read("app.log"), "<none>");
+  EXPECT_FALSE(hasLogged());
   EXPECT_EQ(log("word\n", {"--level", "error"}).status, 0);
   EXPECT_EQ(log("number\n", {"--level", "5000"}).status, 0);
   EXPECT_EQ(log("below\n", {"--level", "4999"}).status, 0);
@@ -275,7 +278,7 @@ TEST_F(LogCommandTest, TakesMissingArgumentsAsWrongUsage) {
   const Outcome outcome = log("", {"--bundle", kMessages, "--key", "copied", "disk"});
   EXPECT_EQ(outcome.status, 2);
   EXPECT_EQ(outcome.err, "qlx: copied: the message has 2 arguments, not 1\n");
-  EXPECT_EQ(dir.read("app.log"), "<none>");
+  EXPECT_FALSE(hasLogged());
 }
 
 TEST_F(LogCommandTest, TakesAWordInPlaceOfANumberAsWrongUsage) {

@@ -1,0 +1,194 @@
+// Date formats, held by pattern, each with the text of the last second it was asked for.
+#include "QlxHeldFormats.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <cstring>
+#include <optional>
+
+#include <unicode/ucal.h>
+#include <unicode/uchar.h>
+#include <unicode/udat.h>
+#include <unicode/ustdio.h>
+#include <unicode/ustring.h>
+
+#include <qlx/memory.h>
+#include <qlx/ustring.h>
+
+#include "util/CxOwned.h"
+
+static constexpr UChar kDefaultPattern[] = u"yyyy-MM-dd HH:mm:ss.SSS";
+static constexpr int32_t kMillisDigits = 3;
+
+struct HeldDate {
+  UDateFormat *format;  // null: a free place, all zero
+  char *pattern;        // owned; null is the default pattern, which the offset from UTC follows
+  uint64_t lastUse;     // larger is later
+  bool varies;          // texts of one second differ in more than three digits: none is kept
+
+  // The text of `second` at its millisecond 0, when hasText.
+  bool hasText;
+  int64_t second;  // since 1970
+  CxUStringBuff text;
+  int32_t fraction;  // where in the text the milliseconds stand, or -1: it has none
+};
+
+// A whole number of milliseconds, taken apart.
+struct Moment {
+  int64_t second;
+  int32_t millis;  // 0 to 999
+};
+
+static HeldDate gDates[kMaxHeldDates];
+static uint64_t gUses;
+
+static void drop(HeldDate &held) {
+  udat_close(held.format);
+  OslMemoryFree(held.pattern);
+  CxUStringBuffDiscard(&held.text);
+  held = {};
+}
+
+void qlxIntlDropHeldDates(void) {
+  for (HeldDate &held : gDates)
+    if (held.format) drop(held);
+}
+
+static bool samePattern(const char *a, const char *b) {
+  return a && b ? std::strcmp(a, b) == 0 : a == b;
+}
+
+static UDateFormat *openDate(const char *pattern) {
+  const OwnedUStr own{CxUStringDupStrToUChar(pattern)};
+  if (pattern && !own) return nullptr;
+  UErrorCode status = U_ZERO_ERROR;
+  return udat_open(UDAT_PATTERN, UDAT_PATTERN, nullptr, nullptr, -1,
+                   pattern ? own.get() : kDefaultPattern, -1, &status);
+}
+
+// Finds or opens the format of a pattern; null when that fails.
+static HeldDate *fetch(const char *pattern) {
+  for (HeldDate &held : gDates)
+    if (held.format && samePattern(held.pattern, pattern)) return &held;
+  icu::LocalUDateFormatPointer format{openDate(pattern)};
+  OwnedStr copy{OslStringDup(pattern)};
+  if (format.isNull() || (pattern && !copy)) return nullptr;
+  HeldDate &place = *std::ranges::min_element(gDates, {}, &HeldDate::lastUse);
+  drop(place);
+  place.format = format.orphan();
+  place.pattern = copy.release();
+  return &place;
+}
+
+// The default zone's offset from UTC at a time, in milliseconds.
+static int32_t offsetAt(double time) {
+  UErrorCode status = U_ZERO_ERROR;
+  const icu::LocalUCalendarPointer calendar{
+      ucal_open(nullptr, -1, nullptr, UCAL_TRADITIONAL, &status)};
+  ucal_setMillis(calendar.getAlias(), time, &status);
+  const int32_t zone = ucal_get(calendar.getAlias(), UCAL_ZONE_OFFSET, &status);
+  const int32_t daylight = ucal_get(calendar.getAlias(), UCAL_DST_OFFSET, &status);
+  return U_SUCCESS(status) ? zone + daylight : 0;
+}
+
+// Deliberate: the minutes keep their sign and the sign before them is that of the hours alone, so
+// that -330 minutes are "-05:-30" and -30 are "+00:-30".
+static uint8_t appendOffset(CxUStringBuff *text, int32_t offset) {
+  const int32_t hours = offset / 3'600'000;
+  const int32_t minutes = offset / 60'000 % 60;
+  UChar suffix[64] = {};
+  u_snprintf(suffix, 63, hours < 0 ? "-%02d:%02d" : "+%02d:%02d", std::abs(hours), minutes);
+  return CxUStringBuffAppendUStr(text, suffix);
+}
+
+// Appends the date by ICU, with the offset where it belongs. The places of the fields are optional.
+static uint8_t appendDate(CxUStringBuff *text, const HeldDate &held, double time,
+                          UFieldPositionIterator *fields, UErrorCode *status) {
+  const UDateFormat *format = held.format;
+  qlxAppendFormatted(text, status, [&](UChar *room, int32_t units, UErrorCode *answer) {
+    return fields ? udat_formatForFields(format, time, room, units, fields, answer)
+                  : udat_format(format, time, room, units, nullptr, answer);
+  });
+  if (*status == U_MEMORY_ALLOCATION_ERROR) return 0;
+  return held.pattern ? 1 : appendOffset(text, offsetAt(time));
+}
+
+static bool isDigitRunFrom(UChar zero) {
+  return u_charDigitValue(zero) == 0 && u_charDigitValue(zero + 9) == 9;
+}
+
+// Finds the milliseconds in the text of a whole second: three zeros in one place at most. Nothing
+// when another text of the same second may differ in more than that.
+static std::optional<int32_t> findFraction(const CxUStringBuff &text,
+                                           UFieldPositionIterator *fields) {
+  int32_t found = -1;
+  int32_t begin = 0;
+  int32_t end = 0;
+  for (int32_t field; (field = ufieldpositer_next(fields, &begin, &end)) >= 0;) {
+    if (field == UDAT_MILLISECONDS_IN_DAY_FIELD) return std::nullopt;
+    if (field != UDAT_FRACTIONAL_SECOND_FIELD) continue;
+    if (found >= 0 || end - begin != kMillisDigits) return std::nullopt;
+    const UChar *digits = text.data + begin;
+    if (digits[1] != digits[0] || digits[2] != digits[0] || !isDigitRunFrom(digits[0]))
+      return std::nullopt;
+    found = begin;
+  }
+  return found;
+}
+
+// Makes the text of a second the kept one; false when none can be kept.
+static bool keep(HeldDate &held, int64_t second) {
+  if (held.hasText && held.second == second) return true;
+  if (held.varies) return false;
+  held.hasText = false;
+  CxUStringBuffRestart(&held.text);
+  UErrorCode status = U_ZERO_ERROR;
+  const icu::LocalUFieldPositionIteratorPointer fields{ufieldpositer_open(&status)};
+  if (U_FAILURE(status)) return false;
+  const double time = static_cast<double>(second) * 1000;
+  if (!appendDate(&held.text, held, time, fields.getAlias(), &status)) return false;
+  const std::optional<int32_t> fraction = findFraction(held.text, fields.getAlias());
+  held.varies = U_FAILURE(status) || !fraction;
+  if (held.varies) return false;
+  held.fraction = *fraction;
+  held.second = second;
+  held.hasText = true;
+  return true;
+}
+
+static uint8_t appendKept(CxUStringBuff *text, const HeldDate &held, int32_t millis) {
+  if (!CxUStringBuffAppendUStr(text, held.text.data)) return 0;
+  if (held.fraction < 0) return 1;
+  UChar *digits = text->data + text->length - held.text.length + held.fraction;
+  for (int32_t at = kMillisDigits - 1; at >= 0; --at, millis /= 10)
+    digits[at] = static_cast<UChar>(digits[at] + millis % 10);
+  return 1;
+}
+
+// Nothing for a time that is not a whole number, or is not one any more with a zone's offset added.
+static std::optional<Moment> momentOf(double time) {
+  constexpr double kMaxWhole = 4503599627370496.0;  // 2 to the power 52
+  if (!(time >= -kMaxWhole && time <= kMaxWhole)) return std::nullopt;
+  const auto whole = static_cast<int64_t>(time);
+  if (static_cast<double>(whole) != time) return std::nullopt;
+  const int64_t millis = (whole % 1000 + 1000) % 1000;
+  return Moment{(whole - millis) / 1000, static_cast<int32_t>(millis)};
+}
+
+static uint8_t appendBy(HeldDate &held, CxUStringBuff *text, double time) {
+  const std::optional<Moment> moment = momentOf(time);
+  if (moment && keep(held, moment->second)) return appendKept(text, held, moment->millis);
+  UErrorCode status = U_ZERO_ERROR;
+  return appendDate(text, held, time, nullptr, &status);
+}
+
+uint8_t qlxAppendHeldDate(CxUStringBuff *text, const char *pattern, double time) {
+  const HeldFormatsLock lock;
+  qlxIntlCheckHeldLocale();
+  qlxIntlCheckHeldZone();
+  qlxIntlCheckHeldCodePage();
+  HeldDate *held = fetch(pattern);
+  if (!held) return 0;
+  held->lastUse = ++gUses;
+  return appendBy(*held, text, time);
+}

@@ -1,0 +1,87 @@
+// ICU formats that are held between calls. Opening a date format costs several times what
+// formatting with it does, and parsing a message pattern about twenty times; the text of a second
+// changes only in its milliseconds. What comes out is, byte for byte, what opening anew for every
+// call gives: a held format is good for the default locale, time zone and code page that it was
+// made under, and when one of them is another by now, everything is dropped. Bounded; the one not
+// used for longest goes.
+//
+// A lock of its own guards all of it, since formatting a date takes no API lock. Whoever holds it
+// calls nothing that takes a lock of this library, and no host's code.
+#ifndef QLX_SRC_QLXHELDFORMATS_H
+#define QLX_SRC_QLXHELDFORMATS_H
+
+#include <cstdint>
+
+#include <qlx/types.h>
+
+#include "util/CxUStringBuff.h"
+
+inline constexpr int kMaxHeldMessages = 64;
+inline constexpr int kMaxHeldDates = 16;
+
+QLX_BEGIN_DECLS
+
+// Appends the pattern, formatted with the arguments in a locale (null is the default locale), as
+// u_vformatMessage() formats it. Null args read as zeros: a number is 0, a date is 1970, and a text
+// is a null string, which ICU answers with U_ILLEGAL_ARGUMENT_ERROR. Returns the units appended; 0
+// with the buffer's text unchanged when *status is a failure and when the text is empty. When
+// memory runs out *status is U_MEMORY_ALLOCATION_ERROR.
+uint32_t qlxAppendHeldMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
+                              va_list *args, UErrorCode *status);
+
+// Appends a time in milliseconds since 1970-01-01 UTC, formatted by an 8-bit date pattern in the
+// default locale and zone; a null pattern is "yyyy-MM-dd HH:mm:ss.SSS" and the offset from UTC.
+// Returns 1, or 0 when memory ran out; what ICU cannot format is empty.
+uint8_t qlxAppendHeldDate(CxUStringBuff *text, const char *pattern, double time);
+
+// Drops everything; formatting afterwards holds anew.
+void qlxDropHeldFormats(void);
+
+// For a fork: the lock is taken before it and given back after it, in the parent and in the child.
+void qlxHeldFormatsLock(void);
+void qlxHeldFormatsUnlock(void);
+
+// For the modules that hold, which have the lock.
+void qlxIntlDropHeldMessages(void);
+void qlxIntlDropHeldDates(void);
+
+// Each drops everything when that default is not the one of its last call.
+void qlxIntlCheckHeldLocale(void);
+void qlxIntlCheckHeldZone(void);
+void qlxIntlCheckHeldCodePage(void);
+
+QLX_END_DECLS
+
+class HeldFormatsLock {
+ public:
+  HeldFormatsLock() { qlxHeldFormatsLock(); }
+  ~HeldFormatsLock() { qlxHeldFormatsUnlock(); }
+  HeldFormatsLock(const HeldFormatsLock &) = delete;
+  HeldFormatsLock &operator=(const HeldFormatsLock &) = delete;
+};
+
+// Appends what format(room, units, status) writes straight into the buffer's block. As ICU's calls
+// do, it answers the units needed, and is asked again only when they did not fit. Returns the units
+// appended; 0 with the text unchanged when *status is a failure.
+template <typename Format>
+uint32_t qlxAppendFormatted(CxUStringBuff *text, UErrorCode *status, const Format &format) {
+  for (uint32_t needed = 0;;) {
+    *status = U_MEMORY_ALLOCATION_ERROR;
+    if (!cxUStringBuffHasCapacity(text, needed)) return 0;
+    *status = U_ZERO_ERROR;
+    UChar *const end = text->data + text->length;
+    const uint32_t room = text->capacity / sizeof(UChar) - text->length;
+    const int32_t answer = format(end, static_cast<int32_t>(room), status);
+    needed = answer > 0 ? static_cast<uint32_t>(answer) : 0;
+    const bool failed = U_FAILURE(*status) && *status != U_BUFFER_OVERFLOW_ERROR;
+    if (!failed && needed < room && U_SUCCESS(*status)) {
+      end[needed] = 0;
+      text->length += needed;
+      return needed;
+    }
+    end[0] = 0;
+    if (failed || needed < room) return 0;
+  }
+}
+
+#endif

@@ -1,0 +1,205 @@
+// Parsed message patterns, held by pattern and locale.
+#include "QlxHeldFormats.h"
+
+#include <algorithm>
+#include <cstring>
+#include <string_view>
+#include <utility>
+
+#include <unicode/uchar.h>
+#include <unicode/umsg.h>
+#include <unicode/ustring.h>
+
+#include <qlx/memory.h>
+#include <qlx/ustring.h>
+
+#include "util/CxOwned.h"
+
+// What is held, by what: a pattern in a locale. One look at the pattern tells the rest.
+struct PatternKey {
+  const char *locale;  // null is the default locale, and not the same as ""
+  std::u16string_view pattern;
+  uint32_t hash;  // of the pattern
+  bool isPlain;   // without braces and apostrophes: its own text, in every locale
+};
+
+struct HeldMessage {
+  UMessageFormat *format;  // null: a free place, all zero
+  PatternKey key;          // with copies of the two texts, owned
+  bool usesZone;
+  uint64_t lastUse;  // larger is later
+};
+
+static HeldMessage gMessages[kMaxHeldMessages];
+static uint64_t gUses;
+
+// Missing arguments read as zeros up to this many.
+static constexpr int32_t kMaxZeroArgs = 64;
+
+static void drop(HeldMessage &held) {
+  umsg_close(held.format);
+  OslMemoryFree(const_cast<char *>(held.key.locale));
+  OslMemoryFree(const_cast<UChar *>(held.key.pattern.data()));
+  held = {};
+}
+
+void qlxIntlDropHeldMessages(void) {
+  for (HeldMessage &held : gMessages)
+    if (held.format) drop(held);
+}
+
+static PatternKey keyOf(const char *locale, const UChar *pattern) {
+  uint32_t hash = 2166136261U;  // FNV-1a
+  bool isPlain = true;
+  const UChar *end = pattern;
+  for (; *end; ++end) {
+    hash = (hash ^ *end) * 16777619U;
+    if (*end == u'{' || *end == u'}' || *end == u'\'') isPlain = false;
+  }
+  return {locale, {pattern, static_cast<size_t>(end - pattern)}, hash, isPlain};
+}
+
+static bool sameLocale(const char *a, const char *b) {
+  return a && b ? std::strcmp(a, b) == 0 : a == b;
+}
+
+static bool sameKey(const PatternKey &a, const PatternKey &b) {
+  return a.hash == b.hash && a.pattern == b.pattern && sameLocale(a.locale, b.locale);
+}
+
+static HeldMessage *find(const PatternKey &key) {
+  for (HeldMessage &held : gMessages)
+    if (held.format && sameKey(held.key, key)) return &held;
+  return nullptr;
+}
+
+// The held format that the defaults of this moment would give too.
+static HeldMessage *findCurrent(const PatternKey &key) {
+  qlxIntlCheckHeldLocale();
+  HeldMessage *held = find(key);
+  if (!held || !held->usesZone) return held;
+  qlxIntlCheckHeldZone();
+  return held->format ? held : nullptr;
+}
+
+// Whether an argument may have the type date or time: where none has, the zone, which is costly to
+// ask for, need not be looked at. Types are words in any mix of case.
+static bool mayUseZone(std::u16string_view pattern) {
+  for (size_t at = 0; at + 4 <= pattern.size(); ++at) {
+    const UChar *word = pattern.data() + at;
+    for (const UChar *type : {u"date", u"time"})
+      if (u_strncasecmp(word, type, 4, U_FOLD_CASE_DEFAULT) == 0) return true;
+  }
+  return false;
+}
+
+// ICU crashes in a date style of a locale whose name begins with more than a language.
+static bool hasLanguage(const char *locale) {
+  char language[ULOC_LANG_CAPACITY];
+  UErrorCode status = U_ZERO_ERROR;
+  uloc_getLanguage(locale, language, sizeof language, &status);
+  return U_SUCCESS(status) && status != U_STRING_NOT_TERMINATED_WARNING;
+}
+
+static icu::LocalUMessageFormatPointer open(const PatternKey &key, bool usesZone,
+                                            UErrorCode *status) {
+  if (usesZone) {
+    qlxIntlCheckHeldZone();
+    if (!hasLanguage(key.locale)) *status = U_ILLEGAL_ARGUMENT_ERROR;
+  }
+  return icu::LocalUMessageFormatPointer{umsg_open(
+      key.pattern.data(), static_cast<int32_t>(key.pattern.size()), key.locale, nullptr, status)};
+}
+
+// Takes the format over when there is memory to hold it.
+static void hold(const PatternKey &key, bool usesZone, icu::LocalUMessageFormatPointer &format) {
+  OwnedStr locale{OslStringDup(key.locale)};
+  OwnedUStr pattern{CxUStringDup(key.pattern.data())};
+  if (!pattern || (key.locale && !locale)) return;
+  HeldMessage &place = *std::ranges::min_element(gMessages, {}, &HeldMessage::lastUse);
+  drop(place);
+  place = {format.orphan(),
+           {locale.release(), {pattern.release(), key.pattern.size()}, key.hash, key.isPlain},
+           usesZone,
+           ++gUses};
+}
+
+// The highest number that an argument of the pattern may have, or -1. What only looks like an
+// argument, in quotes, counts as well.
+static int32_t highestArgument(std::u16string_view pattern) {
+  int32_t highest = -1;
+  for (size_t at = 0; (at = pattern.find(u'{', at)) != pattern.npos;) {
+    ++at;
+    while (at < pattern.size() && u_hasBinaryProperty(pattern[at], UCHAR_PATTERN_WHITE_SPACE)) ++at;
+    int32_t number = -1;
+    for (; at < pattern.size() && pattern[at] >= u'0' && pattern[at] <= u'9'; ++at)
+      number = std::min(std::max(number, 0) * 10 + (pattern[at] - u'0'), kMaxZeroArgs);
+    highest = std::max(highest, number);
+  }
+  return highest;
+}
+
+static int32_t formatList(const UMessageFormat *format, UChar *room, int32_t units,
+                          UErrorCode *status, ...) {
+  va_list args;
+  va_start(args, status);
+  const int32_t needed = umsg_vformat(format, room, units, args, status);
+  va_end(args);
+  return needed;
+}
+
+// Numbers and pointers travel in registers of two kinds and then on the stack: with this many zeros
+// of both kinds whatever is read is a zero.
+template <size_t... index>
+static int32_t formatZeros(const UMessageFormat *format, UChar *room, int32_t units,
+                           UErrorCode *status, std::index_sequence<index...>) {
+  return formatList(format, room, units, status, 0.0, 0.0, 0.0, 0.0, 0.0, 0.0, 0.0, 0.0,
+                    (static_cast<void>(index), int64_t{0})...);
+}
+
+static int32_t formatWithoutArgs(const UMessageFormat *format, std::u16string_view pattern,
+                                 UChar *room, int32_t units, UErrorCode *status) {
+  if (highestArgument(pattern) >= kMaxZeroArgs) {
+    *status = U_ILLEGAL_ARGUMENT_ERROR;
+    return -1;
+  }
+  return formatZeros(format, room, units, status, std::make_index_sequence<kMaxZeroArgs + 8>{});
+}
+
+static uint32_t append(CxUStringBuff *text, const UMessageFormat *format,
+                       std::u16string_view pattern, va_list *args, UErrorCode *status) {
+  return qlxAppendFormatted(text, status, [&](UChar *room, int32_t units, UErrorCode *answer) {
+    if (!args) return formatWithoutArgs(format, pattern, room, units, answer);
+    va_list copy;
+    va_copy(copy, *args);
+    const int32_t needed = umsg_vformat(format, room, units, copy, answer);
+    va_end(copy);
+    return needed;
+  });
+}
+
+static uint32_t appendPlain(CxUStringBuff *text, const UChar *pattern, UErrorCode *status) {
+  const uint32_t before = text->length;
+  const bool appended = CxUStringBuffAppendUStr(text, pattern) == 1;
+  *status = appended ? U_ZERO_ERROR : U_MEMORY_ALLOCATION_ERROR;
+  return text->length - before;
+}
+
+uint32_t qlxAppendHeldMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
+                              va_list *args, UErrorCode *status) {
+  const PatternKey key = keyOf(locale, pattern);
+  if (key.isPlain) return appendPlain(text, pattern, status);
+
+  const HeldFormatsLock lock;
+  if (HeldMessage *held = findCurrent(key)) {
+    held->lastUse = ++gUses;
+    return append(text, held->format, key.pattern, args, status);
+  }
+  const bool usesZone = mayUseZone(key.pattern);
+  *status = U_ZERO_ERROR;
+  icu::LocalUMessageFormatPointer fresh = open(key, usesZone, status);
+  if (U_FAILURE(*status)) return 0;
+  const UMessageFormat *format = fresh.getAlias();
+  hold(key, usesZone, fresh);
+  return append(text, format, key.pattern, args, status);
+}

@@ -1,6 +1,5 @@
 // A small host in C++: the same messages in three languages, chosen while the program runs, on the
 // console and in a file.
-#include <clocale>
 #include <cstdio>
 #include <initializer_list>
 #include <memory>
@@ -40,7 +39,6 @@ int main(int argc, char **argv) {
     fprintf(stderr, "usage: localized CONFIG BUNDLE\n");
     return 2;
   }
-  setlocale(LC_CTYPE, "C.UTF-8");  // text leaves the library in the locale's encoding
   if (!QlxOpenToolkit(argv[1], nullptr)) {
     fprintf(stderr, "localized: %s cannot be used\n", argv[1]);
     return 1;

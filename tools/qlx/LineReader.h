@@ -11,9 +11,10 @@
 
 #include "StopSignal.h"
 
-// Bytes are decoded from the locale's encoding; what is no text in it becomes U+FFFD, and so does
-// NUL, which ends a text in the library. A line of more than kMaxLineBytes comes in pieces. A last
-// line needs no line feed. After a stop, what was read already still comes, and then the end.
+// Bytes are decoded by ICU's default converter, as the library encodes them again: UTF-8 here. What
+// is no text in it becomes U+FFFD, and so does NUL, which ends a text in the library. A line of
+// more than kMaxLineBytes comes in pieces. A last line needs no line feed. After a stop, what was
+// read already still comes, and then the end.
 class LineReader {
  public:
   static constexpr size_t kMaxLineBytes = 1 << 20;
@@ -35,7 +36,7 @@ class LineReader {
 
   const int descriptor_;
   const StopSignal &stop_;
-  icu::LocalUConverterPointer converter_;  // null: the locale's encoding is unknown to ICU
+  icu::LocalUConverterPointer converter_;
   std::array<char, 1 << 16> buffer_;
   size_t at_ = 0, end_ = 0;  // what of the buffer has not been decoded yet
   bool isPiece_ = false;     // the last line was cut: its rest follows, perhaps a bare line feed

@@ -2,10 +2,8 @@
 #include <clocale>
 #include <csignal>
 #include <cstdio>
-#include <cstring>
 
 #include <fcntl.h>
-#include <langinfo.h>
 #include <unistd.h>
 
 #include <CLI/CLI.hpp>
@@ -17,12 +15,10 @@
 
 static constexpr int kWrongUsage = 2;
 
-// Characters and messages follow the environment; numbers in configurations do not. The "C" locale
-// promises no more than ASCII, so there text is taken for UTF-8, which comes out as it went in.
+// Messages follow the environment; numbers in configurations do not.
 static void followTheEnvironmentsLocale() {
   setlocale(LC_MESSAGES, "");
   setlocale(LC_CTYPE, "");
-  if (strcmp(nl_langinfo(CODESET), "ANSI_X3.4-1968") == 0) setlocale(LC_CTYPE, "C.UTF-8");
 }
 
 // A log file must never be opened as the descriptor that the console handler writes to.
@@ -67,7 +63,7 @@ static void addLogCommand(CLI::App &app, LogOptions &options) {
                   "milliseconds since 1970)");
   log->footer(
       "Each line is one record, and only text: braces and apostrophes come out as they went in. "
-      "Bytes that are no text in the locale's encoding, and NUL, become U+FFFD; a line of more "
+      "Text is UTF-8, whatever the locale; other bytes, and NUL, become U+FFFD; a line of more "
       "than 1 MiB becomes several records. SIGINT and SIGTERM end the input.\n"
       "Exit status: 0 when every record was written, 1 when one was not, 2 for wrong usage.");
 }

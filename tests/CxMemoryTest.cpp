@@ -25,6 +25,10 @@ TEST(CxMemoryTest, CallocOfNothingGivesNullWithoutAllocating) {
 }
 
 TEST(CxMemoryTest, CallocFillsWithZeroes) {
+  void *const used = OslMemoryMalloc(1000);  // so that the allocator has a block full of bytes
+  ASSERT_NE(used, nullptr);
+  memset(used, 'x', 1000);
+  OslMemoryFree(used);
   char *const block = static_cast<char *>(OslMemoryCalloc(100, 10));
   ASSERT_NE(block, nullptr);
   EXPECT_EQ(std::string(block, 1000), std::string(1000, '\0'));

@@ -15,7 +15,8 @@ CxStatus CxDirectoryOpen(CxDirectory *directory, const char *path) {
   if (!directory) return cxFailure(EINVAL);
   *directory = nullptr;
   CxFilePath local;
-  if (!CxInitFilePath(&local, path) || CxFilePathIsDir(&local) != 0) return cxFailure(EINVAL);
+  CxInitFilePath(&local, path);
+  if (CxFilePathIsDir(&local) != 0) return cxFailure(EINVAL);  // also for a path that is unfit
   *directory = opendir(local.path);  // close-on-exec by itself
   return cxStatusOfCall(*directory != nullptr);
 }

@@ -17,7 +17,7 @@ CxStatus CxDirectoryOpen(CxDirectory *directory, const char *path) {
   CxFilePath local;
   CxInitFilePath(&local, path);
   if (CxFilePathIsDir(&local) != 0) return cxFailure(EINVAL);  // also for a path that is unfit
-  *directory = opendir(local.path);  // close-on-exec by itself
+  *directory = opendir(local.path);                            // close-on-exec by itself
   return cxStatusOfCall(*directory != nullptr);
 }
 

@@ -9,7 +9,6 @@
 #include <qlx/buffers.h>
 #include <qlx/files.h>
 #include <qlx/memory.h>
-#include <qlx/proplist.h>
 
 #include "QlxLogManager.h"
 
@@ -75,8 +74,9 @@ static uint8_t emitToLogManager(char *key, const char *value) {
 
 uint8_t qlxRdprEmitCfg(ReadPropsContext *context) {
   char *key = context->keyBuf.data;
+  if (!key) return 0;
   const char *value = context->valBuf.data ? context->valBuf.data : "";
-  return context->propList ? CxPropListPutStr(context->propList, key, value)
+  return context->propList ? cxPropIndexPut(&context->index, context->propList, key, value)
                            : emitToLogManager(key, value);
 }
 
@@ -330,6 +330,7 @@ uint8_t qlxDoReadProps(const char *path, CxPropList *propList, CxStatus *status)
   readAll(&context, status);
   CxStringBuffDiscard(&context.keyBuf);
   CxStringBuffDiscard(&context.valBuf);
+  cxPropIndexDiscard(&context.index);
   context.status = CxFileClose(&context.file);
   if (context.status.kind != '-') {
     *status = context.status;

@@ -3,7 +3,7 @@
 #ifndef QLX_SRC_QLXREADPROPS_H
 #define QLX_SRC_QLXREADPROPS_H
 
-#include <qlx/types.h>
+#include "util/CxPropList.h"
 
 QLX_BEGIN_DECLS
 
@@ -37,6 +37,7 @@ typedef struct ReadPropsContext {
   CxPropList *propList;  // borrowed; null sends the pairs to the log manager
   int32_t state;         // a ReadPropsState; kStartLine at first
   uint8_t prevByte;      // the byte before the current one, 0 at first
+  CxPropIndex index;     // of the property list, for this read
 } ReadPropsContext;
 
 typedef int32_t (*ReadPropsStateFunction)(uint8_t byte, ReadPropsContext *context);

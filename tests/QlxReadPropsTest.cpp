@@ -196,6 +196,28 @@ TEST_F(QlxReadPropsTest, ReadsFilesOfManyBlocksByteForByte) {
   EXPECT_EQ(pairs(), expected);
 }
 
+// Long lists are looked up by an index, which must find what a walk finds.
+TEST_F(QlxReadPropsTest, RepeatedKeysKeepTheirFirstPlaceInLongFilesToo) {
+  std::string text, expected;
+  for (int round = 0; round < 3; ++round) {
+    for (int i = 0; i < 1000; ++i)
+      text += "k" + std::to_string(i) + "=" + std::to_string(round) + "\n";
+  }
+  for (int i = 0; i < 1000; ++i) expected += "[k" + std::to_string(i) + "|2]";
+  CxPropListPutStr(&list, "k7", "old");
+  EXPECT_EQ(read(text), 1);
+  EXPECT_EQ(pairs(), "[k7|2]" + std::string(expected).erase(expected.find("[k7|"), 6));
+}
+
+TEST_F(QlxReadPropsTest, OfEqualKeysInAListTheFirstOneGetsTheValue) {
+  for (int i = 0; i < 100; ++i) CxPropListPutStr(&list, ("k" + std::to_string(i)).c_str(), "old");
+  OslMemoryFree(list.entries[90].key);
+  list.entries[90].key = OslStringDup("k80");  // as only a host can do
+  EXPECT_EQ(read("k80=new\n"), 1);
+  EXPECT_STREQ(list.entries[80].value, "new");
+  EXPECT_STREQ(list.entries[90].value, "old");
+}
+
 TEST_F(QlxReadPropsTest, KeysAndValuesHaveNoLimit) {
   const std::string key(30000, 'k'), value(50000, 'v');
   EXPECT_EQ(read(key + "=" + value), 1);
@@ -241,8 +263,9 @@ TEST_F(QlxReadPropsTest, TheFileIsClosedHoweverReadingEnds) {
 }
 
 TEST_F(QlxReadPropsTest, EveryAllocationMayFail) {
-  const std::string longValue(3000, 'v');
-  dir.write("f", "a=1\nb=\\u0041\nc=" + longValue + "\n#\n");
+  std::string text = "a=1\nb=\\u0041\nc=" + std::string(3000, 'v') + "\n";
+  for (int i = 0; i < 70; ++i) text += "k" + std::to_string(i) + "=1\n";
+  dir.write("f", text);
   FailingMemory memory;
   for (uint64_t nth = 1;; ++nth) {
     memory.failFrom(nth);

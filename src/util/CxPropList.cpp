@@ -1,5 +1,7 @@
 // The property list. Its array holds plain pointers, so entries move by assignment.
-#include <qlx/proplist.h>
+#include "CxPropList.h"
+
+#include <utility>
 
 #include "CxOwned.h"
 
@@ -34,16 +36,18 @@ static uint8_t append(CxPropList *list, const char *key, OwnedStr value) {
   return 1;
 }
 
-uint8_t CxPropListPutStr(CxPropList *list, const char *key, const char *value) {
-  if (!list || !key || !value) return 0;
+uint8_t cxPropListPutAt(CxPropList *list, int32_t index, const char *key, const char *value) {
   OwnedStr copy{OslStringDup(value)};
   if (!copy) return 0;
-  const int32_t index = indexOf(list, key);
   if (index < 0) return append(list, key, std::move(copy));
   CxPropEntry &entry = list->entries[index];
   OslMemoryFree(entry.value);
   entry.value = copy.release();
   return 1;
+}
+
+uint8_t CxPropListPutStr(CxPropList *list, const char *key, const char *value) {
+  return list && key && value ? cxPropListPutAt(list, indexOf(list, key), key, value) : 0;
 }
 
 const char *CxPropListPeekStr(const CxPropList *list, const char *key, uint8_t *found) {

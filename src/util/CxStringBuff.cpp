@@ -52,7 +52,10 @@ static uint8_t append(CxStringBuff *buffer, const char *text, uint32_t count, in
 }
 
 uint8_t CxStringBuffAppendChar(CxStringBuff *buffer, char byte) {
-  return append(buffer, &byte, 1, 1);
+  if (!cxStringBuffHasCapacity(buffer, 1)) return 0;
+  buffer->data[buffer->length++] = byte;
+  buffer->data[buffer->length] = 0;
+  return 1;
 }
 
 namespace {

@@ -58,7 +58,8 @@ QLX_API CxStatus CxProcessGetCwd(char *buffer, uint32_t size);
  *
  * @param id         receives the child's id, -1 on failure; null: 22, as for a null or empty path
  * @param path       the program's file; not searched for
- * @param arguments  as for execv(): the program's name first, null last
+ * @param arguments  as for execv(): the program's name first, null last; a null vector is the path
+ *                   alone
  */
 QLX_API CxStatus CxProcessCreate(int64_t *id, const char *path, char *const arguments[]);
 

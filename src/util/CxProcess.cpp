@@ -28,7 +28,8 @@ CxStatus cxIntlProcessCreate(int64_t *id, const char *path, char *const argument
   const pid_t child = forkCall();
   if (child == -1) return cxFailure(errno);
   if (child == 0) {
-    execv(path, arguments);
+    char *const nameOnly[] = {const_cast<char *>(path), nullptr};
+    execv(path, arguments ? arguments : nameOnly);
     return kCxSuccess;  // Deliberate: in the child, with the id -1; the caller ends it
   }
   *id = child;

@@ -25,7 +25,7 @@ readConf() {
   while IFS= read -r line || [ -n "$line" ]; do
     case $line in '' | '#'*) continue ;; esac
     key=${line%% = *}
-    case $key in *[!A-Za-z]*) key='' ;; esac
+    case $key in "$line" | *[!A-Za-z]*) key='' ;; esac
     case " $* " in *" $key "*) ;; *) stop "$conf: unknown line: $line" ;; esac
     eval "[ -z \"\${$key+set}\" ]" || stop "$conf: \"$key\" stands there twice"
     eval "$key=\${line#* = }"

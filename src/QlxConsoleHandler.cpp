@@ -31,10 +31,11 @@ static void print(const UChar *text) {
   qlxI18PrintUCharAsLocal(stdout, text);
 }
 
+// Prints a header or a trailer and frees it; null prints nothing.
 static void printFrame(char *frame) {
   const OwnedStr text{frame};
   const OwnedUStr wide{CxUStringDupStrToUChar(text.get())};
-  if (wide) print(wide.get());
+  print(wide.get());
 }
 
 void QlxConsoleHandlerFOpen(QlxObject *handler) {

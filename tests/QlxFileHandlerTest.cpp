@@ -325,13 +325,14 @@ TEST_F(FileHandlerTest, KeepsAsManyGenerationsAsItIsTold) {
 }
 
 TEST_F(FileHandlerTest, NeverRollsWithFewerThanTwoGenerations) {
+  formatter->header = "head\n";  // shows that the file stays open, too
   set("maxFileBytes", "1");
   for (const char *count : {"1", "0", "-5"}) {
     set("maxFiles", count);
     log(u"1");
     log(u"2");
   }
-  EXPECT_EQ(generations(), "1|2|1|2|1|2| - - -");
+  EXPECT_EQ(generations(), "head|1|2|head|1|2|head|1|2| - - -");
 }
 
 TEST_F(FileHandlerTest, NeverRollsAtANegativeLimit) {
@@ -339,6 +340,23 @@ TEST_F(FileHandlerTest, NeverRollsAtANegativeLimit) {
   log(u"1");
   log(u"2");
   EXPECT_EQ(generations(), "1|2| - - -");
+}
+
+// A file larger than 32 bits count, without a byte on the disk.
+TEST_F(FileHandlerTest, ComparesSizesIn64Bits) {
+  const uintmax_t huge = (uintmax_t{5} << 30) + 1;
+  dir.write("app.log", "");
+  std::error_code refused;
+  std::filesystem::resize_file(dir.path("app.log"), huge, refused);
+  if (refused) GTEST_SKIP() << "no room for a sparse file: " << refused.message();
+  set("maxFileBytes", "-1");
+  log(u"1");
+  log(u"2");
+  EXPECT_EQ(std::filesystem::file_size(dir.path("app.log")), huge + 4);
+  set("maxFileBytes", "2147483647");
+  log(u"3");
+  EXPECT_EQ(dir.read("app.log"), "3\n");
+  EXPECT_EQ(std::filesystem::file_size(dir.path("app1.log")), huge + 4);
 }
 
 TEST_F(FileHandlerTest, RollsAtEveryEventWithALimitOfZero) {
@@ -357,6 +375,7 @@ TEST_F(FileHandlerTest, RollsAFileThatIsFullWhenItIsOpened) {
   set("maxFileBytes", "5");
   log(u"new");
   EXPECT_EQ(generations(), "head|new| full|tail| - -");
+  EXPECT_EQ(vars()->size, dir.read("app.log").size());
 }
 
 TEST_F(FileHandlerTest, CountsWhatOtherProcessesWrite) {
@@ -470,6 +489,7 @@ TEST_F(FileHandlerTest, WritesTheTrailerAtEveryClosing) {
   log(u"1");
   close();
   close();
+  EXPECT_EQ(formatter->trailersAsked, 1);
   log(u"2");
   QlxRemListener(logger.get(), handler.get());
   handler.reset();
@@ -513,6 +533,14 @@ TEST_F(FileHandlerTest, RollsOverAlsoWhenItDoesNotAppend) {
   log(u"1");
   log(u"2");
   EXPECT_EQ(generations(), "2| 1| - -");
+}
+
+TEST_F(FileHandlerTest, WritesOnAtItsOwnPlaceWhenItDoesNotAppend) {
+  set("appending", "false");
+  log(u"1");
+  std::ofstream(dir.path("app.log"), std::ios::app) << "foreign\n";
+  log(u"2");
+  EXPECT_EQ(dir.read("app.log"), "1\n2\nreign\n");
 }
 
 TEST_F(FileHandlerTest, KeepsItsDescriptorFromOtherPrograms) {
@@ -633,10 +661,12 @@ TEST_F(FileHandlerTest, IgnoresNullAndObjectsWithoutVariables) {
     qlxFileHandlerCfgPerms(object, "644");
     qlxFileHandlerCfgDirPerms(object, "755");
   }
-  QlxFileHandlerFCfgChange(handler.get(), nullptr);
   QlxFileUHandlerFProcess(handler.get(), nullptr, nullptr);
   QlxFileHandlerFFreeVars(nullptr);
   EXPECT_FALSE(dir.has("app.log"));
+  log(u"1");
+  QlxFileHandlerFCfgChange(handler.get(), nullptr);
+  EXPECT_EQ(vars()->opened, 1);
 }
 
 // ---- Configuration

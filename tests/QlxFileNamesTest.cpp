@@ -60,6 +60,7 @@ INSTANTIATE_TEST_SUITE_P(Names, TrailingBaseDigit,
 TEST(FileNames, PutAnUnderscoreBehindADigitThatWouldRunIntoTheNumber) {
   EXPECT_EQ(take(qlxFHCloseBaseDigits("trace5.log")), "trace5_.log");
   EXPECT_EQ(take(qlxFHCloseBaseDigits("app7")), "app7_");
+  EXPECT_EQ(take(qlxFHCloseBaseDigits("7")), "7_");
   EXPECT_EQ(take(qlxFHCloseBaseDigits("app.log")), "app.log");
   EXPECT_EQ(take(qlxFHCloseBaseDigits("")), "");
   EXPECT_EQ(qlxFHCloseBaseDigits(nullptr), nullptr);
@@ -248,6 +249,14 @@ TEST_F(Generations, MoveUpAlsoWhenSomeAreMissing) {
   vars->maxFiles = 4;
   qlxFileHandlerDoRollover(vars.get());
   EXPECT_EQ(contents(), "-0-2-");
+}
+
+TEST_F(Generations, LoseTheOldestAlsoWhenNoneTakesItsPlace) {
+  dir.write("app.log", "0");
+  dir.write("app2.log", "2");
+  vars->maxFiles = 3;
+  qlxFileHandlerDoRollover(vars.get());
+  EXPECT_EQ(contents(), "-0---");
 }
 
 TEST_F(Generations, MoveOnlyFromTheLowestThatIsAskedFor) {

@@ -133,6 +133,21 @@ TEST_F(HandlerTest, AnythingElseThanAHandlerGivesNothingAndIsNotChanged) {
   EXPECT_EQ(plain->kind2.word, 0u);
 }
 
+TEST_F(HandlerTest, GivesNothingWhenItsClassIsNotAHandlers) {
+  formatter->header = formatter->trailer = "x";
+  QlxHandlerSetFormatter(handler.get(), plain.get());
+  ObjClass *real = handler->objClass;
+  ObjClass other = *real;
+  other.kind = Filter;
+  handler->objClass = &other;
+  EXPECT_EQ(QlxHandlerGetFormatter(handler.get()), nullptr);
+  EXPECT_EQ(QlxHandlerGetFmtHeader(handler.get()), nullptr);
+  EXPECT_EQ(QlxHandlerGetFmtTrailer(handler.get()), nullptr);
+  QlxHandlerSetFormatter(handler.get(), nullptr);
+  handler->objClass = real;
+  EXPECT_EQ(formatterName(), "plain");
+}
+
 TEST_F(HandlerTest, AnObjectWithoutClassGivesNothingAndIsNotChanged) {
   QlxObject bare = {};
   QlxHandlerSetFormatter(&bare, plain.get());

@@ -25,6 +25,7 @@ class PlainFormatter {
   std::optional<std::string> header, trailer;  // without a value: null
   bool silent = false;                         // formats to null
   int formatted = 0;                           // calls of format
+  int trailersAsked = 0;                       // calls of getTrailer
 
  private:
   static PlainFormatter *&current() {
@@ -45,7 +46,10 @@ class PlainFormatter {
     return text ? OslStringDup(text->c_str()) : nullptr;
   }
   static char *getHeader(QlxObject *) { return duplicate(current()->header); }
-  static char *getTrailer(QlxObject *) { return duplicate(current()->trailer); }
+  static char *getTrailer(QlxObject *) {
+    ++current()->trailersAsked;
+    return duplicate(current()->trailer);
+  }
 };
 
 #endif

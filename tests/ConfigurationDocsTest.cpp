@@ -1,0 +1,91 @@
+// docs/configuration.md against the key tables of the sources: each section has the rows of one
+// table.
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <map>
+#include <regex>
+#include <set>
+#include <string>
+
+namespace {
+
+using Keys = std::map<std::string, std::set<std::string>>;  // of a section, or of a table
+
+// Which section tells of which table.
+const std::map<std::string, std::string> kSectionOfTable = {
+    {"kCommonKeys", "Every class"},          {"kLoggerKeys", "qlx_basiclogger"},
+    {"kLevelFilterKeys", "qlx_levelfilter"}, {"kHandlerKeys", "Every handler"},
+    {"kFileHandlerKeys", "qlx_filehandler"}, {"kFormatterKeys", "qlx_basicformatter"},
+};
+
+std::filesystem::path projectFile(const char *name) {
+  return std::filesystem::path(QLX_HEADERS).parent_path().parent_path() / name;
+}
+
+std::string contents(const std::filesystem::path &path) {
+  std::ifstream in(path);
+  EXPECT_TRUE(in.is_open()) << path;
+  return {std::istreambuf_iterator<char>(in), {}};
+}
+
+std::set<std::string> firstGroups(const std::string &text, const char *pattern) {
+  const std::regex row(pattern);
+  std::set<std::string> found;
+  for (std::sregex_iterator it(text.begin(), text.end(), row), end; it != end; ++it) {
+    found.insert((*it)[1]);
+  }
+  return found;
+}
+
+Keys keysOfTables() {
+  static const std::regex table(R"(ConfigKey (k\w+)\[\] = \{([^;]*)\};)");
+  Keys keys;
+  for (const auto &entry : std::filesystem::directory_iterator(projectFile("src"))) {
+    if (entry.path().extension() != ".cpp") continue;
+    const std::string source = contents(entry.path());
+    for (std::sregex_iterator it(source.begin(), source.end(), table), end; it != end; ++it) {
+      keys[(*it)[1]] = firstGroups((*it)[2], R"re(\{"(\w+)",)re");
+    }
+  }
+  return keys;
+}
+
+// The first cells in code type below each heading that are keys: "logging", but not "FATAL".
+Keys keysOfSections() {
+  const std::string page = contents(projectFile("docs/configuration.md"));
+  Keys keys;
+  for (size_t at = page.find("\n## "); at != std::string::npos;) {
+    const size_t next = page.find("\n## ", at + 1);
+    const size_t headingEnd = page.find('\n', at + 1);
+    const std::string heading = page.substr(at + 4, headingEnd - at - 4);
+    const std::string section = page.substr(headingEnd, next - headingEnd);
+    keys[heading] = firstGroups(section, R"(\n\| `(\w+)` \|)");
+    at = next;
+  }
+  return keys;
+}
+
+TEST(ConfigurationPage, HasTheKeysOfEveryTable) {
+  const Keys tables = keysOfTables();
+  Keys sections = keysOfSections();
+  EXPECT_GE(tables.size(), kSectionOfTable.size());
+  for (const auto &[table, keys] : tables) {
+    EXPECT_FALSE(keys.empty()) << table;
+    ASSERT_TRUE(kSectionOfTable.contains(table)) << table << " has no section";
+    EXPECT_EQ(sections[kSectionOfTable.at(table)], keys) << table;
+  }
+}
+
+TEST(ConfigurationPage, HasNoKeysBesideThem) {
+  std::set<std::string> told;
+  for (const auto &[table, section] : kSectionOfTable) told.insert(section);
+  for (const auto &[section, keys] : keysOfSections()) {
+    if (told.contains(section)) continue;
+    EXPECT_EQ(keys, std::set<std::string>{}) << section;
+  }
+}
+
+}  // namespace

@@ -6,6 +6,10 @@ target_compile_options(qlxwarnings INTERFACE
   -Wall -Wextra -Wno-missing-field-initializers $<$<BOOL:${QLX_WERROR}>:-Werror>)
 
 set(QLX_INSTRUMENTED OFF)
+# A program in C needs the part of clang's runtime that the library's C++ asks for.
+if(CMAKE_CXX_COMPILER_ID MATCHES Clang AND (QLX_SANITIZE OR QLX_FUZZ))
+  add_link_options(-fsanitize-link-c++-runtime)
+endif()
 if(QLX_SANITIZE)
   set(QLX_INSTRUMENTED ON)
   add_compile_options(-fsanitize=${QLX_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer)

@@ -26,7 +26,7 @@ step() {
   shift 2
   mkdir -p "$(dirname "$log")"
   if ! "$@" >"$log" 2>&1 </dev/null; then
-    tail -n 40 "$log" >&2
+    grep -vE '^\[[0-9]+/[0-9]+\] ' "$log" | tail -n 40 >&2   # without ninja's steps
     fail "$what failed (all of its output: $log)"
   fi
 }

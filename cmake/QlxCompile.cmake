@@ -6,9 +6,9 @@ target_compile_options(qlxwarnings INTERFACE
   -Wall -Wextra -Wno-missing-field-initializers $<$<BOOL:${QLX_WERROR}>:-Werror>)
 
 set(QLX_INSTRUMENTED OFF)
-# A program in C needs the part of clang's runtime that the library's C++ asks for.
-if(CMAKE_CXX_COMPILER_ID MATCHES Clang AND (QLX_SANITIZE OR QLX_FUZZ))
-  add_link_options(-fsanitize-link-c++-runtime)
+if(QLX_SANITIZE OR QLX_FUZZ)
+  # Programs in C too are linked as C++: the library's C++ asks for that part of the runtime.
+  set(CMAKE_C_LINK_EXECUTABLE "${CMAKE_CXX_LINK_EXECUTABLE}")
 endif()
 if(QLX_SANITIZE)
   set(QLX_INSTRUMENTED ON)

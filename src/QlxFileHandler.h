@@ -28,7 +28,7 @@ typedef struct QlxFileHandlerVars {
   uint8_t logInternalErrs;  // kept without effect
 } QlxFileHandlerVars;
 
-/** Frees the oldest generation's number and moves every file, the active one too, up by one. The
+/** Removes the oldest generation and moves every other file, the active one too, up by one. The
  *  active file is closed; the caller sets the size to 0. Failures are reported, a missing file is
  *  none. */
 void qlxFileHandlerDoRollover(QlxFileHandlerVars *vars);
@@ -36,8 +36,6 @@ void qlxFileHandlerDoRollover(QlxFileHandlerVars *vars);
 /** Sets filePermission, dirPermission from up to four octal digits; other text changes nothing. */
 void qlxFileHandlerCfgPerms(QlxObject *handler, const char *text);
 void qlxFileHandlerCfgDirPerms(QlxObject *handler, const char *text);
-
-QLX_END_DECLS
 
 /** The object's variables; null for a null object and one without variables. */
 QlxFileHandlerVars *qlxFileHandlerVars(QlxObject *handler);
@@ -52,7 +50,7 @@ void qlxKeepFailure(Event *event, CxStatus status);
 /** Makes the directory of the generations; a failure is reported, opening then fails by itself. */
 void qlxFileHandlerMakeDirectory(const QlxFileHandlerVars *vars);
 
-/** 1 when the size, as last measured, calls for a rollover. */
+/** True when the size, as last measured, calls for a rollover. */
 bool qlxFileHandlerIsFull(const QlxFileHandlerVars *vars);
 
 /** Writes all of it: a short write goes on with the rest, an interrupted one is tried again. The
@@ -61,5 +59,7 @@ CxStatus qlxFileHandlerWrite(QlxFileHandlerVars *vars, const char *bytes, uint32
 
 /** Writes a text in the default code page. */
 CxStatus qlxFileHandlerWriteText(QlxFileHandlerVars *vars, const UChar *text);
+
+QLX_END_DECLS
 
 #endif

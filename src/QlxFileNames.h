@@ -27,8 +27,6 @@ void qlxSetFileNameParts(char **out, const char *dir, const char *base, int32_t 
 /** Copies the first 256 bytes of a name, with each backslash as "/", and terminates. */
 void qlxGetNativePath(const char *name, char buffer[257]);
 
-QLX_END_DECLS
-
 /** A new copy of a name in which a digit that would run into a generation's number is followed by
  *  "_"; null for null. */
 char *qlxFHCloseBaseDigits(const char *name);
@@ -38,5 +36,7 @@ char *qlxFHGenerationName(const QlxFileHandlerVars *vars, int32_t generation);
 
 /** Removes the oldest generation and moves those from `lowest` on up by one, the highest first. */
 void qlxFHShiftGenerations(const QlxFileHandlerVars *vars, int32_t lowest);
+
+QLX_END_DECLS
 
 #endif

@@ -25,21 +25,40 @@ QLX_API void QlxBasicHandlerFProcess(QlxObject *handler, Event *event, va_list *
 QLX_API void QlxBasicHandlerFOpen(QlxObject *handler);
 QLX_API void QlxBasicHandlerFClose(QlxObject *handler);
 
-/* The console handler. */
+/*
+ * The console handler: writes to the standard output stream, each text with a line feed of its own.
+ * The first event, or an explicit open, writes the formatter's header; closing writes its trailer.
+ */
 QLX_API void *QlxConsoleHandlerFAllocVars(void);
 QLX_API void QlxConsoleHandlerFFreeVars(void *vars);
 QLX_API void QlxConsoleUHandlerFProcess(QlxObject *handler, Event *event, va_list *args);
 QLX_API void QlxConsoleHandlerFOpen(QlxObject *handler);
 QLX_API void QlxConsoleHandlerFClose(QlxObject *handler);
 
-/* The file handler. */
+/*
+ * The file handler: writes to a file that rolls over by size, with the formatter's header at every
+ * opening and its trailer at every closing. What fails goes to QlxReportPlatformErr(); what fails
+ * while an event is processed is stored in the event's status too. A null event is ignored.
+ */
+/** @return variables with the initial settings; null when memory ran out */
 QLX_API void *QlxFileHandlerFAllocVars(void);
+/** Closes an open file, without the trailer, and frees the variables. */
 QLX_API void QlxFileHandlerFFreeVars(void *vars);
+/** The file handler's keys, and every handler's. All but "logInternalErrs", and a permission
+ *  without a value, close the file first; the next event opens it under the new setting. */
 QLX_API void QlxFileHandlerFCfgChange(QlxObject *handler, const char *key);
+/** Opens as QlxFileHandlerFOpenWithErr() does, writes, and passes the event on in any case. */
 QLX_API void QlxFileUHandlerFProcess(QlxObject *handler, Event *event, va_list *args);
+/** QlxFileHandlerFOpenWithErr() without its answer. */
 QLX_API void QlxFileHandlerFOpen(QlxObject *handler);
-/** Opens the active file or keeps it open, rolling over when it is full. */
+/**
+ * Opens the active file, or keeps it open when it is still there and not full; rolls over a full
+ * one.
+ *
+ * @return success also when there is nothing to open: no variables, or no file name
+ */
 QLX_API CxStatus QlxFileHandlerFOpenWithErr(QlxObject *handler);
+/** Writes the trailer and closes; a closed file stays as it is. */
 QLX_API void QlxFileHandlerFClose(QlxObject *handler);
 
 QLX_END_DECLS

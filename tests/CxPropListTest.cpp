@@ -256,13 +256,14 @@ TEST_F(CxListUtilTest, FailuresChangeNothing) {
   EXPECT_EQ(ensure(0), 0);
   EXPECT_EQ(ensure(-1), 0);
   EXPECT_EQ(ensure(INT32_MAX), 0);
-  EXPECT_EQ(ensure(1 << 20, 1 << 20), 0);  // 2^40 bytes
+  EXPECT_EQ(ensure(1 << 20, (1 << 20) + 1), 0);  // more than 2^40 bytes
   EXPECT_EQ(array, nullptr);
   ensure(5);
   const void *before = array;
   EXPECT_EQ(ensure(1 << 30), 0);
   EXPECT_EQ(ensure(INT32_MAX), 0);
-  EXPECT_EQ(ensure(1 << 20, 1 << 20), 0);
+  EXPECT_EQ(ensure(1 << 30, 1), 0);
+  EXPECT_EQ(ensure(1 << 20, (1 << 20) + 1), 0);
   FailingMemory memory;
   memory.failOnce(1);
   EXPECT_EQ(ensure(6), 0);

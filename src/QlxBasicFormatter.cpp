@@ -131,9 +131,12 @@ UChar *QlxBasicUFormatterFormatDate(QlxObject *formatter, double time) {
 const ObjClass qlxBasicFormatterClass = {
     .kind = Formatter,
     .name = "qlx_basicformatter",
+    .description = nullptr,
     .op1 = {.fFormat = QlxBasicUFormatterFFormat},
     .op2 = {.fGetHeader = QlxBasicFormatterFGetHeader},
     .op3 = {.fGetTrailer = QlxBasicFormatterFGetTrailer},
     .op4 = {.fBindMsg = qlxIntlBindUI18Msg},
+    .fAllocVars = nullptr,
+    .fFreeVars = nullptr,
     .fCfgChange = QlxBasicFormatterFCfgChange,
 };

@@ -5,7 +5,7 @@
  * 8-bit text is in the process's default code page, ICU's default converter; what that code page
  * cannot represent is replaced as the converter does, and no conversion error is reported. Every
  * returned string is a new block that the caller frees with OslMemoryFree(); it is null for a null
- * argument, for a text whose block would pass 4 GiB, and when memory is exhausted. No lock is
+ * argument, for a text whose block would pass 2 GiB, and when memory is exhausted. No lock is
  * taken.
  */
 #ifndef QLX_USTRING_H

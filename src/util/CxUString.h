@@ -1,6 +1,5 @@
 // Conversion between 8-bit text and UTF-16 into room that the caller has. ASCII text is widened and
-// narrowed here when the default code page is one that keeps ASCII; all else is ICU's default
-// converter.
+// narrowed here while the default code page is UTF-8; all else is ICU's default converter.
 #ifndef QLX_SRC_CXUSTRING_H
 #define QLX_SRC_CXUSTRING_H
 

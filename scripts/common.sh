@@ -5,7 +5,7 @@
 set -euo pipefail
 export LC_ALL=C.UTF-8
 cd "$(dirname "${BASH_SOURCE[0]}")/.."
-me=$(basename "$0")
+me=scripts/$(basename "$0")
 jobs=$(nproc)
 
 # To build and run everything: compiler, build tools, ICU (with genrb), and what the command, the
@@ -26,7 +26,7 @@ step() {
   shift 2
   mkdir -p "$(dirname "$log")"
   if ! "$@" >"$log" 2>&1 </dev/null; then
-    grep -vE '^\[[0-9]+/[0-9]+\] ' "$log" | tail -n 40 >&2   # without ninja's steps
+    grep -vE '^\[[0-9]+/[0-9]+\] ' "$log" | tail -n 20 >&2   # without ninja's steps
     fail "$what failed (all of its output: $log)"
   fi
 }

@@ -1,10 +1,9 @@
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <cerrno>
+#include <cstring>
 #include <filesystem>
 #include <string>
-#include <vector>
 
 #include <qlx/buffers.h>
 #include <qlx/proplist.h>
@@ -156,7 +155,7 @@ TEST_F(QlxReadPropsTest, BytesAreKeptAsTheyStand) {
 }
 
 // The last pair's value is copied once more when it is delivered again.
-uint64_t allocationsOf(QlxReadPropsTest &, const std::string &path) {
+uint64_t allocationsOf(const std::string &path) {
   CxPropList list{};
   const FailingMemory memory;
   EXPECT_EQ(CxPropListRead(path.c_str(), &list, nullptr), 1);
@@ -171,11 +170,11 @@ TEST_F(QlxReadPropsTest, TheLastPairIsDeliveredAgainAtEndOfFileUnlessACommentFol
   dir.write("stillAgain", "a=1\r\n\r\n\n\r");
   dir.write("comment", "a=1\n#");
   dir.write("blanks", "a=1\n ");
-  const uint64_t once = allocationsOf(*this, dir.path("once"));
-  EXPECT_EQ(allocationsOf(*this, dir.path("again")), once + 1);
-  EXPECT_EQ(allocationsOf(*this, dir.path("stillAgain")), once + 1);
-  EXPECT_EQ(allocationsOf(*this, dir.path("comment")), once);
-  EXPECT_EQ(allocationsOf(*this, dir.path("blanks")), once);
+  const uint64_t once = allocationsOf(dir.path("once"));
+  EXPECT_EQ(allocationsOf(dir.path("again")), once + 1);
+  EXPECT_EQ(allocationsOf(dir.path("stillAgain")), once + 1);
+  EXPECT_EQ(allocationsOf(dir.path("comment")), once);
+  EXPECT_EQ(allocationsOf(dir.path("blanks")), once);
 }
 
 TEST_F(QlxReadPropsTest, EarlierEntriesOfTheListStay) {

@@ -9,7 +9,6 @@
 #include <unicode/ucal.h>
 #include <unicode/uchar.h>
 #include <unicode/udat.h>
-#include <unicode/ustdio.h>
 #include <unicode/ustring.h>
 
 #include <qlx/memory.h>
@@ -91,14 +90,20 @@ static int32_t offsetAt(double time) {
   return U_SUCCESS(status) ? zone + daylight : 0;
 }
 
+// As "%02d" writes it: a sign takes the place of a leading zero.
+static uint8_t appendTwoDigits(CxUStringBuff *text, int32_t number) {
+  const char *lead = number < 0 ? "-" : number < 10 ? "0" : "";
+  return CxUStringBuffAppendStr(text, lead) && CxUStringBuffAppendInt32(text, std::abs(number));
+}
+
 // Deliberate: the minutes keep their sign and the sign before them is that of the hours alone, so
 // that -330 minutes are "-05:-30" and -30 are "+00:-30".
 static uint8_t appendOffset(CxUStringBuff *text, int32_t offset) {
   const int32_t hours = offset / 3'600'000;
   const int32_t minutes = offset / 60'000 % 60;
-  UChar suffix[64] = {};
-  u_snprintf(suffix, 63, hours < 0 ? "-%02d:%02d" : "+%02d:%02d", std::abs(hours), minutes);
-  return CxUStringBuffAppendUStr(text, suffix);
+  return CxUStringBuffAppendStr(text, hours < 0 ? "-" : "+") &&
+         appendTwoDigits(text, std::abs(hours)) && CxUStringBuffAppendStr(text, ":") &&
+         appendTwoDigits(text, minutes);
 }
 
 // Appends the date by ICU, with the offset where it belongs. The places of the fields are optional.
@@ -113,8 +118,10 @@ static uint8_t appendDate(CxUStringBuff *text, const HeldDate &held, double time
   return held.pattern ? 1 : appendOffset(text, offsetAt(time));
 }
 
-static bool isDigitRunFrom(UChar zero) {
-  return u_charDigitValue(zero) == 0 && u_charDigitValue(zero + 9) == 9;
+// Three times the zero of a script's decimal digits, behind which the other nine stand in order.
+static bool isZeros(const UChar *digits, int32_t length) {
+  return length == kMillisDigits && u_charDigitValue(digits[0]) == 0 && digits[1] == digits[0] &&
+         digits[2] == digits[0];
 }
 
 // Finds the milliseconds in the text of a whole second: three zeros in one place at most. Nothing
@@ -127,10 +134,7 @@ static std::optional<int32_t> findFraction(const CxUStringBuff &text,
   for (int32_t field; (field = ufieldpositer_next(fields, &begin, &end)) >= 0;) {
     if (field == UDAT_MILLISECONDS_IN_DAY_FIELD) return std::nullopt;
     if (field != UDAT_FRACTIONAL_SECOND_FIELD) continue;
-    if (found >= 0 || end - begin != kMillisDigits) return std::nullopt;
-    const UChar *digits = text.data + begin;
-    if (digits[1] != digits[0] || digits[2] != digits[0] || !isDigitRunFrom(digits[0]))
-      return std::nullopt;
+    if (found >= 0 || !isZeros(text.data + begin, end - begin)) return std::nullopt;
     found = begin;
   }
   return found;

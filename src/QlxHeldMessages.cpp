@@ -15,12 +15,10 @@
 
 #include "util/CxOwned.h"
 
-// What is held, by what: a pattern in a locale. One look at the pattern tells the rest.
 struct PatternKey {
   const char *locale;  // null is the default locale, and not the same as ""
   std::u16string_view pattern;
   uint32_t hash;  // of the pattern
-  bool isPlain;   // without braces and apostrophes: its own text, in every locale
 };
 
 struct HeldMessage {
@@ -48,15 +46,10 @@ void qlxIntlDropHeldMessages(void) {
     if (held.format) drop(held);
 }
 
-static PatternKey keyOf(const char *locale, const UChar *pattern) {
+static uint32_t hashOf(std::u16string_view pattern) {
   uint32_t hash = 2166136261U;  // FNV-1a
-  bool isPlain = true;
-  const UChar *end = pattern;
-  for (; *end; ++end) {
-    hash = (hash ^ *end) * 16777619U;
-    if (*end == u'{' || *end == u'}' || *end == u'\'') isPlain = false;
-  }
-  return {locale, {pattern, static_cast<size_t>(end - pattern)}, hash, isPlain};
+  for (const char16_t unit : pattern) hash = (hash ^ unit) * 16777619U;
+  return hash;
 }
 
 static bool sameLocale(const char *a, const char *b) {
@@ -119,7 +112,7 @@ static void hold(const PatternKey &key, bool usesZone, icu::LocalUMessageFormatP
   HeldMessage &place = *std::ranges::min_element(gMessages, {}, &HeldMessage::lastUse);
   drop(place);
   place = {format.orphan(),
-           {locale.release(), {pattern.release(), key.pattern.size()}, key.hash, key.isPlain},
+           {locale.release(), {pattern.release(), key.pattern.size()}, key.hash},
            usesZone,
            ++gUses};
 }
@@ -178,17 +171,31 @@ static uint32_t append(CxUStringBuff *text, const UMessageFormat *format,
   });
 }
 
-static uint32_t appendPlain(CxUStringBuff *text, const UChar *pattern, UErrorCode *status) {
-  const uint32_t before = text->length;
-  const bool appended = CxUStringBuffAppendUStr(text, pattern) == 1;
-  *status = appended ? U_ZERO_ERROR : U_MEMORY_ALLOCATION_ERROR;
-  return text->length - before;
+static bool isSyntax(char16_t unit) {
+  return unit == u'{' || unit == u'}' || unit == u'\'';
+}
+
+static bool isPlain(std::u16string_view pattern) {
+  return std::ranges::none_of(pattern, isSyntax);
+}
+
+// A pattern without syntax is its own text, in every locale.
+static uint32_t appendPlain(CxUStringBuff *text, std::u16string_view pattern, UErrorCode *status) {
+  const auto units = static_cast<uint32_t>(pattern.size());
+  *status = U_MEMORY_ALLOCATION_ERROR;
+  if (!cxUStringBuffHasCapacity(text, units)) return 0;
+  *status = U_ZERO_ERROR;
+  pattern.copy(text->data + text->length, units);
+  text->length += units;
+  text->data[text->length] = 0;
+  return units;
 }
 
 uint32_t qlxAppendHeldMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
                               va_list *args, UErrorCode *status) {
-  const PatternKey key = keyOf(locale, pattern);
-  if (key.isPlain) return appendPlain(text, pattern, status);
+  const std::u16string_view units{pattern, static_cast<size_t>(u_strlen(pattern))};
+  if (isPlain(units)) return appendPlain(text, units, status);
+  const PatternKey key{locale, units, hashOf(units)};
 
   const HeldFormatsLock lock;
   if (HeldMessage *held = findCurrent(key)) {

@@ -190,6 +190,10 @@ TEST_F(BasicFormatterTest, WhatIsNoFormatterAndNoEventGivesNoLine) {
   withoutBinder.op4.fBindMsg = nullptr;
   retired.objClass = &withoutBinder;
   EXPECT_EQ(lineBy(&retired, event.get()), u"<null>");
+  ObjClass ofAnotherKind = qlxBasicFormatterClass;
+  ofAnotherKind.kind = Handler;
+  retired.objClass = &ofAnotherKind;
+  EXPECT_EQ(lineBy(&retired, event.get()), u"<null>");
 }
 
 TEST_F(BasicFormatterTest, HeaderAndTrailerAreNull) {

@@ -36,7 +36,9 @@ QLX_API void QlxFreeI18Msg(I18Msg *message);
  * Binds a message: looks the pattern up in the bundle (when the bundle does not open, once more by
  * the part of its name after the last "/") and formats it with the arguments.
  *
- * @param args  borrowed and left as it was; null is an empty list
+ * @param args  borrowed and left as it was; of the types that the pattern reads, as for
+ *              u_vformatMessage(). Null is an empty list: the pattern's arguments then read as
+ *              zeros, and one that is a text fails with U_ILLEGAL_ARGUMENT_ERROR
  * @return the text, or null: on a failure, whose ICU code is then in message->error (a success does
  *         not clear it), and when the text is empty
  */

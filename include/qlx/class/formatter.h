@@ -14,7 +14,13 @@ QLX_BEGIN_DECLS
 /** The basic formatter's keys: "separator", "dateTimeFormat", "locale", and the common ones. */
 QLX_API void QlxBasicFormatterFCfgChange(QlxObject *formatter, const char *key);
 
-/** @return the event as one line of text; null for a null event or an object that is no formatter
+/**
+ * The event as one line: its time, source location, product properties and message, with the
+ * formatter's separator after each but the message, and a line feed. Deliberate: the formatter's
+ * locale is set on the event and stays there.
+ *
+ * @return the line; null for a null event, for an object that is no formatter or whose class has no
+ *         fBindMsg, and when memory ran out
  */
 QLX_API UChar *QlxBasicUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args);
 
@@ -29,7 +35,11 @@ QLX_API char *QlxBasicFormatterFGetTrailer(QlxObject *formatter);
  * formatter is null or has none, as "yyyy-MM-dd HH:mm:ss.SSS" with the offset from UTC. Takes and
  * needs no lock.
  *
+ * Deliberate: the minutes of the offset keep their sign and only the hours decide the sign before
+ * it: -330 minutes are "-05:-30", -30 are "+00:-30".
+ *
  * @param time  milliseconds since 1970-01-01 UTC
+ * @return the text, empty for an empty pattern; null when memory ran out
  */
 QLX_API UChar *QlxBasicUFormatterFormatDate(QlxObject *formatter, double time);
 

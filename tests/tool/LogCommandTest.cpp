@@ -234,8 +234,8 @@ TEST_F(LogCommandTest, LogsAtTheGivenLevelBehindTheThreshold) {
   EXPECT_EQ(log("word\n", {"--level", "error"}).status, 0);
   EXPECT_EQ(log("number\n", {"--level", "5000"}).status, 0);
   EXPECT_EQ(log("below\n", {"--level", "4999"}).status, 0);
-  EXPECT_EQ(log("unspecified\n", {"--level=-9999"}).status, 0);
-  EXPECT_EQ(dir.read("app.log"), ">word\n>number\n>unspecified\n");
+  EXPECT_EQ(log("without one\n", {"--level=-9999"}).status, 0);
+  EXPECT_EQ(dir.read("app.log"), ">word\n>number\n>without one\n");
 }
 
 TEST_F(LogCommandTest, PassesTheLevelOnToFilters) {

@@ -12,9 +12,8 @@
 
 namespace {
 
-pthread_mutex_t gMaking = PTHREAD_MUTEX_INITIALIZER;  // guards the making of gMutex
-CxMutex gMutex;                                       // written once, before gMade
-std::atomic<bool> gMade;
+std::atomic<CxMutex> gMutex;     // set once
+std::atomic<bool> gForkHandled;  // the fork handlers are registered, or about to be
 std::atomic<pthread_t> gHolder;  // who holds gMutex; only the holder itself relies on it
 bool gTakenForFork;              // written and read only by the thread that holds gMutex
 
@@ -23,30 +22,27 @@ bool heldByThisThread() {
 }
 
 void beforeFork() {
-  const bool take = !heldByThisThread();
-  if (take) qlxAPIMutexLock();
-  gTakenForFork = take;
+  const bool held = heldByThisThread();
+  if (held || qlxAPIMutexLock()) gTakenForFork = !held;
   qlxHeldFormatsLock();
 }
 
 void afterFork() {
   qlxHeldFormatsUnlock();
-  if (gTakenForFork) qlxAPIMutexUnlock();
+  if (heldByThisThread() && gTakenForFork) qlxAPIMutexUnlock();
 }
 
+// Threads that make their first call at the same time may each make a mutex; the first one stays.
+// Nothing is locked meanwhile, so a fork leaves nothing locked.
 CxStatus makeMutex() {
-  pthread_mutex_lock(&gMaking);
-  CxStatus status = {'-', 0};
-  if (!gMade.load(std::memory_order_relaxed)) {
-    status = CxMutexCreate(&gMutex);
-    if (status.kind == '-') {
-      // Without memory for the registration the lock still works; only a fork while another thread
-      // logs is then unprotected.
-      (void)pthread_atfork(beforeFork, afterFork, afterFork);
-      gMade.store(true, std::memory_order_release);
-    }
-  }
-  pthread_mutex_unlock(&gMaking);
+  CxMutex made = nullptr;
+  const CxStatus status = CxMutexCreate(&made);
+  if (status.kind != '-') return status;
+  // Without memory for the registration the lock still works; only a fork while another thread logs
+  // is then unprotected.
+  if (!gForkHandled.exchange(true)) (void)pthread_atfork(beforeFork, afterFork, afterFork);
+  CxMutex none = nullptr;
+  if (!gMutex.compare_exchange_strong(none, made)) CxMutexDestroy(&made);
   return status;
 }
 
@@ -59,14 +55,16 @@ bool succeeded(CxStatus status) {
 }  // namespace
 
 uint8_t qlxAPIMutexLock(void) {
-  if (!gMade.load(std::memory_order_acquire) && !succeeded(makeMutex())) return 0;
-  if (!succeeded(CxMutexLock(&gMutex))) return 0;
+  if (!gMutex.load(std::memory_order_acquire) && !succeeded(makeMutex())) return 0;
+  CxMutex mutex = gMutex.load(std::memory_order_acquire);
+  if (!succeeded(CxMutexLock(&mutex))) return 0;
   gHolder.store(pthread_self(), std::memory_order_relaxed);
   return 1;
 }
 
 void qlxAPIMutexUnlock(void) {
-  if (!gMade.load(std::memory_order_acquire)) return;
+  CxMutex mutex = gMutex.load(std::memory_order_acquire);
+  if (!mutex) return;
   gHolder.store(pthread_t{}, std::memory_order_relaxed);
-  succeeded(CxMutexUnlock(&gMutex));
+  succeeded(CxMutexUnlock(&mutex));
 }

@@ -5,7 +5,6 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
 #include <cstring>
 #include <string>
 #include <vector>
@@ -18,6 +17,7 @@
 
 #include "QlxObjConfig.h"
 #include "support/FailingMemory.h"
+#include "support/FreshProcess.h"
 
 // Each kind has kCount elements: at(i) is the one to put in, is(element, i) knows it again, discard
 // ends what was handed out, and references(i) counts what containers and callers hold of it. They
@@ -148,18 +148,6 @@ void failEachAllocation(Attempt attempt, Check check) {
     return;
   }
   FAIL() << "there is no end of allocations";
-}
-
-// Runs `use` in a fresh process in which nothing has made the API lock yet. Where memory fails in
-// there, the lock cannot be made.
-template <typename Use>
-void inFreshProcess(Use use) {
-  ::testing::GTEST_FLAG(death_test_style) = "threadsafe";
-  const auto useAndExit = [use] {
-    use();
-    std::exit(::testing::Test::HasFailure() ? 1 : 0);
-  };
-  EXPECT_EXIT(useAndExit(), ::testing::ExitedWithCode(0), "");
 }
 
 #endif

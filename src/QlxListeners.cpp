@@ -100,6 +100,7 @@ void QlxBasicObjectFLog(QlxObject *object, Event *event, va_list *args) {
   // branches reach gets the event twice.
   if (!head || (object->marks & kMarkPassing)) return;
   object->marks |= kMarkPassing;
+  const ObjectRef held{qlxIntlAcquireObject(object)};
   for (QlxObject *listener : Snapshot(head)) {
     const ObjClass *objClass = listener->objClass;
     const bool processes = isKind(listener, Filter) || isKind(listener, Handler);

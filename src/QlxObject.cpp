@@ -11,6 +11,7 @@
 
 #include "QlxLocked.h"
 #include "QlxLogManager.h"
+#include "QlxToolkit.h"
 
 static constexpr const char *kDefaultFormatterName = "quill.defaultFormatter";
 static constexpr const char *kDefaultFormatterClass = "qlx_basicformatter";
@@ -36,6 +37,7 @@ static void initKindFields(QlxObject *object) {
 
 // Frees an object that was never registered.
 static void discardObject(QlxObject *object) {
+  qlxIntlAcquireObject(object);
   qlxRetireObject(object);
   OslMemoryFree(object);
 }
@@ -87,28 +89,33 @@ void qlxCloseHandlerOnce(QlxObject *object) {
   if (object->objClass->op3.fClose) object->objClass->op3.fClose(object);
 }
 
-static void freeContents(QlxObject *object) {
-  qlxIntlFreeStringToStringMap(object->props);
-  qlxFreeListeners(object);
-  OslMemoryFree(object->name);
-  const ObjClass *objClass = object->objClass;
-  if (objClass->fFreeVars) objClass->fFreeVars(object->vars);
-  if (objClass->kind == Handler) qlxIntlReleaseObject(object->kind2.formatter);
+static void freeContents(QlxObject *contents) {
+  qlxIntlFreeStringToStringMap(contents->props);
+  qlxFreeListeners(contents);
+  OslMemoryFree(contents->name);
+  const ObjClass *objClass = contents->objClass;
+  if (objClass->fFreeVars) objClass->fFreeVars(contents->vars);
+  if (objClass->kind == Handler) qlxIntlReleaseObject(contents->kind2.formatter);
   if (objClass->kind == Formatter) {
-    OslMemoryFree(object->kind1.separator);
-    OslMemoryFree(object->kind2.dateTimeFormat);
-    OslMemoryFree(object->kind3.locale);
+    OslMemoryFree(contents->kind1.separator);
+    OslMemoryFree(contents->kind2.dateTimeFormat);
+    OslMemoryFree(contents->kind3.locale);
   }
 }
 
 void qlxRetireObject(QlxObject *object) {
-  freeContents(object);
+  if (!object->objClass) return;
+  // Inert before anything goes: an operation of a class that runs meanwhile may come back to it.
+  QlxObject contents = *object;
+  object->objClass = nullptr;
   object->name = nullptr;
   object->props = nullptr;
   object->vars = nullptr;
-  object->kind1.word = object->kind2.word = object->kind3.word = 0;
+  // Also a log call without the lock may look at the level here, by a handle that outlives closing.
+  std::atomic_ref(object->kind1.word).store(0, std::memory_order_relaxed);
+  object->kind2.word = object->kind3.word = 0;
   storeEnabled(object, 0);
-  object->objClass = nullptr;
+  freeContents(&contents);
 }
 
 static void removeFromRegistry(QlxObject *object) {
@@ -118,16 +125,20 @@ static void removeFromRegistry(QlxObject *object) {
 
 static void destroyObject(QlxObject *object) {
   object->marks |= kMarkDying;
+  qlxIntlAcquireObject(object);  // an operation that takes and gives back one must not free it
   removeFromRegistry(object);
   qlxCloseHandlerOnce(object);
   qlxRetireObject(object);
+  --object->refCount;
 }
 
 void qlxIntlReleaseObject(QlxObject *object) {
   if (!object || object->refCount == 0) return;
   --object->refCount;
-  // Deliberate: destroyed at one, since the registry's own reference keeps nothing alive.
-  if (object->objClass && object->refCount == 1 && !(object->marks & kMarkDying)) {
+  // Deliberate: destroyed at one, since the registry's own reference keeps nothing alive. Only
+  // while the toolkit closes it does.
+  const uint32_t last = qlxToolkitIsClosing() ? 0 : 1;
+  if (object->objClass && object->refCount == last && !(object->marks & kMarkDying)) {
     destroyObject(object);
   }
   if (!object->objClass && object->refCount == 0) OslMemoryFree(object);

@@ -17,8 +17,15 @@ enum ObjectMark : uint8_t {
   kMarkPassing = 1,  // passes an event on right now: a chain that comes back here ends
   kMarkClosed = 2,   // a handler whose fClose has run for the last time
   kMarkDying = 4,    // being destroyed: no release destroys it again
-  kMarkKept = 8,     // the closing toolkit holds a reference while it takes everything apart
 };
+
+// The upper bits of QlxObject::marks count the steps of closing that the object has taken.
+inline uint8_t closingStepsTaken(const QlxObject *object) {
+  return object->marks >> 4;
+}
+inline void countClosingStep(QlxObject *object) {
+  object->marks += 1 << 4;
+}
 
 inline bool isKind(const QlxObject *object, int32_t kind) {
   return object && object->objClass && object->objClass->kind == kind;
@@ -45,7 +52,7 @@ void qlxCloseHandlerOnce(QlxObject *object);
 /** Frees an object's listener group, which releases the listeners. */
 void qlxFreeListeners(QlxObject *object);
 
-/** Destroys the contents; what is left is an inert header. */
+/** Destroys the contents; what is left is an inert header. The caller has a reference. */
 void qlxRetireObject(QlxObject *object);
 
 #endif

@@ -3,6 +3,7 @@
 #include "QlxToolkit.h"
 
 #include <array>
+#include <iterator>
 
 #include <qlx/class/containers.h>
 #include <qlx/class/handler.h>
@@ -31,6 +32,8 @@ static struct {
   StringToObjClassMap *classes;             // owns the records
   std::array<StringGroup *, kKinds> names;  // class names by kind
   StringToObjMap *instances;                // one reference to each object
+  uint32_t instancesChanged;                // counts the changes of `instances`
+  uint8_t closing;                          // 1 while the objects are taken apart
 } gToolkit;
 
 // ---- Classes
@@ -50,7 +53,10 @@ static StringGroup *namesOfKind(int32_t kind) {
 void qlxToolkitAddClassDef(const char *className, ObjClass *objClass) {
   if (!objClass) return;
   qlxToolkitInitObjClasses();
-  if (!qlxIntlStringToObjClassMapPut(gToolkit.classes, className, objClass)) {
+  ObjClass *known = qlxToolkitGetClassDef(className);
+  if (known == objClass) return;
+  // The first of a name stays. It may be a built-in class that was registered just now.
+  if (known || !qlxIntlStringToObjClassMapPut(gToolkit.classes, className, objClass)) {
     return qlxFreeObjClass(objClass);
   }
   qlxIntlStringGroupAdd(namesOfKind(objClass->kind), className);
@@ -82,6 +88,7 @@ static void freeClasses() {
 void qlxToolkitAddObjInstance(const char *objectName, QlxObject *object) {
   if (!objectName || !object) return;
   if (!gToolkit.instances) gToolkit.instances = qlxIntlAllocStringToObjMap();
+  gToolkit.instancesChanged++;
   qlxIntlStringToObjMapPut(gToolkit.instances, objectName, object);
 }
 
@@ -90,6 +97,7 @@ QlxObject *qlxToolkitGetObjInstance(const char *objectName) {
 }
 
 void qlxToolkitRemObjInstance(const char *objectName) {
+  gToolkit.instancesChanged++;
   qlxIntlStringToObjMapRem(gToolkit.instances, objectName);
 }
 
@@ -97,30 +105,16 @@ QlxObject *qlxToolkitLogger(void) {
   return gToolkit.open ? gToolkit.logger : nullptr;
 }
 
-// ---- Closing
+// ---- Closing. Every object takes these steps, and none takes one before all have taken those
+// above it: handlers are closed while their formatters still have variables to make a trailer from,
+// and listeners go while everything that they look for is still registered.
 
-template <typename Visit>
-static void forEachInstance(Visit visit) {
-  for (StringToObjMapNode *it = qlxIntlStringToObjMapIterator(gToolkit.instances); it;
-       it = it->next) {
-    visit(it->value);
-  }
-}
-
-// Takes a reference to every object that has none of the closing toolkit's yet, so that nothing is
-// destroyed, and no registry entry goes, while the objects are taken apart. False: nothing was new.
-static bool keepInstances() {
-  bool anyNew = false;
-  forEachInstance([&](QlxObject *object) {
-    if (object->marks & kMarkKept) return;
-    object->marks |= kMarkKept;
-    qlxIntlAcquireObject(object);
-    anyNew = true;
-  });
-  return anyNew;
+uint8_t qlxToolkitIsClosing(void) {
+  return gToolkit.closing;
 }
 
 static void freeVariables(QlxObject *object) {
+  if (!object->objClass) return;
   if (void *vars = object->vars; vars && object->objClass->fFreeVars) {
     object->vars = nullptr;
     object->objClass->fFreeVars(vars);
@@ -131,24 +125,46 @@ static void freeVariables(QlxObject *object) {
   }
 }
 
-void qlxFreeInstancesMap(void) {
-  // Handlers are closed first, while their formatters still have variables to make a trailer from.
-  // What a class's operation makes meanwhile gets its turn too.
-  while (keepInstances()) {
-    forEachInstance(qlxCloseHandlerOnce);
-    forEachInstance(freeVariables);
-    forEachInstance(qlxFreeListeners);
+static constexpr void (*kClosingSteps[])(QlxObject *) = {
+    qlxCloseHandlerOnce,
+    freeVariables,
+    qlxFreeListeners,
+    qlxRetireObject,
+};
+
+// Takes one step with every object whose next step it is. A class's operation that runs meanwhile
+// may change the registry: the walk then starts anew. False: no object was there.
+static bool takeStep(uint8_t step) {
+  bool any = false;
+  StringToObjMapNode *it = qlxIntlStringToObjMapIterator(gToolkit.instances);
+  while (it) {
+    if (closingStepsTaken(it->value) == step) {
+      const ObjectRef object{qlxIntlAcquireObject(it->value)};
+      const uint32_t changed = gToolkit.instancesChanged;
+      countClosingStep(object.get());
+      kClosingSteps[step](object.get());
+      any = true;
+      if (changed != gToolkit.instancesChanged) {
+        it = qlxIntlStringToObjMapIterator(gToolkit.instances);
+        continue;
+      }
+    }
+    it = it->next;
   }
+  return any;
+}
+
+void qlxFreeInstancesMap(void) {
+  gToolkit.closing = 1;
+  // An object that a step has made starts with the first one.
+  for (uint8_t step = 0; step < std::size(kClosingSteps);) step = takeStep(step) ? 0 : step + 1;
   for (QlxObject *&kept : gToolkit.kept) {
     const ObjectRef reference{kept};
     kept = nullptr;
   }
-  forEachInstance([](QlxObject *object) {
-    qlxRetireObject(object);
-    qlxIntlReleaseObject(object);  // the reference of keepInstances()
-  });
   qlxIntlFreeStringToObjMap(gToolkit.instances);
   gToolkit.instances = nullptr;
+  gToolkit.closing = 0;
 }
 
 static void closeToolkit() {
@@ -164,9 +180,11 @@ static void closeToolkit() {
 // The default console handler, made with the default formatter when it is not there.
 static QlxObject *fetchDefaultConsole() {
   static constexpr const char *kConsole = "quill.defaultConsole";
+  static constexpr const char *kFormatter = "quill.defaultFormatter";
   if (QlxObject *existing = qlxToolkitGetObjInstance(kConsole)) return existing;
   QlxObject *console = qlxIntlGetObject(kConsole, "qlx_consolehandler");
-  QlxObject *formatter = qlxIntlGetObject("quill.defaultFormatter", "qlx_basicformatter");
+  QlxObject *formatter = qlxToolkitGetObjInstance(kFormatter);
+  if (!formatter) formatter = qlxIntlGetObject(kFormatter, "qlx_basicformatter");
   // Deliberate: also when the console's configuration named another formatter.
   qlxIntlHandlerSetFormatter(console, formatter);
   gToolkit.kept[2] = formatter;

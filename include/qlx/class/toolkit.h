@@ -27,7 +27,8 @@ QLX_API QlxObject *qlxToolkitLogger(void);
 /** @return the registered class, borrowed, or null; null for a null name */
 QLX_API ObjClass *qlxToolkitGetClassDef(const char *className);
 
-/** Registers a class record, which the registry then owns; a null record is ignored. */
+/** Hands a class record to the registry, which owns it from then on; the first one of a name stays
+ *  and another is freed. A null record is ignored. */
 QLX_API void qlxToolkitAddClassDef(const char *className, ObjClass *objClass);
 
 /** Makes the registries and registers the built-in classes, once. */
@@ -42,7 +43,8 @@ QLX_API void qlxToolkitAddObjInstance(const char *objectName, QlxObject *object)
 /** @return the object of that name with a reference for the caller, or null */
 QLX_API QlxObject *qlxToolkitGetObjInstance(const char *objectName);
 
-/** Removes a name and releases the registry's reference; an unknown name is ignored. */
+/** Removes a name and releases the registry's reference; an unknown name is ignored. Who holds the
+ *  object then gives it back before the toolkit is closed, which ends registered objects only. */
 QLX_API void qlxToolkitRemObjInstance(const char *objectName);
 
 QLX_END_DECLS

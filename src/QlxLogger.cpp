@@ -40,15 +40,20 @@ fLog qlxIntlLoggerGetFLog(QlxObject *logger) {
 
 // ---- The two entries
 
+static void report(QlxLogResult *result, const QlxLogResult &what) {
+  if (result) *result = what;
+}
+
 static void passToLogger(QlxLogResult *result, QlxObject *logger, fLog log, Event *event,
                          va_list *args) {
   log(logger, event, args);
-  *result = {event->status.kind, event->status.code, event->message ? event->message->error : 0};
+  const int32_t bindError = event->message ? event->message->error : 0;
+  report(result, {event->status.kind, event->status.code, bindError});
 }
 
 void qlxLogUMessageEntry(QlxLogResult *result, QlxObject *logger, int32_t level, const char *bundle,
                          const char *key, va_list *args) {
-  *result = kNothingLogged;
+  report(result, kNothingLogged);
   const fLog log = qlxIntlLoggerGetFLog(logger);
   if (!log) return;
   const EventPtr event{QlxVaAllocUEvent(level, bundle, key, nullptr)};
@@ -67,7 +72,7 @@ static void setSource(Event *event, const char *file, const char *function, int3
 
 void qlxLogUDebugEntry(QlxLogResult *result, QlxObject *logger, int32_t level, const char *file,
                        const char *function, int32_t line, const UChar *text, va_list *args) {
-  *result = kNothingLogged;
+  report(result, kNothingLogged);
   const fLog log = qlxIntlLoggerGetFLog(logger);
   if (!log) return;
   const EventPtr event{QlxVaAllocUEvent(level, nullptr, nullptr, text)};
@@ -78,7 +83,7 @@ void qlxLogUDebugEntry(QlxLogResult *result, QlxObject *logger, int32_t level, c
 }
 
 void qlxIntlLogVA(QlxLogResult *result, int32_t level, const char *bundle, const char *key, ...) {
-  *result = kNothingLogged;
+  report(result, kNothingLogged);
   QlxObject *logger = qlxToolkitLogger();
   if (!isLoggable(logger, level)) return;
   va_list args;
@@ -90,6 +95,8 @@ void qlxIntlLogVA(QlxLogResult *result, int32_t level, const char *bundle, const
 // ---- The basic logger
 
 static void applyLevel(QlxObject *logger, const char *key) {
+  // A handler's or a formatter's field of that place is a pointer.
+  if (!isKind(logger, Logger) && !isKind(logger, Filter)) return;
   storeLevel(logger, QlxGetLevelFromString(qlxPeekMapProp(logger->props, key)));
 }
 

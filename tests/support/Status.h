@@ -1,4 +1,5 @@
-// Platform statuses in expectations: EXPECT_EQ(CxFileClose(&file), failure(EBADF)).
+// Platform statuses, and what log calls answer, in expectations: EXPECT_EQ(CxFileClose(&file),
+// failure(EBADF)).
 #ifndef QLX_TESTS_STATUS_H
 #define QLX_TESTS_STATUS_H
 
@@ -19,6 +20,15 @@ inline bool operator==(const CxStatus &a, const CxStatus &b) {
 
 inline std::ostream &operator<<(std::ostream &out, const CxStatus &status) {
   return out << "{" << status.kind << "," << status.code << "}";
+}
+
+inline bool operator==(const QlxLogResult &a, const QlxLogResult &b) {
+  return a.statusKind == b.statusKind && a.statusCode == b.statusCode && a.msgStatus == b.msgStatus;
+}
+
+inline std::ostream &operator<<(std::ostream &out, const QlxLogResult &result) {
+  return out << "{" << result.statusKind << "," << result.statusCode << "," << result.msgStatus
+             << "}";
 }
 
 #endif

@@ -2,7 +2,7 @@
  * @file
  * The way of a log call below the lock, for class operations and for code that takes the lock
  * itself (qlx/class/toolkit.h). None of these takes the lock or tests the threshold, unless it says
- * so. `result` must not be null; `args` may be.
+ * so. `result` and `args` may be null.
  */
 #ifndef QLX_CLASS_LOGGER_H
 #define QLX_CLASS_LOGGER_H

@@ -80,6 +80,7 @@ QLX_API double QlxGetObjCfgPropDouble(ObjCfg *cfg, const char *key, uint8_t *fou
  * Sets an own property. Tells no object: objects get a configuration when they are made, or by
  * QlxLogMgrApplyCfg().
  *
+ * @param value  null is stored too: the key is there, and reads as if it were not set
  * @return 1 when stored
  */
 QLX_API uint8_t QlxSetObjCfgProp(ObjCfg *cfg, const char *key, const char *value);
@@ -96,7 +97,8 @@ QLX_API void QlxSetObjCfgPropDouble(ObjCfg *cfg, const char *key, double value);
 /** Registers a configuration and links it below its nearest parent; a known name is ignored. */
 QLX_API void QlxLogMgrAddCfg(ObjCfg *cfg);
 
-/** Takes a configuration out; its children move to its parent. Objects are not told. */
+/** Takes a configuration out; its children move to its parent (without a parent they keep its name
+ *  as their parent's). Objects are not told. */
 QLX_API void QlxLogMgrRemCfg(ObjCfg *cfg);
 
 /** Takes a registered configuration out and adds it again, after its name or parent changed. */

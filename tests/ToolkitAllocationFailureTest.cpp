@@ -38,24 +38,22 @@ class ToolkitAllocationFailureTest : public ::testing::Test {
       long { ")" + std::string(2000, 'x') +
                                          R"(" }
     )"));
-    dir_.write("app.properties",
-               "app.className = qlx_basiclogger\n"
-               "app.level = ALL\n"
-               "app.listenerNames = filter console\n"
-               "filter.className = qlx_levelfilter\n"
-               "filter.level = DEBUG_MID\n"
-               "filter.listenerNames = file\n"
-               "file.className = qlx_filehandler\n"
-               "file.fileName = " +
-                   dir_.path("logs/app.log") +
-                   "\n"
-                   "file.maxFileBytes = 4000\n"
-                   "file.formatterName = text\n"
-                   "console.className = qlx_consolehandler\n"
-                   "console.formatterName = text\n"
-                   "text.className = qlx_basicformatter\n"
-                   "text.dateTimeFormat = yyyy-MM-dd\n"
-                   "text.locale = de\n");
+    dir_.write("app.properties", R"(
+app.className = qlx_basiclogger
+app.level = ALL
+app.listenerNames = filter console
+filter.className = qlx_levelfilter
+filter.level = DEBUG_MID
+filter.listenerNames = file
+file.className = qlx_filehandler
+file.maxFileBytes = 4000
+file.formatterName = text
+console.className = qlx_consolehandler
+console.formatterName = text
+text.className = qlx_basicformatter
+text.dateTimeFormat = yyyy-MM-dd
+text.locale = de
+file.fileName = )" + dir_.path("logs/app.log"));
   }
 
   std::string config() const { return dir_.path("app.properties"); }

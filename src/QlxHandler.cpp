@@ -14,7 +14,7 @@ QlxObject *qlxIntlHandlerGetFormatter(QlxObject *handler) {
 }
 
 void qlxIntlHandlerSetFormatter(QlxObject *handler, QlxObject *formatter) {
-  if (!isKind(handler, Handler)) return;
+  if (!isKind(handler, Handler) || (formatter && !formatter->objClass)) return;
   QlxObject *old = handler->kind2.formatter;
   handler->kind2.formatter = qlxIntlAcquireObject(formatter);  // first: it may be the old one
   qlxIntlReleaseObject(old);

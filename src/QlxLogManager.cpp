@@ -113,7 +113,7 @@ void qlxIntlLogMgrAddCfg(ObjCfg *cfg) {
 }
 
 ObjCfg *qlxIntlLogMgrGetCfg(const char *name) {
-  if (!name || !gLogMgr.initialised || isRoot(name)) return nullptr;
+  if (!name || !gLogMgr.initialised) return nullptr;
   if (ObjCfg *known = qlxIntlStringToObjCfgMapGet(gLogMgr.configs, name)) return known;
   ObjCfgRef made{qlxIntlAllocObjCfg(name)};
   qlxIntlLogMgrAddCfg(made.get());
@@ -206,7 +206,7 @@ class Lineage {
 }  // namespace
 
 uint8_t qlxIntlLogMgrApplyCfg(QlxObject *object, const char *name) {
-  if (!object) return 0;
+  if (!object || !object->objClass) return 0;
   const Lineage lineage{qlxIntlLogMgrGetCfg(name)};
   // Ancestors first, so that the value set nearest to the object's own configuration is the last.
   for (uint32_t i = lineage.count(); i-- > 0;) {

@@ -95,8 +95,6 @@ void qlxIntlLogVA(QlxLogResult *result, int32_t level, const char *bundle, const
 // ---- The basic logger
 
 static void applyLevel(QlxObject *logger, const char *key) {
-  // A handler's or a formatter's field of that place is a pointer.
-  if (!isKind(logger, Logger) && !isKind(logger, Filter)) return;
   storeLevel(logger, QlxGetLevelFromString(qlxPeekMapProp(logger->props, key)));
 }
 

@@ -133,7 +133,7 @@ static void destroyObject(QlxObject *object) {
 }
 
 void qlxIntlReleaseObject(QlxObject *object) {
-  if (!object || object->refCount == 0) return;
+  if (!object) return;
   --object->refCount;
   // Deliberate: destroyed at one, since the registry's own reference keeps nothing alive. Only
   // while the toolkit closes it does.

@@ -43,6 +43,8 @@ inline void storeEnabled(QlxObject *object, uint8_t flag) {
   std::atomic_ref(object->enabled).store(flag, std::memory_order_relaxed);
 }
 inline void storeLevel(QlxObject *object, int32_t level) {
+  // Objects of the other kinds keep a pointer there.
+  if (!isKind(object, Logger) && !isKind(object, Filter)) return;
   std::atomic_ref(object->kind1.level).store(level, std::memory_order_relaxed);
 }
 

@@ -1,4 +1,5 @@
 #include <gtest/gtest.h>
+#include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -176,6 +177,21 @@ TEST_F(ForkTest, AnOperationOfAClassMayFork) {
   }
   EXPECT_TRUE(endedWell(child));
   EXPECT_TRUE(works());
+}
+
+TEST_F(ForkTest, AnOperationThatForksKeepsTheLock) {
+  pid_t child = -1;
+  recorder->alsoDo = [&](Event *) {
+    child = fork();
+    if (child != 0) return;
+    ualarm(100000, 0);  // what ends a child that waits for the lock that it has
+    qlxAPIMutexLock();
+    _exit(0);
+  };
+  log(u"text");
+  int status = 0;
+  EXPECT_EQ(waitpid(child, &status, 0), child);
+  EXPECT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGALRM);
 }
 
 TEST_F(ForkTest, TheChildMayCloseAndOpenTheToolkit) {

@@ -70,7 +70,9 @@ TEST_F(ListenersTest, AreRemovedAndReleased) {
 }
 
 TEST_F(ListenersTest, OneThatOnlyTheGroupHoldsIsDestroyedWhenItIsRemoved) {
-  QlxObject *borrowed = attach(logger, "a", HostClasses::kHandler).get();
+  Handle a = attach(logger, "a", HostClasses::kHandler);
+  QlxObject *borrowed = a.get();
+  a.reset();
   EXPECT_TRUE(exists("a"));
   host->calls.clear();
   EXPECT_EQ(QlxRemListener(logger.get(), borrowed), 1);
@@ -230,7 +232,8 @@ TEST_F(ListenersTest, AnObjectThatTwoBranchesReachGetsTheEventTwice) {
 TEST_F(ListenersTest, AListenerMayRemoveItselfAndTheNextOnes) {
   QlxObject *raw[3];
   for (int i = 0; i < 3; ++i) {
-    raw[i] = attach(logger, std::to_string(i).c_str(), HostClasses::kHandler).get();
+    const Handle listener = attach(logger, std::to_string(i).c_str(), HostClasses::kHandler);
+    raw[i] = listener.get();
   }
   host->onEvent = [&](QlxObject *object, Event *) {
     if (object != raw[0]) return;

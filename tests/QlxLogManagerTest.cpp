@@ -213,6 +213,14 @@ TEST_F(LogManagerTest, RemovingATopLevelOneMovesNothing) {
   EXPECT_EQ(QlxLogMgrHasCfg("a.b"), 1);
 }
 
+TEST_F(LogManagerTest, RemovingOneWithoutAStoredParentComputesNone) {
+  const Config abc = registered("a.b.c"), abcd = registered("a.b.c.d"), a = registered("a");
+  QlxLogMgrRemCfg(abc.get());
+  EXPECT_EQ(parentNameOf(abc), "<null>");
+  EXPECT_EQ(parentNameOf(abcd), "a.b.c");
+  EXPECT_EQ(childrenOf(a), "");
+}
+
 TEST_F(LogManagerTest, RemovingReleasesTheRegistrysReference) {
   const Config cfg = registered("a");
   QlxLogMgrRemCfg(cfg.get());
@@ -222,7 +230,9 @@ TEST_F(LogManagerTest, RemovingReleasesTheRegistrysReference) {
 }
 
 TEST_F(LogManagerTest, RemovesOneThatOnlyTheRegistryHolds) {
-  ObjCfg *borrowed = registered("x.y").get();
+  Config cfg = registered("x.y");
+  ObjCfg *borrowed = cfg.get();
+  cfg.reset();
   QlxLogMgrRemCfg(borrowed);
   EXPECT_EQ(QlxLogMgrHasCfg("x.y"), 0);
 }
@@ -266,7 +276,9 @@ TEST_F(LogManagerTest, UpdatingMovesTheChildrenToTheParent) {
 }
 
 TEST_F(LogManagerTest, UpdatesOneThatOnlyTheRegistryHolds) {
-  ObjCfg *borrowed = registered("a").get();
+  Config cfg = registered("a");
+  ObjCfg *borrowed = cfg.get();
+  cfg.reset();
   QlxLogMgrUpdateCfg(borrowed);
   EXPECT_EQ(QlxLogMgrHasCfg("a"), 1);
   EXPECT_EQ(registered("a").get(), borrowed);

@@ -100,6 +100,7 @@ TEST_F(LoggerTest, AtOffOnlyTheCallsWithoutALevelPass) {
 TEST_F(LoggerTest, AMisspeltLevelPassesEverything) {
   setLevel("LOUD");
   EXPECT_EQ(logger->kind1.level, -9999);
+  EXPECT_EQ(QlxIsLoggable(logger.get(), INT32_MIN), 1);
   callAll();
   EXPECT_EQ(levels().size(), 9u);
 }
@@ -431,6 +432,7 @@ TEST_F(LoggerTest, ALevelIsNotWrittenWhereAnotherKindKeepsAPointer) {
   QlxSetObjProp(formatter.get(), "level", "ALL");
   const ApiLock lock;
   QlxBasicLoggerFCfgChange(formatter.get(), "level");
+  QlxLevelFilterFCfgChange(formatter.get(), "level");
   EXPECT_STREQ(formatter->kind1.separator, ";");
 }
 

@@ -174,6 +174,21 @@ TEST_F(ObjectTest, MayNameItselfAsItsListener) {
   EXPECT_EQ(object->refCount, 3u);
 }
 
+TEST_F(ObjectTest, OutlivesTheReferencesThatItsConfigurationGivesBack) {
+  configure("p", "className", HostClasses::kHandler);
+  configure("p", "listenerNames", "p.a");
+  configure("p.a", "listenerNames", "p.a");  // empties the group that holds it, and takes it again
+  const Handle handler = get("p.a");
+  ASSERT_NE(handler, nullptr);
+  EXPECT_EQ(host->count("free"), 0);
+  configure("f", "className", HostClasses::kFormatter);
+  configure("f", "listenerNames", "f");  // refused
+  const Handle formatter = get("f");
+  ASSERT_NE(formatter, nullptr);
+  EXPECT_EQ(formatter->refCount, 2u);
+  EXPECT_EQ(host->count("free"), 0);
+}
+
 TEST_F(ObjectTest, MayNameOneThatNamesItBack) {
   for (const char *name : {"a", "b"}) configure(name, "className", HostClasses::kHandler);
   configure("a", "listenerNames", "b");
@@ -314,6 +329,18 @@ TEST_F(ObjectTest, AClassMayMakeTheNameAnewWhileItsObjectIsDestroyed) {
   QlxReleaseObject(second);
 }
 
+TEST_F(ObjectTest, ADestroyedOneLeavesItsNameToAnObjectThatTookIt) {
+  const Handle first = get("a", HostClasses::kLogger), second = get("b", HostClasses::kLogger);
+  const ApiLock lock;
+  qlxIntlAcquireObject(first.get());
+  qlxToolkitAddObjInstance("a", second.get());
+  qlxIntlReleaseObject(first.get());  // which leaves one reference
+  EXPECT_EQ(first->objClass, nullptr);
+  const ObjectRef found{qlxToolkitGetObjInstance("a")};
+  EXPECT_EQ(found.get(), second.get());
+  qlxToolkitRemObjInstance("a");
+}
+
 TEST_F(ObjectTest, AClassMayTakeAndGiveBackTheObjectThatIsDestroyed) {
   Handle object = get("a", HostClasses::kHandler);
   QlxObject *raw = object.get();
@@ -321,7 +348,10 @@ TEST_F(ObjectTest, AClassMayTakeAndGiveBackTheObjectThatIsDestroyed) {
     qlxIntlAcquireObject(raw);
     qlxIntlReleaseObject(raw);
   };
-  host->onClose = [&](QlxObject *) { takeAndGive(); };
+  host->onClose = [&](QlxObject *closing) {
+    takeAndGive();
+    EXPECT_NE(closing->vars, nullptr);
+  };
   host->onFree = [&](void *) { takeAndGive(); };
   host->calls.clear();
   object.reset();

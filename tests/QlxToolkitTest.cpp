@@ -90,14 +90,14 @@ class ToolkitLifeTest : public HostTest {
       qlxNotifyObjCfgChange(object, "logging");
       QlxBasicObjectFCfgChange(object, "logging");
       QlxBasicLoggerFCfgChange(object, "level");
-      EXPECT_EQ(qlxIntlLogMgrApplyCfg(object, "quill.errorLogger"), toolkitIsOpen());
+      EXPECT_EQ(qlxIntlLogMgrApplyCfg(object, "never made"), 0);
+      EXPECT_EQ(qlxIntlLogMgrHasCfg("never made"), 0);
     }
     EXPECT_EQ(object->objClass, nullptr);
     EXPECT_EQ(object->enabled, 0);
     EXPECT_EQ(object->kind1.word, 0u);
     EXPECT_EQ(object->kind2.word, 0u);
   }
-  static uint8_t toolkitIsOpen() { return qlxToolkitLogger() != nullptr; }
 
   TempDir dir;
 };
@@ -406,12 +406,15 @@ TEST_F(ToolkitLifeTest, VariablesGoBeforeListenersAndListenersBeforeTheRegistry)
   open();
   const Handle a = get("a", HostClasses::kHandler), b = get("b", HostClasses::kHandler);
   QlxAddListener(a.get(), b.get());
+  QlxAddListener(b.get(), a.get());
   int whole = 0;
   host->onFree = [&](void *vars) {
-    if (!vars) return;
-    whole += qlxIntlGetListeners(a.get()) != nullptr;
     const ObjectRef found{qlxToolkitGetObjInstance("b")};
-    EXPECT_NE(found, nullptr);
+    EXPECT_EQ(found.get(), b.get());
+    for (const Handle *handle : {&a, &b}) {
+      EXPECT_EQ(listenersOf(*handle) == "", vars == nullptr);
+    }
+    whole += vars != nullptr;
   };
   QlxCloseToolkit();
   EXPECT_EQ(whole, 2);
@@ -553,6 +556,23 @@ TEST_F(ToolkitLifeTest, AnOperationMayTakeNamesFromTheRegistry) {
   }
 }
 
+TEST_F(ToolkitLifeTest, AnOperationMayTakeItsOwnObjectFromTheRegistry) {
+  host.emplace();
+  open();
+  const Handle first = get("first", HostClasses::kHandler);
+  host->onClose = [](QlxObject *handler) {
+    if (std::string(handler->name) == "first") {
+      const ObjectRef own{qlxIntlGetObject("own", HostClasses::kHandler)};
+    } else {
+      qlxToolkitRemObjInstance("own");  // what alone holds it
+      EXPECT_STREQ(handler->name, "own");
+    }
+  };
+  host->calls.clear();
+  QlxCloseToolkit();
+  EXPECT_EQ(host->takeCalls(), "close first|alloc|close own|free|free|free null|");
+}
+
 TEST_F(ToolkitLifeTest, AnOperationMayChangeListenersAndPropertiesOfAnything) {
   host.emplace();
   open();
@@ -600,13 +620,18 @@ TEST_F(ToolkitLifeTest, AnInertHandleMayBeRegisteredAgainByAnOperation) {
   QlxCloseToolkit();
   host.emplace();
   open();
+  const Handle taken = get("taken", HostClasses::kLogger);
   {
     const ApiLock lock;
+    qlxToolkitRemObjInstance("taken");
+    EXPECT_EQ(taken->objClass, nullptr);
+    qlxToolkitAddObjInstance("taken", taken.get());
     qlxToolkitAddObjInstance("old", old.get());
   }
   EXPECT_EQ(get("old", HostClasses::kLogger), nullptr);
   QlxCloseToolkit();
   EXPECT_EQ(old->refCount, 1u);
+  EXPECT_EQ(taken->refCount, 1u);
 }
 
 TEST_F(ToolkitLifeTest, AnObjectWithTwoNamesIsTakenApartOnce) {
@@ -642,6 +667,9 @@ TEST_F(ToolkitLifeTest, AHeldHandleIsInertAfterACloseAndAfterANewOpen) {
   EXPECT_NE(anew, handles[0]);
   EXPECT_EQ(QlxAddListener(anew.get(), handles[2].get()), 0);
   EXPECT_EQ(QlxRemListener(anew.get(), handles[2].get()), 0);
+  const Handle console = find("quill.defaultConsole"), formatter = find("quill.defaultFormatter");
+  QlxHandlerSetFormatter(console.get(), handles[3].get());
+  EXPECT_EQ(console->kind2.formatter, formatter.get());
 }
 
 TEST_F(ToolkitLifeTest, TheHeaderGoesWithTheHostsLastRelease) {

@@ -74,7 +74,8 @@ QLX_API ObjClass *qlxInitObjectClass(const char *className, int32_t kind, I18Msg
 /** Frees a record that is not registered; null is ignored. */
 QLX_API void qlxFreeObjClass(ObjClass *objClass);
 
-/** Passes the event to the listeners that are filters or handlers, in order; none if disabled. */
+/** Passes the event to the listeners that are filters or handlers, in order; none if disabled. A
+ *  listener that is added or removed meanwhile counts from the next event on. */
 QLX_API void QlxBasicObjectFLog(QlxObject *object, Event *event, va_list *args);
 
 /**

@@ -20,6 +20,7 @@
 #include <qlx/memory.h>
 #include <qlx/ustring.h>
 
+#include "QlxLocked.h"
 #include "util/CxOwned.h"
 
 #include "support/FailingMemory.h"
@@ -636,15 +637,13 @@ TEST_F(HeldFormatsTest, ThreadsShareTheHeldFormats) {
 }
 
 TEST_F(HeldFormatsTest, AChildForkedUnderTheLockFormats) {
-  heldDate(nullptr, 0);
+  { const ApiLock made; }  // the handlers of forks come with the API lock
   std::atomic<bool> stop{false};
   std::thread busy([&] {
-    while (!stop) heldDate(nullptr, 0);
+    while (!stop) const HeldFormatsLock held;
   });
-  for (int round = 0; round < 8; ++round) {
-    qlxHeldFormatsLock();
+  for (int round = 0; round < 20; ++round) {
     const pid_t child = fork();
-    qlxHeldFormatsUnlock();
     if (child == 0) {
       alarm(20);
       _exit(held("en", u"'{'{0}'}'", u"x").text == u"{x}" ? 0 : 1);

@@ -11,10 +11,10 @@
 
 namespace {
 
-class NullArgumentTest : public ::testing::TestWithParam<const NullGroup *> {};
+class NullArgumentTest : public ::testing::TestWithParam<NullGroup> {};
 
-std::string groupName(const ::testing::TestParamInfo<const NullGroup *> &info) {
-  return info.param->name;
+std::string groupName(const ::testing::TestParamInfo<NullGroup> &info) {
+  return info.param.name;
 }
 
 // The names of the exported functions of a header with a parameter that is a pointer: one with a
@@ -52,14 +52,14 @@ std::string missing(const std::set<std::string> &names, const std::set<std::stri
 TEST_P(NullArgumentTest, AnswersByItsRuleAndKeepsNothing) {
   { const ApiLock made; }
   const FailingMemory counting;
-  GetParam()->calls();
+  GetParam().calls();
   EXPECT_EQ(counting.live(), 0);
 }
 
 INSTANTIATE_TEST_SUITE_P(Group, NullArgumentTest, ::testing::ValuesIn(NullGroup::all()), groupName);
 
 TEST(NullArgumentTest, CoversEveryExportedFunction) {
-  for (const NullGroup *group : NullGroup::all()) group->calls();
+  for (const NullGroup &group : NullGroup::all()) group.calls();
   // No check for null is made here, deliberately.
   std::set<std::string> covered = NullGroup::called();
   covered.insert("OslStringSprintf");

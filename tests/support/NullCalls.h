@@ -10,6 +10,7 @@
 #include <array>
 #include <functional>
 #include <optional>
+#include <ostream>
 #include <set>
 #include <string>
 #include <tuple>
@@ -24,10 +25,10 @@
 // A group of calls, one for each subsystem; NULL_GROUP(Name) { ... } makes one known to the tests.
 struct NullGroup {
   NullGroup(const char *groupName, void (*groupCalls)()) : name(groupName), calls(groupCalls) {
-    all().push_back(this);
+    all().push_back(*this);
   }
-  static std::vector<const NullGroup *> &all() {
-    static std::vector<const NullGroup *> groups;
+  static std::vector<NullGroup> &all() {
+    static std::vector<NullGroup> groups;
     return groups;
   }
   // The names of the functions that were called since the process began.
@@ -35,6 +36,7 @@ struct NullGroup {
     static std::set<std::string> names;
     return names;
   }
+  friend void PrintTo(const NullGroup &group, std::ostream *out) { *out << group.name; }
 
   const char *name;
   void (*calls)();

@@ -32,8 +32,8 @@ QLX_API char *QlxBasicFormatterFGetTrailer(QlxObject *formatter);
 
 /**
  * Formats a time in the default locale and zone by the formatter's "dateTimeFormat", or, when the
- * formatter is null or has none, as "yyyy-MM-dd HH:mm:ss.SSS" with the offset from UTC. Takes and
- * needs no lock.
+ * formatter is null or has none, as "yyyy-MM-dd HH:mm:ss.SSS" with the offset from UTC. Takes no
+ * lock, and needs none while no other thread may change the formatter.
  *
  * Deliberate: the minutes of the offset keep their sign and only the hours decide the sign before
  * it: -330 minutes are "-05:-30", -30 are "+00:-30".

@@ -28,11 +28,11 @@ class Host {
     char pattern[] = "/tmp/qlxbenchXXXXXX";
     folder_ = mkdtemp(pattern);
     QlxOpenToolkit(nullptr, nullptr);
-    set("bench.file", "className", "qlx_filehandler");
-    set("bench.file", "fileName", path().c_str());
-    set("bench.file", "maxFileBytes", maxBytes);
-    set("bench.file", "maxFiles", maxFiles);
-    set("bench", "listenerNames", "bench.file");
+    set("benchFile", "className", "qlx_filehandler");
+    set("benchFile", "fileName", path().c_str());
+    set("benchFile", "maxFileBytes", maxBytes);
+    set("benchFile", "maxFiles", maxFiles);
+    set("bench", "listenerNames", "benchFile");
     logger_ = QlxGetObject("bench", "qlx_basiclogger");
   }
   ~Host() {

@@ -1,6 +1,6 @@
-// The chain under every container: nodes linked both ways in the order of insertion; heads and nodes
-// are blocks of their own. A template looks a node up only in its `find`, and changes the chain only
-// by linkAtTail and unlink.
+// The chain under every container: nodes linked both ways in the order of insertion; heads and
+// nodes are blocks of their own. A template looks a node up only in its `find`, and changes the
+// chain only by linkAtTail and unlink.
 #ifndef QLX_SRC_QLXNODES_H
 #define QLX_SRC_QLXNODES_H
 

@@ -34,6 +34,8 @@ QLX_API uint8_t QlxOpenToolkit(const char *configFileName, CxStatus *status);
  *
  * Handles that the host still holds become inert: every call with one is safe and does nothing,
  * also after the next open; QlxReleaseObject() still gives it back.
+ *
+ * The toolkit holds ICU objects while it is open: close it before a call of ICU's u_cleanup().
  */
 QLX_API void QlxCloseToolkit(void);
 

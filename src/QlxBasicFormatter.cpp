@@ -136,7 +136,5 @@ const ObjClass qlxBasicFormatterClass = {
     .op2 = {.fGetHeader = QlxBasicFormatterFGetHeader},
     .op3 = {.fGetTrailer = QlxBasicFormatterFGetTrailer},
     .op4 = {.fBindMsg = qlxIntlBindUI18Msg},
-    .fAllocVars = nullptr,
-    .fFreeVars = nullptr,
     .fCfgChange = QlxBasicFormatterFCfgChange,
 };

@@ -6,9 +6,14 @@
 #include <qlx/types.h>
 
 extern const ObjClass qlxBasicLoggerClass;
+extern const ObjClass qlxPDLoggerClass;
 extern const ObjClass qlxLevelFilterClass;
+extern const ObjClass qlxMsgIdFilterClass;
 extern const ObjClass qlxConsoleHandlerClass;
 extern const ObjClass qlxFileHandlerClass;
+extern const ObjClass qlxMultiProcFileHandlerClass;
 extern const ObjClass qlxBasicFormatterClass;
+extern const ObjClass qlxPDXMLFormatterClass;
+extern const ObjClass qlxVexTraceFormatterClass;
 
 #endif

@@ -67,7 +67,6 @@ const ObjClass qlxConsoleHandlerClass = {
     .op1 = {.fProcess = QlxConsoleUHandlerFProcess},
     .op2 = {.fOpen = QlxConsoleHandlerFOpen},
     .op3 = {.fClose = QlxConsoleHandlerFClose},
-    .op4 = {},
     .fAllocVars = QlxConsoleHandlerFAllocVars,
     .fFreeVars = QlxConsoleHandlerFFreeVars,
     .fCfgChange = QlxBasicHandlerFCfgChange,

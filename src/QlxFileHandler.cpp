@@ -91,7 +91,7 @@ void qlxKeepFailure(Event *event, CxStatus status) {
 
 // The end of an append-mode file costs a tenth of its status; without that mode the seek would move
 // the place of the next write.
-static CxStatus measure(QlxFileHandlerVars *vars) {
+CxStatus qlxFileHandlerMeasure(QlxFileHandlerVars *vars) {
   int64_t size = vars->appending == 1 ? lseek(vars->file, 0, SEEK_END) : -1;
   CxStatus status = kCxSuccess;
   if (size < 0) status = CxFileGetSize(&vars->file, &size);
@@ -171,7 +171,7 @@ static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
     QlxFileHandlerFClose(handler);
     return false;
   }
-  const CxStatus status = measure(vars);
+  const CxStatus status = qlxFileHandlerMeasure(vars);
   if (qlxFailed(status)) {
     qlxKeepFailure(nullptr, status);
     closeFile(vars);
@@ -185,7 +185,7 @@ static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
 // Opens the active file with room for an event, behind its header.
 static CxStatus openForEvent(QlxObject *handler, QlxFileHandlerVars *vars) {
   CxStatus status = openFile(vars);
-  if (!qlxFailed(status)) status = measure(vars);
+  if (!qlxFailed(status)) status = qlxFileHandlerMeasure(vars);
   if (!qlxFailed(status) && qlxFileHandlerIsFull(vars)) {
     vars->opened = 1;  // what is open is closed with its trailer
     rollOver(handler, vars);
@@ -321,7 +321,6 @@ const ObjClass qlxFileHandlerClass = {
     .op1 = {.fProcess = QlxFileUHandlerFProcess},
     .op2 = {.fOpen = QlxFileHandlerFOpen},
     .op3 = {.fClose = QlxFileHandlerFClose},
-    .op4 = {},
     .fAllocVars = QlxFileHandlerFAllocVars,
     .fFreeVars = QlxFileHandlerFFreeVars,
     .fCfgChange = QlxFileHandlerFCfgChange,

@@ -50,6 +50,9 @@ void qlxKeepFailure(Event *event, CxStatus status);
 /** Makes the directory of the generations; a failure is reported, opening then fails by itself. */
 void qlxFileHandlerMakeDirectory(const QlxFileHandlerVars *vars);
 
+/** Sets the size to that of the open file, which sees other writers' bytes too. */
+CxStatus qlxFileHandlerMeasure(QlxFileHandlerVars *vars);
+
 /** True when the size, as last measured, calls for a rollover. */
 bool qlxFileHandlerIsFull(const QlxFileHandlerVars *vars);
 

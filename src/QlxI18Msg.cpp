@@ -76,13 +76,12 @@ void qlxSetI18MsgLocale(I18Msg *message, const char *locale) {
   message->shared = 0;
 }
 
-// Opens the bundle by its name or, when that fails, by the part after the name's last "/".
-static UResourceBundle *openBundle(const I18Msg *message, UErrorCode *status) {
-  UResourceBundle *bundle = ures_open(message->bundle, message->locale, status);
-  const char *separator = std::strrchr(message->bundle, '/');
+UResourceBundle *qlxOpenMessageBundle(const char *name, const char *locale, UErrorCode *status) {
+  UResourceBundle *bundle = ures_open(name, locale, status);
+  const char *separator = std::strrchr(name, '/');
   if (U_SUCCESS(*status) || !separator) return bundle;
   *status = U_ZERO_ERROR;
-  return ures_open(separator + 1, message->locale, status);
+  return ures_open(separator + 1, locale, status);
 }
 
 // Appends the message's text. An empty text and a message without a pattern are no failures.
@@ -91,7 +90,8 @@ static uint32_t bindTo(I18Msg *message, va_list *args, CxUStringBuff *text, UErr
     if (!message->text) return 0;
     return qlxAppendHeldMessage(text, message->locale, message->text, args, status);
   }
-  const icu::LocalUResourceBundlePointer bundle{openBundle(message, status)};
+  const icu::LocalUResourceBundlePointer bundle{
+      qlxOpenMessageBundle(message->bundle, message->locale, status)};
   if (U_FAILURE(*status)) return 0;
   *status = U_ZERO_ERROR;
   int32_t length = 0;

@@ -47,8 +47,5 @@ const ObjClass qlxLevelFilterClass = {
     .op1 = {.fProcess = QlxBasicFilterFProcess},
     .op2 = {.fIsLoggable = QlxLevelFilterFIsLoggable},
     .op3 = {.fLog = QlxBasicObjectFLog},
-    .op4 = {},
-    .fAllocVars = nullptr,
-    .fFreeVars = nullptr,
     .fCfgChange = QlxLevelFilterFCfgChange,
 };

@@ -110,11 +110,6 @@ const ObjClass qlxBasicLoggerClass = {
     .name = "qlx_basiclogger",
     .description = nullptr,
     .op1 = {.fLog = QlxBasicObjectFLog},
-    .op2 = {},
-    .op3 = {},
-    .op4 = {},
-    .fAllocVars = nullptr,
-    .fFreeVars = nullptr,
     .fCfgChange = QlxBasicLoggerFCfgChange,
 };
 

@@ -21,8 +21,10 @@ static constexpr int32_t kKinds = 4;  // Logger, Filter, Handler, Formatter: con
 
 // In the order of registration.
 static constexpr const ObjClass *kBuiltinClasses[] = {
-    &qlxBasicLoggerClass, &qlxLevelFilterClass,    &qlxConsoleHandlerClass,
-    &qlxFileHandlerClass, &qlxBasicFormatterClass,
+    &qlxBasicLoggerClass,          &qlxPDLoggerClass,       &qlxLevelFilterClass,
+    &qlxMsgIdFilterClass,          &qlxConsoleHandlerClass, &qlxFileHandlerClass,
+    &qlxMultiProcFileHandlerClass, &qlxBasicFormatterClass, &qlxPDXMLFormatterClass,
+    &qlxVexTraceFormatterClass,
 };
 
 static struct {

@@ -16,9 +16,15 @@ using Keys = std::map<std::string, std::set<std::string>>;  // of a section, or 
 
 // Which section tells of which table.
 const std::map<std::string, std::string> kSectionOfTable = {
-    {"kCommonKeys", "Every class"},          {"kLoggerKeys", "qlx_basiclogger"},
-    {"kLevelFilterKeys", "qlx_levelfilter"}, {"kHandlerKeys", "Every handler"},
-    {"kFileHandlerKeys", "qlx_filehandler"}, {"kFormatterKeys", "qlx_basicformatter"},
+    {"kCommonKeys", "Every class"},
+    {"kLoggerKeys", "qlx_basiclogger"},
+    {"kLevelFilterKeys", "qlx_levelfilter"},
+    {"kHandlerKeys", "Every handler"},
+    {"kFileHandlerKeys", "qlx_filehandler"},
+    {"kFormatterKeys", "qlx_basicformatter"},
+    {"kMsgIdFilterKeys", "qlx_msgidfilter"},
+    {"kXmlFormatterKeys", "qlx_xmlformatter"},
+    {"kStamps", "qlx_pdlogger"},
 };
 
 std::filesystem::path projectFile(const char *name) {
@@ -41,7 +47,7 @@ std::set<std::string> firstGroups(const std::string &text, const char *pattern) 
 }
 
 Keys keysOfTables() {
-  static const std::regex table(R"(ConfigKey (k\w+)\[\] = \{([^;]*)\};)");
+  static const std::regex table(R"((?:ConfigKey|Stamp) (k\w+)\[\] = \{([^;]*)\};)");
   Keys keys;
   for (const auto &entry : std::filesystem::directory_iterator(projectFile("src"))) {
     if (entry.path().extension() != ".cpp") continue;

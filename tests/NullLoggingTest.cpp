@@ -2,11 +2,14 @@
 // formatters.
 #include <cstdio>
 
+#include <sys/sem.h>
+
 #include <unicode/utypes.h>
 
 #include <qlx/class.h>
 #include <qlx/qlx.h>
 
+#include "QlxFileHandler.h"
 #include "support/CaptureStdout.h"
 #include "support/NullCalls.h"
 #include "support/OpenToolkit.h"
@@ -243,6 +246,25 @@ NULL_GROUP(FileHandlers) {
   HELD(QlxFileHandlerFClose, with(nullptr), nothing);
   EXPECT_EQ(event->status, kSuccess);
   EXPECT_EQ(dir.read("app.log"), "' text\n");
+  QlxFreeEvent(event);
+  QlxReleaseObject(handler);
+}
+
+NULL_GROUP(MultiProcessFileHandlers) {
+  const TempDir dir;
+  const OpenToolkit toolkit;
+  QlxObject *handler = QlxGetObject("file", "qlx_multiproc_filehandler");
+  QlxSetObjProp(handler->kind2.formatter, "dateTimeFormat", "''");
+  QlxSetObjProp(handler, "MPFileSemKey", "0");  // a set of this process alone
+  QlxSetObjProp(handler, "fileName", dir.path("app.log").c_str());
+  Event *event = QlxVaAllocUEvent(INFO, nullptr, nullptr, u"text");
+  HELD(QlxMultiProcFileUHandlerFProcess, with(handler, event, nullptr), nothing);
+  HELD(QlxMultiProcFileHandlerFOpen, with(nullptr), nothing);
+  HELD(QlxMultiProcFileHandlerFOpenWithErr, with(nullptr), is(kSuccess));
+  HELD(QlxMultiProcFileHandlerFClose, with(nullptr), nothing);
+  EXPECT_EQ(event->status, kSuccess);
+  EXPECT_EQ(dir.read("app.log"), "' text\n");
+  semctl(qlxFileHandlerVars(handler)->semId, 0, IPC_RMID);
   QlxFreeEvent(event);
   QlxReleaseObject(handler);
 }

@@ -231,10 +231,10 @@ TEST_F(ToolkitLifeTest, OpensAgainAsNewAfterAClose) {
 
 TEST_F(ToolkitLifeTest, RegistersTheBuiltInClassesInTheirOrder) {
   open();
-  EXPECT_EQ(classNames(101), "qlx_basiclogger|");
-  EXPECT_EQ(classNames(102), "qlx_levelfilter|");
-  EXPECT_EQ(classNames(103), "qlx_consolehandler|qlx_filehandler|");
-  EXPECT_EQ(classNames(104), "qlx_basicformatter|");
+  EXPECT_EQ(classNames(101), "qlx_basiclogger|qlx_pdlogger|");
+  EXPECT_EQ(classNames(102), "qlx_levelfilter|qlx_msgidfilter|");
+  EXPECT_EQ(classNames(103), "qlx_consolehandler|qlx_filehandler|qlx_multiproc_filehandler|");
+  EXPECT_EQ(classNames(104), "qlx_basicformatter|qlx_xmlformatter|qlx_vextraceformatter|");
 }
 
 TEST_F(ToolkitLifeTest, ANumberThatIsNoKindHasNoClasses) {
@@ -246,13 +246,13 @@ TEST_F(ToolkitLifeTest, ANumberThatIsNoKindHasNoClasses) {
 
 TEST_F(ToolkitLifeTest, RegisteringAClassBeforeAnOpenRegistersTheBuiltInOnesFirst) {
   host.emplace();
-  EXPECT_EQ(classNames(101), "qlx_basiclogger|test_hostlogger|");
-  EXPECT_EQ(classNames(103), "qlx_consolehandler|qlx_filehandler|test_hosthandler|");
+  EXPECT_EQ(classNames(101), "qlx_basiclogger|qlx_pdlogger|test_hostlogger|");
+  EXPECT_EQ(classNames(103), "qlx_consolehandler|qlx_filehandler|qlx_multiproc_filehandler|test_hosthandler|");
   const ObjClass *builtin = findClass("qlx_basiclogger"), *own = findClass("test_hostlogger");
   open();
   EXPECT_EQ(findClass("qlx_basiclogger"), builtin);
   EXPECT_EQ(findClass("test_hostlogger"), own);
-  EXPECT_EQ(classNames(101), "qlx_basiclogger|test_hostlogger|");
+  EXPECT_EQ(classNames(101), "qlx_basiclogger|qlx_pdlogger|test_hostlogger|");
 }
 
 TEST_F(ToolkitLifeTest, AHostsClassDoesNotTakeABuiltInNameEvenBeforeAnOpen) {
@@ -260,7 +260,7 @@ TEST_F(ToolkitLifeTest, AHostsClassDoesNotTakeABuiltInNameEvenBeforeAnOpen) {
                     [](QlxObject *, Event *, va_list *) {});
   EXPECT_EQ(findClass("qlx_basiclogger")->op1.fLog, QlxBasicObjectFLog);
   EXPECT_NE(findClass("qlx_basiclogger")->fCfgChange, nullptr);
-  EXPECT_EQ(classNames(101), "qlx_basiclogger|");
+  EXPECT_EQ(classNames(101), "qlx_basiclogger|qlx_pdlogger|");
 }
 
 TEST_F(ToolkitLifeTest, ARecordOfAnotherKindIsFoundAndListedNowhere) {

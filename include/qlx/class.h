@@ -16,6 +16,7 @@
 #include <qlx/class/handler.h>
 #include <qlx/class/logger.h>
 #include <qlx/class/message.h>
+#include <qlx/class/msgid.h>
 #include <qlx/class/object.h>
 #include <qlx/class/props.h>
 #include <qlx/class/toolkit.h>

@@ -13,6 +13,7 @@
 #include <qlx/event.h>
 #include <qlx/files.h>
 #include <qlx/handler.h>
+#include <qlx/kmsid.h>
 #include <qlx/level.h>
 #include <qlx/logger.h>
 #include <qlx/memory.h>

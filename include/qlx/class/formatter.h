@@ -43,6 +43,32 @@ QLX_API char *QlxBasicFormatterFGetTrailer(QlxObject *formatter);
  */
 QLX_API UChar *QlxBasicUFormatterFormatDate(QlxObject *formatter, double time);
 
+/*
+ * The XML formatter: each event as a Message or a Trace element. Deliberate: nothing is escaped, in
+ * attributes, content and character data.
+ */
+/** @return variables with every flag clear, the preamble due; null when memory ran out */
+QLX_API void *QlxPDXMLFormatterFAllocVars(void);
+/** Null is ignored. */
+QLX_API void QlxPDXMLFormatterFFreeVars(void *vars);
+/** The six flags, and the basic formatter's keys. */
+QLX_API void QlxPDXMLFormatterFCfgChange(QlxObject *formatter, const char *key);
+/** @return the record; null for a null event, for a formatter without variables or of another kind,
+ *          and when memory ran out */
+QLX_API UChar *QlxPDXMLUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args);
+/** The next record has the preamble of single elements before it. @return null */
+QLX_API char *QlxPDXMLFormatterFGetHeader(QlxObject *formatter);
+/** @return null */
+QLX_API char *QlxPDXMLFormatterFGetTrailer(QlxObject *formatter);
+
+/**
+ * The trace formatter's line: a record separator (U+001E), then time, level, host, process and
+ * thread, source, message identifier and text with " - " between them.
+ *
+ * @return the line; null when the formatter or the event is null, and when memory ran out
+ */
+QLX_API UChar *QlxVexTraceUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args);
+
 QLX_END_DECLS
 
 #endif

@@ -61,6 +61,27 @@ QLX_API CxStatus QlxFileHandlerFOpenWithErr(QlxObject *handler);
 /** Writes the trailer and closes; a closed file stays as it is. */
 QLX_API void QlxFileHandlerFClose(QlxObject *handler);
 
+/*
+ * The multi-process file handler: a file handler whose file several processes append to, each under
+ * the semaphore of "MPFileSemKey". It has the file handler's variables and keys. The file never
+ * changes its name: at rollover it is copied to generation 1 and truncated.
+ */
+/** Opens the file, and writes under the semaphore. Deliberate: while the file cannot be opened the
+ *  event is not passed on; when the semaphore fails it is, but its record is dropped. */
+QLX_API void QlxMultiProcFileUHandlerFProcess(QlxObject *handler, Event *event, va_list *args);
+/** QlxMultiProcFileHandlerFOpenWithErr() without its answer. */
+QLX_API void QlxMultiProcFileHandlerFOpen(QlxObject *handler);
+/**
+ * Makes or finds the semaphore and opens the active file to append, whatever "appending" says. No
+ * header, no look at the size.
+ *
+ * @return success also when there is nothing to open, and, with the file left closed, when the
+ *         semaphore cannot be had; that failure is reported
+ */
+QLX_API CxStatus QlxMultiProcFileHandlerFOpenWithErr(QlxObject *handler);
+/** Closes the file without a trailer. Only a configuration change writes one. */
+QLX_API void QlxMultiProcFileHandlerFClose(QlxObject *handler);
+
 QLX_END_DECLS
 
 #endif

@@ -1,0 +1,31 @@
+// The steps of the multi-process file handler. Its variables are the file handler's.
+#ifndef QLX_SRC_QLXMULTIPROCFILEHANDLER_H
+#define QLX_SRC_QLXMULTIPROCFILEHANDLER_H
+
+#include "QlxFileHandler.h"
+
+QLX_BEGIN_DECLS
+
+/** Makes the semaphore set of the key, free, or attaches to it as it is. @return 1, or 0 */
+uint8_t qlxMultiProcFileHandlerInitSem(QlxFileHandlerVars *vars);
+
+/**
+ * Waits for the semaphore. Deliberate: after the eleventh interruption it goes on without, so that
+ * a record is rather written unserialised than lost.
+ *
+ * @return 1, or 0 for null and when waiting failed
+ */
+uint8_t qlxMultiProcFileHandlerLockSem(QlxFileHandlerVars *vars);
+
+/** Gives the semaphore back, unless it is free already: its value never rises above 1. */
+void qlxMultiProcFileHandlerUnlockSem(QlxFileHandlerVars *vars);
+
+/** Moves the generations up by one and empties the active file into the first. */
+void qlxMultiProcFileHandlerDoRollover(QlxFileHandlerVars *vars);
+
+/** Copies the active file into generation 1 and truncates it, also when the copy failed. */
+void qlxMultiProcFileHandlerRollActiveLog(QlxFileHandlerVars *vars);
+
+QLX_END_DECLS
+
+#endif

@@ -1,0 +1,109 @@
+// The problem-determination logger: a basic logger that stamps every event with the identity of the
+// product and of the place where it runs, and with its message identifier.
+#include <qlx/class/logger.h>
+
+#include <array>
+
+#include <qlx/class/msgid.h>
+#include <qlx/class/object.h>
+#include <qlx/event.h>
+#include <qlx/memory.h>
+#include <qlx/system.h>
+
+#include "QlxClasses.h"
+#include "QlxObject.h"
+
+namespace {
+
+struct PDLoggerVars {
+  char *organization;
+  char *product;
+  char *component;
+  char *client;
+  char *server;        // the fully qualified host name at first
+  char *serverFormat;  // "IP" at first
+  char *productInstance;
+  QlxObject *idFormatter;  // counted; shared by all loggers of this class
+};
+
+// One row for each stamped value, in the order in which an event gets them: the property of the
+// logger and of the event, and where the logger keeps it (owned, null: not stamped).
+struct Stamp {
+  const char *key;
+  char *PDLoggerVars::*value;
+};
+
+constexpr Stamp kStamps[] = {
+    {"organization", &PDLoggerVars::organization},
+    {"product", &PDLoggerVars::product},
+    {"component", &PDLoggerVars::component},
+    {"client", &PDLoggerVars::client},
+    {"server", &PDLoggerVars::server},
+    {"serverFormat", &PDLoggerVars::serverFormat},
+    {"productInstance", &PDLoggerVars::productInstance},
+};
+
+constexpr uint32_t kMaxHostChars = 256;
+
+PDLoggerVars *varsOf(QlxObject *logger) {
+  return logger ? static_cast<PDLoggerVars *>(logger->vars) : nullptr;
+}
+
+char *hostName() {
+  std::array<char, kMaxHostChars + 1> name{};  // one more than the call is told: it terminates
+  const CxStatus status = CxSystemGetFQHostname(name.data(), kMaxHostChars);
+  return OslStringDup(status.kind == '-' ? name.data() : "NO_HOSTNAME");
+}
+
+}  // namespace
+
+void *QlxPDLoggerFAllocVars(void) {
+  auto *vars = static_cast<PDLoggerVars *>(OslMemoryCalloc(1, sizeof(PDLoggerVars)));
+  if (!vars) return nullptr;
+  vars->server = hostName();
+  vars->serverFormat = OslStringDup("IP");
+  vars->idFormatter = qlxIntlGetObject("quill.pdMsgIdFormatter", "qlx_xmlformatter");
+  return vars;
+}
+
+void QlxPDLoggerFFreeVars(void *block) {
+  auto *vars = static_cast<PDLoggerVars *>(block);
+  if (!vars) return;
+  qlxIntlReleaseObject(vars->idFormatter);
+  for (const Stamp &stamp : kStamps) OslMemoryFree(vars->*stamp.value);
+  OslMemoryFree(vars);
+}
+
+void QlxPDLoggerFCfgChange(QlxObject *logger, const char *key) {
+  PDLoggerVars *vars = varsOf(logger);
+  if (!vars || !key) return;
+  for (const Stamp &stamp : kStamps) {
+    if (OslStringCmp(stamp.key, key) != 0) continue;
+    OslMemoryFree(vars->*stamp.value);
+    vars->*stamp.value = qlxIntlGetObjProp(logger, key, nullptr);
+    return;
+  }
+  QlxBasicLoggerFCfgChange(logger, key);
+}
+
+void QlxPDLoggerFLog(QlxObject *logger, Event *event, va_list *args) {
+  if (!logger || !event) return;
+  PDLoggerVars *vars = varsOf(logger);
+  for (const Stamp &stamp : kStamps) {
+    if (vars && vars->*stamp.value) QlxSetEventProp(event, stamp.key, vars->*stamp.value);
+  }
+  QlxSetEventPropLong(event, "processId", static_cast<int32_t>(CxProcessGetCurrentID()));
+  QlxSetEventPropLong(event, "threadId", static_cast<int32_t>(CxThreadGetCurrentID()));
+  qlxPDXMLUFormatterCacheMessageID(vars ? vars->idFormatter : nullptr, event, args);
+  QlxBasicObjectFLog(logger, event, args);
+}
+
+const ObjClass qlxPDLoggerClass = {
+    .kind = Logger,
+    .name = "qlx_pdlogger",
+    .description = nullptr,
+    .op1 = {.fLog = QlxPDLoggerFLog},
+    .fAllocVars = QlxPDLoggerFAllocVars,
+    .fFreeVars = QlxPDLoggerFFreeVars,
+    .fCfgChange = QlxPDLoggerFCfgChange,
+};

@@ -1,0 +1,29 @@
+// The XML formatter's parts: the emitters of its elements, and the message identifiers that the
+// problem-determination logger, the message-identifier filter and the trace formatter share.
+#ifndef QLX_SRC_QLXPDXMLFORMATTER_H
+#define QLX_SRC_QLXPDXMLFORMATTER_H
+
+#include <qlx/class/formatter.h>
+
+QLX_BEGIN_DECLS
+
+/** Appends the word of a level. */
+void qlxPDXMLEmitULevel(CxUStringBuff *record, int32_t level);
+
+/** Appends the product elements that are selected and that the event has, in their fixed order. */
+void qlxPDXMLEmitUProductInfo(CxUStringBuff *record, Event *event, uint8_t component,
+                              uint8_t product, uint8_t instance, uint8_t server);
+
+/** Appends the source element; 0 when the event has no source file and nothing was appended. */
+uint8_t qlxPDXMLEmitUSource(CxUStringBuff *record, Event *event);
+
+/** Appends the bundle, the key and, as far as the pattern tells their types, the parameters. */
+void qlxPDXMLEmitUTranslationInfo(CxUStringBuff *record, Event *event, const char *bundle,
+                                  va_list *args);
+
+/** 0 for a property that has an element of its own and is no free attribute, else 1. */
+uint8_t qlxPDXMLCheckKey(const char *key);
+
+QLX_END_DECLS
+
+#endif

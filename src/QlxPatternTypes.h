@@ -1,0 +1,17 @@
+// What a message pattern says about the types of its arguments.
+#ifndef QLX_SRC_QLXPATTERNTYPES_H
+#define QLX_SRC_QLXPATTERNTYPES_H
+
+#include <array>
+
+#include <qlx/base.h>
+
+enum class ArgType : uint8_t { kNone, kString, kInteger, kDouble };
+
+using ArgTypes = std::array<ArgType, 10>;  // by argument index
+
+/** Scans a pattern; false when it cannot be read. Deliberate: one apostrophe toggles quoting, also
+ *  where ICU prints it. The last type seen for an index counts; indexes above 9 are ignored. */
+bool qlxScanPatternTypes(const UChar *pattern, ArgTypes *types);
+
+#endif

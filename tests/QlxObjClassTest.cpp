@@ -237,8 +237,10 @@ TEST_F(ObjClassTest, EveryKindListsItsClassesInTheOrderOfRegistration) {
   QlxAddLoggerClass("l2", nullptr, nullptr, nullptr, nullptr, nullptr);
   EXPECT_EQ(joined(QlxGetLoggerClasses()), "qlx_basiclogger|qlx_pdlogger|l1|l2|");
   EXPECT_EQ(joined(QlxGetFilterClasses()), "qlx_levelfilter|qlx_msgidfilter|f1|");
-  EXPECT_EQ(joined(QlxGetHandlerClasses()), "qlx_consolehandler|qlx_filehandler|qlx_multiproc_filehandler|h1|");
-  EXPECT_EQ(joined(QlxGetFormatterClasses()), "qlx_basicformatter|qlx_xmlformatter|qlx_vextraceformatter|u1|");
+  EXPECT_EQ(joined(QlxGetHandlerClasses()),
+            "qlx_consolehandler|qlx_filehandler|qlx_multiproc_filehandler|h1|");
+  EXPECT_EQ(joined(QlxGetFormatterClasses()),
+            "qlx_basicformatter|qlx_xmlformatter|qlx_vextraceformatter|u1|");
 }
 
 // With each of its allocations failing in turn.

@@ -247,7 +247,8 @@ TEST_F(ToolkitLifeTest, ANumberThatIsNoKindHasNoClasses) {
 TEST_F(ToolkitLifeTest, RegisteringAClassBeforeAnOpenRegistersTheBuiltInOnesFirst) {
   host.emplace();
   EXPECT_EQ(classNames(101), "qlx_basiclogger|qlx_pdlogger|test_hostlogger|");
-  EXPECT_EQ(classNames(103), "qlx_consolehandler|qlx_filehandler|qlx_multiproc_filehandler|test_hosthandler|");
+  EXPECT_EQ(classNames(103),
+            "qlx_consolehandler|qlx_filehandler|qlx_multiproc_filehandler|test_hosthandler|");
   const ObjClass *builtin = findClass("qlx_basiclogger"), *own = findClass("test_hostlogger");
   open();
   EXPECT_EQ(findClass("qlx_basiclogger"), builtin);

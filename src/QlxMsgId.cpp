@@ -1,37 +1,44 @@
 // Message identifiers of events: what the bound text starts with, parsed once an event.
-#include <qlx/class/msgid.h>
+#include "QlxMsgId.h"
 
 #include <algorithm>
-#include <array>
 
 #include <qlx/class/message.h>
 #include <qlx/event.h>
-#include <qlx/kmsid.h>
 #include <qlx/memory.h>
 
 #include "util/CxOwned.h"
 
-char *qlxPDXMLGetMessageID(const char *text) {
+static MessageId parse(const char *text) {
   const CxKMSIDInfo info = CxParseKMSID(text);
-  if (info.length < 1) return nullptr;
-  std::array<char, sizeof info.id + 1> id{};  // one of ten characters has no terminator of its own
-  std::copy_n(info.id, info.length, id.begin());
-  return OslStringDup(id.data());
+  MessageId id{};  // one of ten characters has no terminator of its own
+  std::copy_n(info.id, info.length, id.text);
+  return id;
+}
+
+MessageId qlxMessageIdOf(const UChar *text) {
+  // An identifier is ASCII, so the start of the text up to anything else says it all.
+  MessageId start{};
+  for (size_t i = 0; text && i + 1 < sizeof start.text && text[i] != 0 && text[i] < 0x80; ++i) {
+    start.text[i] = static_cast<char>(text[i]);
+  }
+  return parse(start.text);
+}
+
+static char *copyOf(const MessageId &id) {
+  return *id.text ? OslStringDup(id.text) : nullptr;
+}
+
+char *qlxPDXMLGetMessageID(const char *text) {
+  return copyOf(parse(text));
 }
 
 char *qlxPDXMLUGetMessageID(const UChar *text) {
-  if (!text) return nullptr;
-  // An identifier is ASCII, so the start of the text up to anything else says it all.
-  std::array<char, sizeof CxKMSIDInfo::id + 1> start{};
-  for (size_t i = 0; i + 1 < start.size() && text[i] != 0 && text[i] < 0x80; ++i) {
-    start[i] = static_cast<char>(text[i]);
-  }
-  return qlxPDXMLGetMessageID(start.data());
+  return copyOf(qlxMessageIdOf(text));
 }
 
 void qlxPDXMLUFormatterCacheMessageID(QlxObject *, Event *event, va_list *args) {
   if (!event || event->messageId) return;
   const OwnedUStr text{QlxBindEventUMsg(event, qlxIntlBindUI18Msg, args)};
-  const OwnedStr id{qlxPDXMLUGetMessageID(text.get())};
-  QlxSetEventMessageId(event, id ? id.get() : "");
+  QlxSetEventMessageId(event, qlxMessageIdOf(text.get()).text);
 }

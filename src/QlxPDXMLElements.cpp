@@ -2,6 +2,9 @@
 // Deliberate: nothing is escaped, values stand as they are.
 #include "QlxPDXMLFormatter.h"
 
+#include <algorithm>
+#include <iterator>
+
 #include <unicode/localpointer.h>
 #include <unicode/ures.h>
 
@@ -13,6 +16,7 @@
 #include "QlxI18Msg.h"
 #include "QlxPatternTypes.h"
 #include "QlxProps.h"
+#include "QlxRecordText.h"
 
 // ---- Words
 
@@ -20,14 +24,15 @@ namespace {
 
 struct LevelWord {
   int32_t level;
-  const char *word;
+  const UChar *word;
 };
 
 constexpr LevelWord kLevelWords[] = {
-    {DEBUG_MAX, "MAX"}, {DEBUG_MID, "MID"}, {DEBUG_MIN, "MIN"}, {INFO, "INFO"},
-    {WARN, "WARN"},     {ERROR, "ERROR"},   {FATAL, "ERROR"},  // Deliberate: no word of its own
+    {DEBUG_MAX, u"MAX"}, {DEBUG_MID, u"MID"}, {DEBUG_MIN, u"MIN"}, {INFO, u"INFO"},
+    {WARN, u"WARN"},     {ERROR, u"ERROR"},   {FATAL, u"ERROR"},  // Deliberate: no word of its own
 };
 
+// Those with an element of their own. Deliberate: "organization" has none and is a free attribute.
 constexpr const char *kReservedKeys[] = {
     "threadId",         "correlationId",    "client",
     "qlx_prop_srcfile", "qlx_prop_srcline", "qlx_prop_srcfunction",
@@ -38,18 +43,13 @@ constexpr const char *kReservedKeys[] = {
 }  // namespace
 
 void qlxPDXMLEmitULevel(CxUStringBuff *record, int32_t level) {
-  const char *word = "OTHER";
-  for (const LevelWord &row : kLevelWords) {
-    if (row.level == level) word = row.word;
-  }
-  CxUStringBuffAppendStr(record, word);
+  const auto *row = std::ranges::find(kLevelWords, level, &LevelWord::level);
+  RecordText(record) << (row != std::end(kLevelWords) ? row->word : u"OTHER");
 }
 
 uint8_t qlxPDXMLCheckKey(const char *key) {
-  for (const char *reserved : kReservedKeys) {
-    if (OslStringCmp(reserved, key) == 0) return 0;
-  }
-  return 1;
+  return std::ranges::none_of(
+      kReservedKeys, [key](const char *reserved) { return OslStringCmp(reserved, key) == 0; });
 }
 
 // ---- Product and source
@@ -58,63 +58,61 @@ static const char *peek(const Event *event, const char *key) {
   return event ? qlxPeekMapProp(event->props, key) : nullptr;
 }
 
-static void emitAll(CxUStringBuff *record, std::initializer_list<const char *> texts) {
-  for (const char *text : texts) CxUStringBuffAppendStr(record, text);
-}
-
 static void emitServer(CxUStringBuff *record, const Event *event) {
   const char *server = peek(event, "server");
   if (!server) return;
-  const char *format = peek(event, "serverFormat");
-  emitAll(record, {" <Server Format=\"", format ? format : "", "\">", server, "</Server>\n"});
+  RecordText(record) << u" <Server Format=\"" << peek(event, "serverFormat") << u"\">" << server
+                     << u"</Server>\n";
 }
 
 void qlxPDXMLEmitUProductInfo(CxUStringBuff *record, Event *event, uint8_t component,
                               uint8_t product, uint8_t instance, uint8_t server) {
-  struct Element {
+  const struct {
     uint8_t selected;
     const char *key;
-    const char *name;
-  };
-  const Element elements[] = {{product, "product", "ProductId"},
-                              {component, "component", "Component"},
-                              {instance, "productInstance", "ProductInstance"}};
+    const UChar *name;
+  } elements[] = {{product, "product", u"ProductId"},
+                  {component, "component", u"Component"},
+                  {instance, "productInstance", u"ProductInstance"}};
   if (server) emitServer(record, event);
-  for (const Element &element : elements) {
-    const char *value = element.selected ? peek(event, element.key) : nullptr;
-    if (value) emitAll(record, {" <", element.name, ">", value, "</", element.name, ">\n"});
+  for (const auto &[selected, key, name] : elements) {
+    const char *value = selected ? peek(event, key) : nullptr;
+    if (value) RecordText(record) << u" <" << name << u">" << value << u"</" << name << u">\n";
   }
 }
 
 uint8_t qlxPDXMLEmitUSource(CxUStringBuff *record, Event *event) {
   const char *file = peek(event, "qlx_prop_srcfile");
   if (!file) return 0;
-  emitAll(record, {" <Source FileName=\"", file});
-  if (const char *function = peek(event, "qlx_prop_srcfunction")) {
-    emitAll(record, {"\" Method=\"", function});
-  }
+  RecordText out(record);
+  out << u" <Source FileName=\"" << file;
+  const char *function = peek(event, "qlx_prop_srcfunction");
+  if (function) out << u"\" Method=\"" << function;
   uint8_t found = 0;
   const int32_t line = QlxGetEventPropInt(event, "qlx_prop_srcline", &found);
   if (found) {
-    CxUStringBuffAppendStr(record, "\" Line=\"");
-    CxUStringBuffAppendInt32(record, line);
+    out << u"\" Line=\"";
+    out.by(CxUStringBuffAppendInt32, line);  // Deliberate: a negative one in its unsigned form
   }
-  CxUStringBuffAppendStr(record, "\"/>\n");
+  out << u"\"/>\n";
   return 1;
 }
 
 // ---- Translation
 
+static void emitSigned(RecordText &out, int64_t value) {
+  if (value < 0) out << u"-";
+  out.by(CxUStringBuffAppendUInt64, static_cast<uint64_t>(value < 0 ? -value : value));
+}
+
 // Takes the next argument from the list and appends its value.
-static void emitValue(CxUStringBuff *record, ArgType type, va_list *args) {
+static void emitValue(RecordText &out, ArgType type, va_list *args) {
   if (type == ArgType::kString) {
-    if (const UChar *text = va_arg(*args, const UChar *)) CxUStringBuffAppendUStr(record, text);
+    out << va_arg(*args, const UChar *);
   } else if (type == ArgType::kInteger) {
-    const int64_t value = va_arg(*args, int32_t);
-    if (value < 0) CxUStringBuffAppendStr(record, "-");
-    CxUStringBuffAppendUInt64(record, static_cast<uint64_t>(value < 0 ? -value : value));
+    emitSigned(out, va_arg(*args, int32_t));
   } else {
-    CxUStringBuffAppendUDouble(record, va_arg(*args, double));
+    out.by(CxUStringBuffAppendUDouble, va_arg(*args, double));
   }
 }
 
@@ -122,13 +120,14 @@ static void emitValue(CxUStringBuff *record, ArgType type, va_list *args) {
 static void emitParameters(CxUStringBuff *record, const UChar *pattern, va_list *args) {
   ArgTypes types;
   if (!args || !qlxScanPatternTypes(pattern, &types)) return;
+  RecordText out(record);
   va_list copy;
   va_copy(copy, *args);
   for (const ArgType type : types) {
     if (type == ArgType::kNone) break;
-    CxUStringBuffAppendStr(record, "<Param><![CDATA[");
-    emitValue(record, type, &copy);
-    CxUStringBuffAppendStr(record, "]]></Param>");
+    out << u"<Param><![CDATA[";
+    emitValue(out, type, &copy);
+    out << u"]]></Param>";
   }
   va_end(copy);
 }
@@ -149,10 +148,9 @@ static void emitBundleParameters(CxUStringBuff *record, const I18Msg *message, c
 void qlxPDXMLEmitUTranslationInfo(CxUStringBuff *record, Event *event, const char *bundle,
                                   va_list *args) {
   if (!event || !event->message) return;
-  const char *key = event->message->key;
   // Deliberate: the attribute's name has a blank in it.
-  emitAll(record, {" <TranslationInfo", " Resource Bundle=\"", bundle ? bundle : "", "\" MsgKey=\"",
-                   key ? key : "", "\">"});
+  RecordText(record) << u" <TranslationInfo Resource Bundle=\"" << bundle << u"\" MsgKey=\""
+                     << event->message->key << u"\">";
   emitBundleParameters(record, event->message, bundle, args);
-  CxUStringBuffAppendStr(record, "</TranslationInfo>\n");
+  RecordText(record) << u"</TranslationInfo>\n";
 }

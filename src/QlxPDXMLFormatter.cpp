@@ -5,7 +5,6 @@
 #include <qlx/class/containers.h>
 #include <qlx/class/event.h>
 #include <qlx/class/message.h>
-#include <qlx/class/msgid.h>
 #include <qlx/class/object.h>
 #include <qlx/event.h>
 #include <qlx/memory.h>
@@ -13,14 +12,17 @@
 #include "QlxClasses.h"
 #include "QlxConfigKeys.h"
 #include "QlxHeldFormats.h"
+#include "QlxMsgId.h"
 #include "QlxObject.h"
 #include "QlxProps.h"
+#include "QlxRecordText.h"
+#include "util/CxOwned.h"
 
 namespace {
 
 struct PDXMLVars {
   uint8_t firstRecord;      // 1 at first and after each header: the next record has the preamble
-  uint8_t singleComponent;  // the four: 1 writes the element once, in the preamble
+  uint8_t singleComponent;  // these four: 1 writes the element once, in the preamble
   uint8_t singleProduct;
   uint8_t singleProductId;
   uint8_t singleServer;
@@ -30,8 +32,9 @@ struct PDXMLVars {
 
 }  // namespace
 
+// Null for an object of another kind, which keeps something else in the same place.
 static PDXMLVars *varsOf(QlxObject *formatter) {
-  return formatter ? static_cast<PDXMLVars *>(formatter->vars) : nullptr;
+  return isKind(formatter, Formatter) ? static_cast<PDXMLVars *>(formatter->vars) : nullptr;
 }
 
 void *QlxPDXMLFormatterFAllocVars(void) {
@@ -76,122 +79,113 @@ char *QlxPDXMLFormatterFGetTrailer(QlxObject *) {
 
 // ---- A record
 
-static void emitPreamble(CxUStringBuff *record, PDXMLVars *vars, Event *event) {
-  if (vars->firstRecord != 1) return;
-  qlxPDXMLEmitUProductInfo(record, event, vars->singleComponent, vars->singleProduct,
-                           vars->singleProductId, vars->singleServer);
-  vars->firstRecord = 0;
-}
-
 static bool isMessage(const PDXMLVars *vars, const Event *event) {
   if (vars->forceAsMessage == vars->forceAsTrace) return event->isMessage;
   return vars->forceAsMessage;
 }
 
+// The product elements whose flags say `single`: 1 for the preamble, 0 for each record.
+static void emitProducts(CxUStringBuff *record, const PDXMLVars *vars, Event *event,
+                         uint8_t single) {
+  qlxPDXMLEmitUProductInfo(record, event, vars->singleComponent == single,
+                           vars->singleProduct == single, vars->singleProductId == single,
+                           vars->singleServer == single);
+}
+
 static void emitId(CxUStringBuff *record, const Event *event, const UChar *text) {
   // An event that carries an identifier, even an empty one, is not looked at again.
-  const OwnedStr parsed{event->messageId ? nullptr : qlxPDXMLUGetMessageID(text)};
-  const char *id = event->messageId ? event->messageId : parsed.get();
-  CxUStringBuffAppendStr(record, id && *id ? id : "None");
+  const MessageId parsed = event->messageId ? MessageId{} : qlxMessageIdOf(text);
+  const char *id = event->messageId ? event->messageId : parsed.text;
+  RecordText(record) << (*id ? id : "None");
 }
 
 static void emitStart(CxUStringBuff *record, const Event *event, const UChar *text,
                       bool asMessage) {
   const bool hasLevel = event->level != UNSPECIFIED;
-  if (!asMessage && !hasLevel) {
-    CxUStringBuffAppendStr(record, "<Trace>\n");
-    return;
+  RecordText out(record);
+  if (asMessage) {
+    out << u"<Message Id=\"";
+    emitId(record, event, text);
+    out << (hasLevel ? u"\" Severity=\"" : u"");
+  } else {
+    out << (hasLevel ? u"<Trace Level=\"" : u"<Trace");
   }
-  CxUStringBuffAppendStr(record, asMessage ? "<Message Id=\"" : "<Trace Level=\"");
-  if (asMessage) emitId(record, event, text);
-  if (asMessage && hasLevel) CxUStringBuffAppendStr(record, "\" Severity=\"");
   if (hasLevel) qlxPDXMLEmitULevel(record, event->level);
-  CxUStringBuffAppendStr(record, "\">\n");
+  out << (asMessage || hasLevel ? u"\">\n" : u">\n");
 }
 
-static void emitTime(CxUStringBuff *record, QlxObject *formatter, const Event *event) {
-  CxUStringBuffAppendStr(record, " <Time Millis=\"");
-  CxUStringBuffAppendUDate(record, event->time);
-  CxUStringBuffAppendStr(record, "\">");
-  qlxAppendHeldDate(record, formatter->kind2.dateTimeFormat, event->time);
-  CxUStringBuffAppendStr(record, "</Time>\n");
+static void emitTime(CxUStringBuff *record, const QlxObject *formatter, double time) {
+  RecordText out(record);
+  out << u" <Time Millis=\"";
+  out.by(CxUStringBuffAppendUDate, time) << u"\">";
+  out.by(qlxAppendHeldDate, formatter->kind2.dateTimeFormat, time) << u"</Time>\n";
 }
 
 static void emitFreeAttributes(CxUStringBuff *record, const Event *event) {
-  bool any = false;
+  RecordText out(record);
+  const UChar *before = u" <LogAttribs>";  // only in front of the first
   for (auto *it = event->props ? event->props->head : nullptr; it; it = it->next) {
     if (!qlxPDXMLCheckKey(it->key)) continue;
-    if (!any) CxUStringBuffAppendStr(record, " <LogAttribs>");
-    any = true;
-    CxUStringBuffAppendStr(record, "<Key>");
-    CxUStringBuffAppendStr(record, it->key);
-    CxUStringBuffAppendStr(record, "</Key><Value>");
-    CxUStringBuffAppendStr(record, it->value);
-    CxUStringBuffAppendStr(record, "</Value>");
+    out << before << u"<Key>" << it->key << u"</Key><Value>" << it->value << u"</Value>";
+    before = u"";
   }
-  if (any) CxUStringBuffAppendStr(record, "</LogAttribs>\n");
+  if (!*before) out << u"</LogAttribs>\n";
 }
 
 // Deliberate: the thread is an unsigned 32-bit number, the process has the buffer's unsigned form.
 static void emitThreadAndProcess(CxUStringBuff *record, Event *event) {
+  RecordText out(record);
   uint8_t found = 0;
   const int32_t thread = QlxGetEventPropLong(event, "threadId", &found);
   if (found) {
-    CxUStringBuffAppendStr(record, " <Thread>");
-    CxUStringBuffAppendUInt64(record, static_cast<uint32_t>(thread));
-    CxUStringBuffAppendStr(record, "</Thread>\n");
+    out << u" <Thread>";
+    out.by(CxUStringBuffAppendUInt64, static_cast<uint32_t>(thread)) << u"</Thread>\n";
   }
   const int32_t process = QlxGetEventPropLong(event, "processId", &found);
   if (found) {
-    CxUStringBuffAppendStr(record, " <Process>");
-    CxUStringBuffAppendInt32(record, process);
-    CxUStringBuffAppendStr(record, "</Process>\n");
+    out << u" <Process>";
+    out.by(CxUStringBuffAppendInt32, process) << u"</Process>\n";
   }
 }
 
-static void emitProperty(CxUStringBuff *record, const Event *event, const char *key,
-                         const char *start, const char *end) {
-  const char *value = qlxPeekMapProp(event->props, key);
-  if (!value) return;
-  CxUStringBuffAppendStr(record, start);
-  CxUStringBuffAppendStr(record, value);
-  CxUStringBuffAppendStr(record, end);
-}
-
+// Where the event is from: a message by its source and its bundle, a trace by source and thread.
 static void emitOrigin(CxUStringBuff *record, Event *event, bool asMessage, va_list *args) {
   const uint8_t hasSource = qlxPDXMLEmitUSource(record, event);
   if (asMessage) {
     const char *bundle = event->message ? event->message->bundle : nullptr;
     return qlxPDXMLEmitUTranslationInfo(record, event, bundle, args);
   }
-  if (!hasSource) {
-    CxUStringBuffAppendStr(record, " <Source FileName=\"None\" Method=\"None\"/>\n");
-  }
+  if (!hasSource) RecordText(record) << u" <Source FileName=\"None\" Method=\"None\"/>\n";
   emitThreadAndProcess(record, event);
 }
 
+static void emitProperty(CxUStringBuff *record, const Event *event, const char *key,
+                         const UChar *start, const UChar *end) {
+  const char *value = qlxPeekMapProp(event->props, key);
+  if (value) RecordText(record) << start << value << end;
+}
+
 UChar *QlxPDXMLUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {
-  PDXMLVars *vars = isKind(formatter, Formatter) ? varsOf(formatter) : nullptr;
+  PDXMLVars *vars = varsOf(formatter);
   if (!vars || !event) return nullptr;
   const bool asMessage = isMessage(vars, event);
   if (formatter->kind3.locale) qlxSetEventLocale(event, formatter->kind3.locale);
   const OwnedUStr text{QlxBindEventUMsg(event, qlxIntlBindUI18Msg, args)};
 
   CxUStringBuff record{};
-  emitPreamble(&record, vars, event);
+  if (vars->firstRecord) emitProducts(&record, vars, event, 1);
   emitStart(&record, event, text.get(), asMessage);
-  emitTime(&record, formatter, event);
-  qlxPDXMLEmitUProductInfo(&record, event, !vars->singleComponent, !vars->singleProduct,
-                           !vars->singleProductId, !vars->singleServer);
-  CxUStringBuffAppendStr(&record, " <LogText><![CDATA[");
-  CxUStringBuffAppendUStr(&record, text.get());
-  CxUStringBuffAppendStr(&record, "]]></LogText>\n");
+  emitTime(&record, formatter, event->time);
+  emitProducts(&record, vars, event, 0);
+  RecordText(&record) << u" <LogText><![CDATA[" << text.get() << u"]]></LogText>\n";
   emitFreeAttributes(&record, event);
   emitOrigin(&record, event, asMessage, args);
-  emitProperty(&record, event, "correlationId", " <CorrelationId>", "</CorrelationId>\n");
-  emitProperty(&record, event, "client", " <Principal>", "</Principal>\n");
-  CxUStringBuffAppendStr(&record, asMessage ? "</Message>\n" : "</Trace>\n");
-  return CxUStringBuffTakeUStr(&record);
+  emitProperty(&record, event, "correlationId", u" <CorrelationId>", u"</CorrelationId>\n");
+  emitProperty(&record, event, "client", u" <Principal>", u"</Principal>\n");
+  RecordText(&record) << (asMessage ? u"</Message>\n" : u"</Trace>\n");
+  UChar *whole = CxUStringBuffTakeUStr(&record);
+  if (whole) vars->firstRecord = 0;  // a lost record leaves its preamble to the next one
+  return whole;
 }
 
 const ObjClass qlxPDXMLFormatterClass = {

@@ -7,21 +7,19 @@
 
 namespace {
 
-// The start of a part of an argument; a longer part than any word is kept as too long.
+// A part of an argument. One that is longer than any word or index reads as empty.
 class Word {
  public:
   void add(UChar c) {
     if (length_ < kMaxUnits) units_[length_] = c;
     ++length_;
   }
-  bool operator==(std::u16string_view other) const { return view() == other; }
-  bool isTooLong() const { return length_ > kMaxUnits; }
   std::u16string_view view() const {
-    return isTooLong() ? std::u16string_view{} : std::u16string_view{units_, length_};
+    return length_ > kMaxUnits ? std::u16string_view{} : std::u16string_view{units_, length_};
   }
 
  private:
-  static constexpr size_t kMaxUnits = 10;
+  static constexpr size_t kMaxUnits = 10;  // the digits of an index
   UChar units_[kMaxUnits];
   size_t length_ = 0;
 };
@@ -36,10 +34,10 @@ struct Argument {
 
 ArgType typeOf(const Argument &argument) {
   if (argument.part == 0) return ArgType::kString;
-  const Word &type = argument.parts[1];
+  const std::u16string_view type = argument.parts[1].view();
   if (type == u"choice") return ArgType::kDouble;
-  if (!(type == u"number")) return ArgType::kNone;
-  return argument.parts[2] == u"integer" ? ArgType::kInteger : ArgType::kDouble;
+  if (type != u"number") return ArgType::kNone;
+  return argument.parts[2].view() == u"integer" ? ArgType::kInteger : ArgType::kDouble;
 }
 
 // The argument's index; -1 when it is no number of one to ten digits.
@@ -48,9 +46,8 @@ int64_t indexOf(const Argument &argument) {
   if (digits.empty()) return -1;
   int64_t index = 0;
   for (const UChar c : digits) {
-    const int32_t digit = u_digit(c, 10);
-    if (digit < 0) return -1;
-    index = index * 10 + digit;
+    if (c < u'0' || c > u'9') return -1;
+    index = index * 10 + (c - u'0');
   }
   return index;
 }
@@ -93,7 +90,7 @@ class Scanner {
 
   bool take(Argument *argument) {
     const UChar c = *at_;
-    if (u_isWhitespace(c)) return true;
+    if (u_hasBinaryProperty(c, UCHAR_PATTERN_WHITE_SPACE)) return true;  // as ICU skips it
     if (c == u',' && !argument->inStyle()) {
       ++argument->part;
       return true;

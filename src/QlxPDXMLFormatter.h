@@ -1,5 +1,5 @@
-// The XML formatter's parts: the emitters of its elements, and the message identifiers that the
-// problem-determination logger, the message-identifier filter and the trace formatter share.
+// The emitters of an XML record's elements. A null event has no properties and no message. When
+// memory runs out the record is lost as a whole (QlxRecordText.h).
 #ifndef QLX_SRC_QLXPDXMLFORMATTER_H
 #define QLX_SRC_QLXPDXMLFORMATTER_H
 

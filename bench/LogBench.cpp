@@ -21,10 +21,15 @@ constexpr const UChar kText[] =
     u"a text of about one hundred bytes, as long as the line of a common log tends to be in "
     u"practice";
 
+// What a pd logger stamps; without effect on a basic logger.
+constexpr const char *kStamps[] = {"organization", "product",      "component",      "client",
+                                   "server",       "serverFormat", "productInstance"};
+
 // An open toolkit that logs into a file of its own; made before the threads of a row start.
 class Host {
  public:
-  Host(const char *maxBytes, const char *maxFiles) {
+  Host(const char *maxBytes, const char *maxFiles, const char *loggerClass = "qlx_basiclogger",
+       const char *formatterClass = "qlx_basicformatter") {
     char pattern[] = "/tmp/qlxbenchXXXXXX";
     folder_ = mkdtemp(pattern);
     QlxOpenToolkit(nullptr, nullptr);
@@ -32,8 +37,11 @@ class Host {
     set("benchFile", "fileName", path().c_str());
     set("benchFile", "maxFileBytes", maxBytes);
     set("benchFile", "maxFiles", maxFiles);
+    set("benchFile", "formatterName", "benchFormatter");
+    set("benchFormatter", "className", formatterClass);
+    for (const char *key : kStamps) set("bench", key, "seven");
     set("bench", "listenerNames", "benchFile");
-    logger_ = QlxGetObject("bench", "qlx_basiclogger");
+    logger_ = QlxGetObject("bench", loggerClass);
   }
   ~Host() {
     QlxReleaseObject(logger_);
@@ -64,6 +72,17 @@ void openRolling(const benchmark::State &) {
   gHost = new Host("1048576", "3");
 }
 
+// A pd logger stamps, whether its formatter shows what it stamped (the last two) or not.
+void openPd(const benchmark::State &) {
+  gHost = new Host("1000000", "1", "qlx_pdlogger");
+}
+void openPdXml(const benchmark::State &) {
+  gHost = new Host("1000000", "1", "qlx_pdlogger", "qlx_xmlformatter");
+}
+void openPdTrace(const benchmark::State &) {
+  gHost = new Host("1000000", "1", "qlx_pdlogger", "qlx_vextraceformatter");
+}
+
 void closeHost(const benchmark::State &) {
   delete gHost;
   gHost = nullptr;
@@ -81,6 +100,10 @@ QlxLogResult logTextPattern() {
 
 QlxLogResult logMessage() {
   return QlxLogInfo(gHost->logger(), QLX_BENCH_BUNDLE, "transfer", u"alice", 12345, 2.75);
+}
+
+QlxLogResult logIdentifiedMessage() {
+  return QlxLogInfo(gHost->logger(), QLX_BENCH_BUNDLE, "identified", u"alice", 12345);
 }
 
 template <QlxLogResult (*Log)()>
@@ -127,6 +150,12 @@ ROW("3 parameters, bundle", logs<logMessage>, openUnlimited);
 ROW("3 parameters, bundle: bare write", writesTheSameBytes<logMessage>, openUnlimited);
 ROW("text, rolling 3 of 1 MiB", logs<logText>, openRolling);
 ROW("text, rolling 3 of 1 MiB: bare write", writesTheSameBytes<logText>, openRolling);
+ROW("pd logger stamping 7 values", logs<logText>, openPd);
+ROW("pd logger stamping 7 values: bare write", writesTheSameBytes<logText>, openPd);
+ROW("XML record, 2 parameters", logs<logIdentifiedMessage>, openPdXml);
+ROW("XML record, 2 parameters: bare write", writesTheSameBytes<logIdentifiedMessage>, openPdXml);
+ROW("trace line", logs<logText>, openPdTrace);
+ROW("trace line: bare write", writesTheSameBytes<logText>, openPdTrace);
 ROW("text, one file", logs<logText>, openUnlimited)->Threads(2);
 ROW("text, one file: bare write", writesTheSameBytes<logText>, openUnlimited)->Threads(2);
 ROW("text, one file", logs<logText>, openUnlimited)->Threads(8);

@@ -4,108 +4,17 @@
 #include <csignal>
 #include <cstdlib>
 #include <filesystem>
-#include <map>
 #include <string>
 #include <vector>
 
 #include <fcntl.h>
-#include <poll.h>
 #include <pty.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include "support/TempDir.h"
+#include "tool/Process.h"
 
 namespace {
-
-struct Outcome {
-  int status;  // exit status; the negative number of the signal that ended it
-  std::string out, err;
-};
-
-// One run of the command. Its input is a pipe, or a descriptor that the test brings.
-class Process {
- public:
-  using Environment = std::map<std::string, std::string>;
-
-  Process(std::vector<std::string> arguments, const std::string &folder,
-          Environment environment = {}, int input = -1, int output = -1, int error = -1)
-      : in_(input), out_(output), err_(error) {
-    int pipes[3][2] = {{-1, -1}, {-1, -1}, {-1, -1}};
-    for (auto &ends : pipes) EXPECT_EQ(pipe2(ends, O_CLOEXEC), 0);
-    const int given[] = {input, output, error};
-    const int own[] = {pipes[0][0], pipes[1][1], pipes[2][1]};
-    arguments.insert(arguments.begin(), {QLX_COMMAND, "log"});
-    pid_ = fork();
-    if (pid_ == 0) {
-      for (int i = 0; i < 3; ++i) dup2(given[i] >= 0 ? given[i] : own[i], i);
-      start(arguments, folder, environment);
-    }
-    for (const int end : own) close(end);
-    in_ = pipes[0][1];
-    out_ = pipes[1][0];
-    err_ = pipes[2][0];
-  }
-  ~Process() {
-    closeInput();
-    close(out_);
-    close(err_);
-  }
-  Process(const Process &) = delete;
-  Process &operator=(const Process &) = delete;
-
-  void write(const std::string &text) {
-    for (size_t at = 0; at < text.size();) {
-      const ssize_t count = ::write(in_, text.data() + at, text.size() - at);
-      ASSERT_GT(count, 0);
-      at += count;
-    }
-  }
-  void closeInput() {
-    if (in_ >= 0) close(in_);
-    in_ = -1;
-  }
-  void signal(int number) { kill(pid_, number); }
-
-  // Reads standard output until it ends with the text.
-  void waitForOutput(const std::string &end) {
-    while (!outcome_.out.ends_with(end)) ASSERT_TRUE(readSome(out_, outcome_.out)) << outcome_.out;
-  }
-
-  Outcome finish() {
-    closeInput();
-    while (readSome(out_, outcome_.out)) continue;
-    while (readSome(err_, outcome_.err)) continue;
-    int status = 0;
-    waitpid(pid_, &status, 0);
-    outcome_.status = WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
-    return outcome_;
-  }
-
- private:
-  [[noreturn]] static void start(std::vector<std::string> &arguments, const std::string &folder,
-                                 const Environment &environment) {
-    for (const char *name : {"LC_ALL", "LC_CTYPE", "LC_MESSAGES", "LANG"}) unsetenv(name);
-    setenv("LC_ALL", "C.UTF-8", 1);
-    for (const auto &[name, value] : environment) setenv(name.c_str(), value.c_str(), 1);
-    std::vector<char *> argv;
-    for (std::string &argument : arguments) argv.push_back(argument.data());
-    argv.push_back(nullptr);
-    if (chdir(folder.c_str()) == 0) execv(argv[0], argv.data());
-    _exit(127);
-  }
-
-  static bool readSome(int descriptor, std::string &text) {
-    char buffer[1 << 16];
-    const ssize_t count = read(descriptor, buffer, sizeof buffer);
-    if (count > 0) text.append(buffer, count);
-    return count > 0;
-  }
-
-  pid_t pid_;
-  int in_, out_, err_;
-  Outcome outcome_ = {};
-};
 
 class LogCommandTest : public ::testing::Test {
  protected:
@@ -129,7 +38,7 @@ class LogCommandTest : public ::testing::Test {
   }
 
   std::vector<std::string> arguments(const std::vector<std::string> &more) const {
-    std::vector<std::string> all = {"--config", "app.properties", "--logger", "app.logger"};
+    std::vector<std::string> all = {"log", "--config", "app.properties", "--logger", "app.logger"};
     all.insert(all.end(), more.begin(), more.end());
     return all;
   }
@@ -307,11 +216,11 @@ TEST_F(LogCommandTest, TakesAnUnknownLevelWordAsWrongUsage) {
 
 TEST_F(LogCommandTest, AnswersWrongUsageWithStatusTwo) {
   const std::vector<std::vector<std::string>> wrong = {
-      {},                                                       // no logger
-      {"--logger"},                                             // no name
-      {"--logger", "app.logger", "--color"},                    // unknown
-      {"--logger", "app.logger", "--bundle", kMessages},        // no key
-      {"--logger", "app.logger", "--key", "lost", "argument"},  // no bundle
+      {"log"},                                                         // no logger
+      {"log", "--logger"},                                             // no name
+      {"log", "--logger", "app.logger", "--color"},                    // unknown
+      {"log", "--logger", "app.logger", "--bundle", kMessages},        // no key
+      {"log", "--logger", "app.logger", "--key", "lost", "argument"},  // no bundle
   };
   for (const auto &arguments : wrong) {
     const Outcome outcome = Process(arguments, dir.path()).finish();
@@ -322,7 +231,8 @@ TEST_F(LogCommandTest, AnswersWrongUsageWithStatusTwo) {
 
 TEST_F(LogCommandTest, FailsWithTheSystemsTextForAConfigurationThatIsNotThere) {
   const Outcome outcome =
-      Process({"--config", "none.properties", "--logger", "app.logger"}, dir.path()).finish();
+      Process({"log", "--config", "none.properties", "--logger", "app.logger"}, dir.path())
+          .finish();
   EXPECT_EQ(outcome.status, 1);
   EXPECT_EQ(outcome.err, "qlx: none.properties: No such file or directory\n");
 }
@@ -339,7 +249,7 @@ TEST_F(LogCommandTest, FailsForAConfigurationThatIsRefused) {
 TEST_F(LogCommandTest, FailsForANameThatIsNoLogger) {
   for (const char *name : {"app.nobody", "app.file"}) {
     const Outcome outcome =
-        Process({"--config", "app.properties", "--logger", name}, dir.path()).finish();
+        Process({"log", "--config", "app.properties", "--logger", name}, dir.path()).finish();
     EXPECT_EQ(outcome.status, 1);
     EXPECT_EQ(outcome.err,
               "qlx: " + std::string(name) + ": no logger of this name is configured\n");
@@ -461,7 +371,7 @@ TEST_F(LogCommandTest, ShowsNoProgressForAShortFileOrWithoutATerminal) {
 }
 
 TEST_F(LogCommandTest, ShowsItsOptionsAndItsVersion) {
-  const Outcome help = Process({"--help"}, dir.path()).finish();
+  const Outcome help = Process({"log", "--help"}, dir.path()).finish();
   EXPECT_EQ(help.status, 0);
   for (const char *option : {"--config", "--logger", "--level", "--bundle", "--key"}) {
     EXPECT_NE(help.out.find(option), std::string::npos) << option;

@@ -3,7 +3,6 @@
 #include "LogCommand.h"
 
 #include <cerrno>
-#include <cstdio>
 #include <cstring>
 
 #include <fcntl.h>
@@ -13,18 +12,12 @@
 #include <qlx/object.h>
 #include <qlx/toolkit.h>
 
+#include "ExitStatus.h"
 #include "LineReader.h"
 #include "MessageArguments.h"
 #include "Progress.h"
 #include "Recorder.h"
 #include "StopSignal.h"
-
-static constexpr int kSuccess = 0, kFailure = 1, kWrongUsage = 2;
-
-static int failed(const std::string &what, const std::string &why) {
-  fprintf(stderr, "qlx: %s: %s\n", what.c_str(), why.c_str());
-  return kFailure;
-}
 
 namespace {
 // The open toolkit.

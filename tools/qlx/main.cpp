@@ -1,7 +1,9 @@
-// The command qlx: what it understands, and its exit status. One subcommand so far, `qlx log`.
+// The command qlx: what it understands, and its exit status.
 #include <clocale>
 #include <csignal>
 #include <cstdio>
+#include <optional>
+#include <string>
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -11,9 +13,9 @@
 #include <qlx/level.h>
 #include <qlx/types.h>
 
+#include "ExitStatus.h"
 #include "LogCommand.h"
-
-static constexpr int kWrongUsage = 2;
+#include "SemCommand.h"
 
 // Messages follow the environment; numbers in configurations do not.
 static void followTheEnvironmentsLocale() {
@@ -68,6 +70,45 @@ static void addLogCommand(CLI::App &app, LogOptions &options) {
       "Exit status: 0 when every record was written, 1 when one was not, 2 for wrong usage.");
 }
 
+static std::string checkKey(const std::string &text) {
+  return readSemaphoreKey(text) ? ""
+                                : "\"" + text +
+                                      "\" is no key: a whole number of 32 bits, decimal "
+                                      "or with 0x, and not 0";
+}
+
+static CLI::Option *addKey(CLI::App *command, std::string &key) {
+  return command->add_option("KEY", key, "MPFileSemKey of the handler, decimal or 0x...")
+      ->type_name("")
+      ->check(checkKey);
+}
+
+static void addSemCommand(CLI::App &app, std::string &key) {
+  CLI::App *sem = app.add_subcommand("sem", "Semaphore sets of handlers that share a file");
+  sem->require_subcommand(1);
+  CLI::App *list = sem->add_subcommand("list", "Show one set, or all that look like a handler's");
+  addKey(list, key);
+  list->footer(
+      "VALUE is 1 while no process holds the semaphore, else 0; WAITING counts the processes that "
+      "wait for it; LAST PROCESS changed it last. Shown without KEY are the sets of one semaphore "
+      "with mode 0666.\n"
+      "Exit status: 0, 1 when there is no such set or it cannot be read, 2 for wrong usage.");
+  CLI::App *remove = sem->add_subcommand("remove", "Remove one set");
+  addKey(remove, key)->required();
+  remove->footer(
+      "End the processes that log with it first: one that goes on loses its records, each with an "
+      "error. The next process that starts makes the set anew.\n"
+      "Exit status: 0, 1 when there is no such set or it cannot be removed, 2 for wrong usage.");
+}
+
+static int run(const CLI::App &app, const LogOptions &options, const std::string &key) {
+  const CLI::App *const command = app.get_subcommands().front();
+  if (command->get_name() == "log") return runLogCommand(options);
+  const std::optional<key_t> number = readSemaphoreKey(key);
+  const bool isList = command->get_subcommands().front()->get_name() == "list";
+  return isList ? listSemaphores(number) : removeSemaphore(*number);
+}
+
 int main(int argc, char **argv) {
   followTheEnvironmentsLocale();
   fillMissingStandardStreams();
@@ -78,10 +119,12 @@ int main(int argc, char **argv) {
   app.require_subcommand(1);
   LogOptions options;
   addLogCommand(app, options);
+  std::string key;
+  addSemCommand(app, key);
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError &error) {
     return app.exit(error) == 0 ? 0 : kWrongUsage;
   }
-  return runLogCommand(options);
+  return run(app, options, key);
 }

@@ -39,6 +39,7 @@ static int logBackup(QlxObject *logger, const char *bundle) {
                                  u"{0,number,integer} files wait in {1}", (int32_t)1250, u"/home"));
   ok &= isWritten(QlxLogWarn(logger, bundle, "slow", u"/home", (int32_t)1250, 12.5));
   ok &= isWritten(QlxLogWarn(logger, bundle, "slow", u"/home", (int32_t)1130, 0.25));
+  ok &= isWritten(QlxLogWarn(logger, bundle, "full", u"/backup", 0.97));
   ok &= isWritten(QlxLogUText(logger, u"{0}", u"copy: /home/{1}.txt: Broken pipe (32)"));
   return ok & logJobError(logger, "job-7", bundle, "failed", u"/home", u"Broken pipe");
 }

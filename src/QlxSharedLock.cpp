@@ -1,66 +1,94 @@
-// The semaphore that serialises the processes of one shared file. One System V semaphore: 1 is
-// free, 0 is held. The kernel gives it back when its holder dies; the library never removes the
-// set.
-#include "QlxMultiProcFileHandler.h"
+// The semaphore that serialises the processes of one shared file: one System V semaphore, 1 is
+// free, 0 is held. Every change carries SEM_UNDO, so that the kernel gives it back when its holder
+// dies. The library never removes the set.
+#include "QlxSharedLock.h"
 
+#include <algorithm>
 #include <cerrno>
+#include <iterator>
 
 #include <sched.h>
 #include <sys/ipc.h>
 #include <sys/sem.h>
 #include <unistd.h>
 
-#include "QlxSharedLock.h"
+#include "QlxMultiProcFileHandler.h"
 #include "util/CxStatus.h"
 
+static constexpr int kFinalErrors[] = {EACCES, EINVAL, ENOENT, ENOSPC};  // of making a set
 static constexpr int kMaxRetries = 10;
 static constexpr int kEagerAttempts = 40;  // each gives up the processor; a sleep costs more
+static constexpr unsigned kRetrySeconds = 1;
 
 // semctl()'s argument is the caller's to declare.
 union SemaphoreArgument {
   int val;
 };
 
+// ---- Set-up
+
 static bool isFinal(int error) {
-  return error == EACCES || error == EINVAL || error == ENOENT || error == ENOSPC;
+  return std::find(std::begin(kFinalErrors), std::end(kFinalErrors), error) !=
+         std::end(kFinalErrors);
+}
+
+// Frees the semaphore of the set just made, which came with the value 0.
+static CxStatus freeNewSet(QlxFileHandlerVars *vars) {
+  if (semctl(vars->semId, 0, SETVAL, SemaphoreArgument{1}) != -1) return kCxSuccess;
+  const CxStatus status = cxFailure(errno);
+  semctl(vars->semId, 0, IPC_RMID);  // left at 0 it would block the next process for ever
+  vars->semId = -1;
+  return status;
+}
+
+// Deliberate: leaves the value alone, for the set may be held.
+static CxStatus attach(QlxFileHandlerVars *vars) {
+  vars->semId = semget(vars->semKey, 1, 0);
+  return cxStatusOfCall(vars->semId != -1);
 }
 
 CxStatus qlxSharedLockSetUp(QlxFileHandlerVars *vars) {
   vars->semId = semget(vars->semKey, 1, IPC_CREAT | IPC_EXCL | 0666);
-  const bool created = vars->semId != -1;
-  if (!created) {
-    if (isFinal(errno)) return cxFailure(errno);
-    vars->semId = semget(vars->semKey, 1, 0);
-    if (vars->semId == -1) return cxFailure(errno);
-  }
-  // Whoever attaches leaves the value alone: the set may be held.
-  if (created && semctl(vars->semId, 0, SETVAL, SemaphoreArgument{1}) == -1) {
-    const int error = errno;
-    semctl(vars->semId, 0, IPC_RMID);  // left at 0 it would block the next process for ever
-    vars->semId = -1;
-    return cxFailure(error);
-  }
-  vars->semReady = 1;
-  return kCxSuccess;
+  if (vars->semId == -1 && isFinal(errno)) return cxFailure(errno);
+  const CxStatus status = vars->semId == -1 ? attach(vars) : freeNewSet(vars);
+  if (!qlxFailed(status)) vars->semReady = 1;
+  return status;
 }
 
-static bool operate(const QlxFileHandlerVars *vars, short change, short flags) {
-  sembuf operation = {0, change, static_cast<short>(flags | SEM_UNDO)};
-  return semop(vars->semId, &operation, 1) == 0;
+// ---- Lock and unlock
+
+static bool take(const QlxFileHandlerVars *vars, int flags) {
+  sembuf take = {0, -1, static_cast<short>(flags | SEM_UNDO)};
+  return semop(vars->semId, &take, 1) == 0;
+}
+
+// Most holders are done within microseconds: giving up the processor to them is cheaper than being
+// put to sleep and woken.
+static bool takeEagerly(const QlxFileHandlerVars *vars) {
+  for (int attempt = 0; attempt < kEagerAttempts; ++attempt) {
+    if (take(vars, IPC_NOWAIT)) return true;
+    if (errno != EAGAIN) return false;
+    sched_yield();
+  }
+  return false;
 }
 
 CxStatus qlxSharedLockTake(QlxFileHandlerVars *vars) {
-  for (int attempt = 0; attempt < kEagerAttempts; ++attempt) {
-    if (operate(vars, -1, IPC_NOWAIT)) return kCxSuccess;
-    if (errno != EAGAIN) break;  // the blocking operation finds out, its errors count alone
-    sched_yield();
-  }
-  for (int retries = 0; !operate(vars, -1, 0);) {
+  if (takeEagerly(vars)) return kCxSuccess;  // whatever failed there, only the next ones count
+  for (int retries = 0; retries <= kMaxRetries; ++retries) {
+    if (take(vars, 0)) return kCxSuccess;
     if (errno != ENOSPC && errno != EINTR) return cxFailure(errno);
-    sleep(1);
-    if (++retries > kMaxRetries) break;  // Deliberate: goes on without the semaphore
+    sleep(kRetrySeconds);
   }
-  return kCxSuccess;
+  return kCxSuccess;  // Deliberate: goes on without the semaphore
+}
+
+void qlxMultiProcFileHandlerUnlockSem(QlxFileHandlerVars *vars) {
+  if (!vars || vars->semReady != 1) return;
+  // Looks and adds in one step: between two steps another unlock could make it 2.
+  sembuf giveBackIfHeld[] = {{0, 0, IPC_NOWAIT}, {0, 1, SEM_UNDO}};
+  const bool given = semop(vars->semId, giveBackIfHeld, std::size(giveBackIfHeld)) == 0;
+  qlxKeepFailure(nullptr, cxStatusOfCall(given));
 }
 
 uint8_t qlxMultiProcFileHandlerInitSem(QlxFileHandlerVars *vars) {
@@ -75,10 +103,4 @@ uint8_t qlxMultiProcFileHandlerLockSem(QlxFileHandlerVars *vars) {
   const CxStatus status = qlxSharedLockTake(vars);
   qlxKeepFailure(nullptr, status);
   return !qlxFailed(status);
-}
-
-void qlxMultiProcFileHandlerUnlockSem(QlxFileHandlerVars *vars) {
-  if (!vars || vars->semReady != 1) return;
-  const bool held = semctl(vars->semId, 0, GETVAL) == 0;
-  if (!held || !operate(vars, 1, 0)) qlxKeepFailure(nullptr, cxFailure(errno));
 }

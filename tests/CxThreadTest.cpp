@@ -3,15 +3,8 @@
 #include <vector>
 
 #include "support/Status.h"
+#include "support/SystemCalls.h"
 #include "util/CxThread.h"
-
-static std::vector<unsigned> sleptSeconds;
-
-// In place of the system's, for this whole program: nothing in it is to wait.
-extern "C" unsigned sleep(unsigned seconds) {
-  sleptSeconds.push_back(seconds);
-  return 0;
-}
 
 namespace {
 
@@ -108,10 +101,10 @@ TEST_P(ThreadSleep, RoundsToTheNearestSecond) {
 }
 
 TEST_P(ThreadSleep, SleepsThoseSeconds) {
-  sleptSeconds.clear();
+  const SystemCalls calls;
   CxThreadSleep(GetParam().milliseconds);
   unsigned total = 0;
-  for (const unsigned seconds : sleptSeconds) total += seconds;
+  for (const unsigned seconds : calls.slept) total += seconds;
   EXPECT_EQ(total, GetParam().seconds);
 }
 

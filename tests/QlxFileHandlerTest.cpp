@@ -7,39 +7,21 @@
 #include <fcntl.h>
 #include <fstream>
 #include <sys/ioctl.h>
-#include <sys/resource.h>
 #include <sys/stat.h>
 #include <thread>
 #include <unistd.h>
 
-#include "support/ChainTest.h"
 #include "support/FailingMemory.h"
+#include "support/FileHandlerFixture.h"
+#include "support/FileSizeLimit.h"
 #include "support/IcuDefaults.h"
-#include "support/Status.h"
-#include "support/TempDir.h"
 #include "support/WorkingDir.h"
 
 namespace {
 
-class FileHandlerTest : public ChainTest {
+class FileHandlerTest : public FileHandlerFixture {
  protected:
-  void SetUp() override {
-    ChainTest::SetUp();
-    handler = attach("file", "qlx_filehandler");
-    ASSERT_NE(vars(), nullptr);
-    format(handler);
-    set("fileName", dir.path("app.log"));
-  }
-  void TearDown() override {
-    handler.reset();
-    ChainTest::TearDown();
-  }
-
-  QlxFileHandlerVars *vars() { return static_cast<QlxFileHandlerVars *>(handler->vars); }
-
-  void set(const char *key, const std::string &value) {
-    EXPECT_EQ(QlxSetObjProp(handler.get(), key, value.c_str()), 1);
-  }
+  FileHandlerTest() : FileHandlerFixture("qlx_filehandler") {}
 
   // Tells the handler of a key that has no value.
   void changeAbsent(const char *key) {
@@ -48,35 +30,10 @@ class FileHandlerTest : public ChainTest {
     QlxFileHandlerFCfgChange(handler.get(), key);
   }
 
-  void forward() {
-    const Handle next = get("recording", RecordingHandler::kClass);
-    QlxAddListener(handler.get(), next.get());
-  }
-
   void close() {
     const ApiLock lock;
     QlxFileHandlerFClose(handler.get());
   }
-
-  // The status that a log call gave back.
-  CxStatus logged(const char16_t *text) {
-    const QlxLogResult result = log(text);
-    return {result.statusKind, result.statusCode};
-  }
-
-  // The generations of "app.log", "-" for a missing one, joined with blanks; line feeds show as
-  // "|".
-  std::string generations() {
-    std::string all;
-    for (const char *name : {"app.log", "app1.log", "app2.log", "app3.log"}) {
-      all += (all.empty() ? "" : " ") + (dir.has(name) ? dir.read(name) : "-");
-    }
-    for (char &c : all) c = c == '\n' ? '|' : c;
-    return all;
-  }
-
-  TempDir dir;
-  Handle handler;
 };
 
 // What other programs see of a file's permissions.
@@ -93,24 +50,6 @@ class FileCreationMask {
 
  private:
   mode_t before_;
-};
-
-// No file grows past so many bytes while it lives; the write that would is short, or fails.
-class FileSizeLimit {
- public:
-  explicit FileSizeLimit(rlim_t bytes) : before_(signal(SIGXFSZ, SIG_IGN)) {
-    getrlimit(RLIMIT_FSIZE, &limit_);
-    const rlimit lower{bytes, limit_.rlim_max};
-    setrlimit(RLIMIT_FSIZE, &lower);
-  }
-  ~FileSizeLimit() {
-    setrlimit(RLIMIT_FSIZE, &limit_);
-    signal(SIGXFSZ, before_);
-  }
-
- private:
-  rlimit limit_;
-  sighandler_t before_;
 };
 
 // ---- The variables

@@ -1,0 +1,3 @@
+#include "QlxMultiProcFileHandler.h"
+
+#include "support/FileHandlerFixture.h"

@@ -1,0 +1,26 @@
+// In place of the C library's sleep, semget, semop and semctl, for the whole program of the tests:
+// nothing in it waits by the clock, and a test may answer instead of the semaphores.
+#ifndef QLX_TESTS_SYSTEMCALLS_H
+#define QLX_TESTS_SYSTEMCALLS_H
+
+#include <functional>
+#include <vector>
+
+#include <sys/sem.h>
+
+// What the calls do while it lives; one at a time. Without a hook a call goes to the system. A hook
+// gives the error number with which the call fails, or 0 to let it go on to the system.
+class SystemCalls {
+ public:
+  SystemCalls();
+  ~SystemCalls();
+  SystemCalls(const SystemCalls &) = delete;
+  SystemCalls &operator=(const SystemCalls &) = delete;
+
+  std::function<int(key_t key, int flags)> onGet;
+  std::function<int(const sembuf &first, size_t count)> onOperate;
+  std::function<int(int command)> onControl;
+  std::vector<unsigned> slept;  // the seconds of each sleep
+};
+
+#endif

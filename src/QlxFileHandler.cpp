@@ -22,6 +22,7 @@
 #include "QlxConfigKeys.h"
 #include "QlxFileNames.h"
 #include "QlxObject.h"
+#include "util/CxFile.h"
 #include "util/CxStatus.h"
 #include "util/CxUString.h"
 
@@ -105,17 +106,7 @@ bool qlxFileHandlerIsFull(const QlxFileHandlerVars *vars) {
 }
 
 CxStatus qlxFileHandlerWrite(QlxFileHandlerVars *vars, const char *bytes, uint32_t length) {
-  while (length > 0) {
-    int32_t count = 0;
-    const CxStatus status = CxFileWrite(&vars->file, bytes, length, &count);
-    if (qlxFailed(status) && status.code == EINTR) continue;
-    if (qlxFailed(status)) return status;
-    if (count == 0) return cxFailure(EIO);
-    bytes += count;
-    length -= static_cast<uint32_t>(count);
-    vars->size += static_cast<uint32_t>(count);
-  }
-  return kCxSuccess;
+  return cxIntlFileWriteAll(&vars->file, bytes, length, &vars->size);
 }
 
 CxStatus qlxFileHandlerWriteText(QlxFileHandlerVars *vars, const UChar *text) {

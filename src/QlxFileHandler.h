@@ -56,8 +56,7 @@ CxStatus qlxFileHandlerMeasure(QlxFileHandlerVars *vars);
 /** True when the size, as last measured, calls for a rollover. */
 bool qlxFileHandlerIsFull(const QlxFileHandlerVars *vars);
 
-/** Writes all of it: a short write goes on with the rest, an interrupted one is tried again. The
- *  size counts what was written, also of a write that fails in the end. */
+/** Writes all of it; the size counts what was written, also of a write that fails in the end. */
 CxStatus qlxFileHandlerWrite(QlxFileHandlerVars *vars, const char *bytes, uint32_t length);
 
 /** Writes a text in the default code page. */

@@ -125,24 +125,24 @@ char *qlxFHGenerationName(const QlxFileHandlerVars *vars, int32_t generation) {
 
 // ---- Moving the generations up
 
-static void reportUnlessMissing(CxStatus status) {
-  if (qlxFailed(status) && status.code != ENOENT) QlxReportPlatformErr(status);
+static void keepUnlessMissing(Event *event, CxStatus status) {
+  if (status.code != ENOENT) qlxKeepFailure(event, status);
 }
 
-void qlxFHShiftGenerations(const QlxFileHandlerVars *vars, int32_t lowest) {
+void qlxFHShiftGenerations(const QlxFileHandlerVars *vars, int32_t lowest, Event *event) {
   if (!vars || vars->maxFiles < 2) return;
   const int32_t last = vars->maxFiles - 1;
   OwnedStr to{qlxFHGenerationName(vars, last)};
-  if (to) reportUnlessMissing(CxFileNameRemove(to.get()));
+  if (to) keepUnlessMissing(event, CxFileNameRemove(to.get()));
   for (int32_t i = last - 1; to && i >= lowest; --i) {
     OwnedStr from{qlxFHGenerationName(vars, i)};
-    if (from) reportUnlessMissing(CxFileNameRename(from.get(), to.get()));
+    if (from) keepUnlessMissing(event, CxFileNameRename(from.get(), to.get()));
     to = std::move(from);
   }
   // A name that cannot be made ends the moving: the files below must not replace one that stayed.
-  if (!to) QlxReportPlatformErr(cxFailure(ENOMEM));
+  if (!to) qlxKeepFailure(event, cxFailure(ENOMEM));
 }
 
 void qlxFileHandlerDoRollover(QlxFileHandlerVars *vars) {
-  qlxFHShiftGenerations(vars, 0);
+  qlxFHShiftGenerations(vars, 0, nullptr);
 }

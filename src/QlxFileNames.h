@@ -34,8 +34,11 @@ char *qlxFHCloseBaseDigits(const char *name);
 /** The name of a generation, or null. */
 char *qlxFHGenerationName(const QlxFileHandlerVars *vars, int32_t generation);
 
-/** Removes the oldest generation and moves those from `lowest` on up by one, the highest first. */
-void qlxFHShiftGenerations(const QlxFileHandlerVars *vars, int32_t lowest);
+/**
+ * Removes the oldest generation and moves those from `lowest` on up by one, the highest first.
+ * Failures are reported and stored in the event, which may be null; a missing file is none.
+ */
+void qlxFHShiftGenerations(const QlxFileHandlerVars *vars, int32_t lowest, Event *event);
 
 QLX_END_DECLS
 

@@ -4,6 +4,7 @@
 #include "QlxMultiProcFileHandler.h"
 
 #include <array>
+#include <cerrno>
 #include <cstdio>
 
 #include <fcntl.h>
@@ -16,78 +17,89 @@
 #include "QlxFileNames.h"
 #include "QlxObject.h"
 #include "QlxSharedLock.h"
+#include "util/CxFile.h"
 #include "util/CxOwned.h"
 #include "util/CxStatus.h"
 
 static constexpr uint32_t kCopyBytes = 8192;
 
-// ---- Rolling over
+// ---- Rolling over. Failures are reported and stored in the event, which may be null.
 
-// Copies from the place of one descriptor to another; false after a read or write error.
-static bool copyBytes(CxFile *from, CxFile *to) {
+// Copies from the place of one descriptor on to another.
+static CxStatus copyBytes(CxFile *from, CxFile *to) {
   std::array<char, kCopyBytes> bytes;
+  uint64_t copied = 0;
   for (;;) {
     int32_t count = 0;
-    if (qlxFailed(CxFileRead(from, bytes.data(), kCopyBytes, &count))) return false;
-    if (count == 0) return true;
-    for (int32_t done = 0, written = 0; done < count; done += written) {
-      const auto rest = static_cast<uint32_t>(count - done);
-      if (qlxFailed(CxFileWrite(to, bytes.data() + done, rest, &written))) return false;
-    }
+    CxStatus status = CxFileRead(from, bytes.data(), kCopyBytes, &count);
+    if (qlxFailed(status) && status.code == EINTR) continue;
+    if (qlxFailed(status) || count == 0) return status;
+    status = cxIntlFileWriteAll(to, bytes.data(), static_cast<uint32_t>(count), &copied);
+    if (qlxFailed(status)) return status;
   }
 }
 
-static void copyActiveFile(QlxFileHandlerVars *vars) {
-  if (qlxFailed(CxFileSeek(&vars->file, 0, SEEK_SET))) return;
+static void copyToFirstGeneration(QlxFileHandlerVars *vars, Event *event) {
   const OwnedStr name{qlxFHGenerationName(vars, 1)};
   CxFile generation = -1;
-  // Deliberate: not truncated; what the rollover has not moved away is written over.
+  // Deliberate: not truncated; what the rollover could not move away is written over.
   const CxStatus status =
       CxFileOpenMode(&generation, name.get(), O_CREAT | O_RDWR, vars->filePermission);
+  qlxKeepFailure(event, status);
   if (qlxFailed(status)) {
     std::printf("ERR opening %s pre rollover\n", name ? name.get() : "");
     return;
   }
-  copyBytes(&vars->file, &generation);
-  CxFileFlush(&generation);
-  CxFileClose(&generation);
+  qlxKeepFailure(event, copyBytes(&vars->file, &generation));
+  qlxKeepFailure(event, CxFileFlush(&generation));
+  qlxKeepFailure(event, CxFileClose(&generation));
+}
+
+static void rollActiveFile(QlxFileHandlerVars *vars, Event *event) {
+  const CxStatus atStart = CxFileSeek(&vars->file, 0, SEEK_SET);
+  qlxKeepFailure(event, atStart);
+  if (!qlxFailed(atStart)) copyToFirstGeneration(vars, event);
+  // Deliberate: whatever became of the copy, so that the file never grows past its limit.
+  qlxKeepFailure(event, CxFileTrunc(&vars->file));
+  qlxKeepFailure(event, CxFileSeek(&vars->file, 0, SEEK_SET));
+}
+
+static void rollOver(QlxFileHandlerVars *vars, Event *event) {
+  qlxFHShiftGenerations(vars, 1, event);
+  rollActiveFile(vars, event);
 }
 
 void qlxMultiProcFileHandlerRollActiveLog(QlxFileHandlerVars *vars) {
-  if (!vars) return;
-  copyActiveFile(vars);
-  // Deliberate: whatever became of the copy, so that the file never grows past its limit.
-  qlxKeepFailure(nullptr, CxFileTrunc(&vars->file));
-  qlxKeepFailure(nullptr, CxFileSeek(&vars->file, 0, SEEK_SET));
+  if (vars) rollActiveFile(vars, nullptr);
 }
 
 void qlxMultiProcFileHandlerDoRollover(QlxFileHandlerVars *vars) {
-  if (!vars) return;
-  qlxFHShiftGenerations(vars, 1);
-  qlxMultiProcFileHandlerRollActiveLog(vars);
+  if (vars) rollOver(vars, nullptr);
 }
 
 // ---- Opening and closing
 
-// Opens the active file; *setUp tells why the semaphore is not there, with the file left closed.
-static CxStatus openShared(QlxFileHandlerVars *vars, CxStatus *setUp) {
-  if (!vars || !vars->fullName || vars->opened == 1) return kCxSuccess;
-  if (vars->semReady == 0) {
-    *setUp = qlxSharedLockSetUp(vars);
-    qlxKeepFailure(nullptr, *setUp);
-    if (qlxFailed(*setUp)) return kCxSuccess;
-  }
+static CxStatus openFile(QlxFileHandlerVars *vars) {
   qlxFileHandlerMakeDirectory(vars);
-  const CxStatus status = CxFileOpenMode(&vars->file, vars->fullName, O_CREAT | O_RDWR | O_APPEND,
-                                         vars->filePermission);
-  qlxKeepFailure(nullptr, status);
-  vars->opened = !qlxFailed(status);
+  // Deliberate: appends also when "appending" is off.
+  return CxFileOpenMode(&vars->file, vars->fullName, O_CREAT | O_RDWR | O_APPEND,
+                        vars->filePermission);
+}
+
+// Opens the file, if there is one to open. Without the semaphore it stays closed.
+static CxStatus openShared(QlxFileHandlerVars *vars) {
+  if (!vars || !vars->fullName || vars->opened == 1) return kCxSuccess;
+  CxStatus status = vars->semReady == 1 ? kCxSuccess : qlxSharedLockSetUp(vars);
+  if (!qlxFailed(status)) status = openFile(vars);
+  if (!qlxFailed(status)) vars->opened = 1;
   return status;
 }
 
 CxStatus QlxMultiProcFileHandlerFOpenWithErr(QlxObject *handler) {
-  CxStatus setUp = kCxSuccess;
-  return openShared(qlxFileHandlerVars(handler), &setUp);
+  QlxFileHandlerVars *vars = qlxFileHandlerVars(handler);
+  const CxStatus status = openShared(vars);
+  qlxKeepFailure(nullptr, status);
+  return vars && vars->semReady == 1 ? status : kCxSuccess;  // Deliberate: no semaphore, no failure
 }
 
 void QlxMultiProcFileHandlerFOpen(QlxObject *handler) {
@@ -104,27 +116,28 @@ void QlxMultiProcFileHandlerFClose(QlxObject *handler) {
 // ---- Writing
 
 // Runs while this process holds the semaphore.
-static void writeRecord(QlxFileHandlerVars *vars, Event *event, const UChar *text) {
+static void checkSizeAndWrite(QlxFileHandlerVars *vars, Event *event, const UChar *text) {
   qlxKeepFailure(event, qlxFileHandlerMeasure(vars));
-  if (qlxFileHandlerIsFull(vars)) qlxMultiProcFileHandlerDoRollover(vars);
+  if (qlxFileHandlerIsFull(vars)) rollOver(vars, event);
   qlxKeepFailure(event, qlxFileHandlerWriteText(vars, text));
+}
+
+// Deliberate: a record whose lock fails is dropped; the event tells of it.
+static void writeText(QlxFileHandlerVars *vars, Event *event, const UChar *text) {
+  const CxStatus lock = qlxSharedLockTake(vars);
+  qlxKeepFailure(event, lock);
+  if (qlxFailed(lock)) return;
+  checkSizeAndWrite(vars, event, text);
+  qlxMultiProcFileHandlerUnlockSem(vars);
 }
 
 void QlxMultiProcFileUHandlerFProcess(QlxObject *handler, Event *event, va_list *args) {
   QlxFileHandlerVars *vars = qlxFileHandlerVars(handler);
   if (!vars || !event || !loadEnabled(handler)) return;
-  CxStatus setUp = kCxSuccess;
-  qlxKeepFailure(event, openShared(vars, &setUp));
-  qlxKeepFailure(event, setUp);
+  qlxKeepFailure(event, openShared(vars));
   if (vars->opened != 1) return;  // Deliberate: the listeners do not get the event either
-  if (const OwnedUStr text{qlxIntlUHandlerDoFmt(handler, event, args)}) {
-    const CxStatus lock = qlxSharedLockTake(vars);
-    qlxKeepFailure(event, lock);
-    if (!qlxFailed(lock)) {
-      writeRecord(vars, event, text.get());
-      qlxMultiProcFileHandlerUnlockSem(vars);
-    }
-  }
+  const OwnedUStr text{qlxIntlUHandlerDoFmt(handler, event, args)};
+  if (text) writeText(vars, event, text.get());
   QlxBasicObjectFLog(handler, event, args);
 }
 

@@ -135,7 +135,7 @@ TEST(FileNames, HaveAtMost256Bytes) {
 
 TEST(FileNames, IgnoreNullVariables) {
   qlxFHGetFileNameParts("app.log", nullptr);
-  qlxFHShiftGenerations(nullptr, 0);
+  qlxFHShiftGenerations(nullptr, 0, nullptr);
 }
 
 TEST(FileNames, HaveNoDirectoryWhenTheWorkingDirectoryIsGone) {
@@ -263,7 +263,7 @@ TEST_F(Generations, MoveOnlyFromTheLowestThatIsAskedFor) {
   dir.write("app.log", "0");
   dir.write("app1.log", "1");
   vars->maxFiles = 3;
-  qlxFHShiftGenerations(vars.get(), 1);
+  qlxFHShiftGenerations(vars.get(), 1, nullptr);
   EXPECT_EQ(contents(), "0-1--");
 }
 

@@ -57,6 +57,20 @@ CxStatus CxFileWrite(CxFile *file, const void *buffer, uint32_t length, int32_t 
   return cxStatusOfCall(*count != -1);
 }
 
+CxStatus cxIntlFileWriteAll(CxFile *file, const char *bytes, uint32_t length, uint64_t *written) {
+  while (length > 0) {
+    int32_t count = 0;
+    const CxStatus status = CxFileWrite(file, bytes, length, &count);
+    if (status.kind != '-' && status.code == EINTR) continue;
+    if (status.kind != '-') return status;
+    if (count == 0) return cxFailure(EIO);
+    bytes += count;
+    length -= static_cast<uint32_t>(count);
+    *written += static_cast<uint32_t>(count);
+  }
+  return kCxSuccess;
+}
+
 CxStatus CxFileSeek(CxFile *file, int64_t offset, int32_t origin) {
   if (!file) return cxFailure(EINVAL);
   // Deliberate: the low 32 bits of the offset, and any place but the start is a failure.

@@ -21,14 +21,14 @@ namespace {
 
 constexpr uint32_t kBlock = 1, kPassThru = 2;
 constexpr const char *kDefaultPatterns = "*W *I";
-constexpr const char *kBlanks = " \t\n\r";
+constexpr const char *kBlanks = " \t\n\r";  // between patterns; no others
 
 struct MsgIdFilterVars {
   uint32_t mode;                 // kBlock: block what matches; kPassThru: pass only what matches
   StringList *patterns;          // owned
   QlxObject *idFormatter;        // counted: the shared object "msgFormatter"
   int64_t repeatTime;            // milliseconds of event time; 0 and less: no suppression
-  StringToStringMap *lastTimes;  // owned: identifier to the time of its last passed event
+  StringToStringMap *lastTimes;  // owned: identifier to its last passed event's time, in decimal
 };
 
 MsgIdFilterVars *varsOf(QlxObject *filter) {
@@ -38,13 +38,13 @@ MsgIdFilterVars *varsOf(QlxObject *filter) {
 }  // namespace
 
 StringList *QlxMsgIdFilterGetStringList(const char *text) {
-  StringList *list = qlxIntlAllocStringList();
-  for (QlxStrTok rest = QlxStrTokIterator(text, kBlanks); list && QlxStrTokIterHasNext(rest);
+  Owned<StringList, qlxIntlFreeStringList> list{qlxIntlAllocStringList()};
+  for (QlxStrTok rest = QlxStrTokIterator(text, kBlanks); QlxStrTokIterHasNext(rest);
        rest = QlxStrTokIterNext(rest)) {
-    const OwnedStr token{QlxStrTokIterGet(rest)};
-    qlxIntlStringListAppend(list, token.get());
+    const OwnedStr word{QlxStrTokIterGet(rest)};
+    if (!qlxIntlStringListAppend(list.get(), word.get())) return nullptr;
   }
-  return list;
+  return list.release();
 }
 
 void *QlxMsgIdFilterFAllocVars(void) {
@@ -109,25 +109,29 @@ uint8_t QlxMsgIdFilterMatchMsgId(StringList *patterns, const char *id) {
   return 0;
 }
 
-// now - last, which may not fit, compared without overflowing.
-static bool isRepeat(int64_t last, int64_t repeatTime, int64_t now) {
-  int64_t end = 0;
-  if (__builtin_add_overflow(last, repeatTime, &end)) end = std::numeric_limits<int64_t>::max();
-  return end > now;
-}
-
+// An event's time as a whole number; one that is out of range is the nearest, no number is 0.
 static int64_t wholeTime(double time) {
-  constexpr double kLimit = 9.2e18;
-  return time > -kLimit && time < kLimit ? static_cast<int64_t>(time) : 0;
+  using Limits = std::numeric_limits<int64_t>;
+  constexpr double kPastMax = 9223372036854775808.0;  // 2 to the power 63
+  if (time >= kPastMax) return Limits::max();
+  if (time <= -kPastMax) return Limits::min();
+  return time == time ? static_cast<int64_t>(time) : 0;
 }
 
-// Whether the identifier was passed less than the repeat time ago; notes the time when it was not.
-// Deliberate: a blocked repeat does not extend the interval.
-static bool suppressRepeat(MsgIdFilterVars *vars, const Event *event) {
+// The end of the interval in which an identifier repeats; one that is out of range is the largest.
+static int64_t repeatEnd(int64_t last, int64_t repeatTime) {
+  int64_t end = 0;
+  const bool overflows = __builtin_add_overflow(last, repeatTime, &end);
+  return overflows ? std::numeric_limits<int64_t>::max() : end;
+}
+
+// Whether the event's identifier passed less than the repeat time ago; notes the event's time when
+// it did not. Deliberate: a blocked repeat does not extend the interval.
+static bool isRepeat(MsgIdFilterVars *vars, const Event *event) {
   const int64_t now = wholeTime(event->time);
-  if (const char *text = qlxPeekMapProp(vars->lastTimes, event->messageId)) {
-    const int64_t last = qlxPropStrToInt64(text, nullptr);  // no number: 0
-    if (isRepeat(last, vars->repeatTime, now)) return true;
+  if (const char *noted = qlxPeekMapProp(vars->lastTimes, event->messageId)) {
+    const int64_t last = qlxPropStrToInt64(noted, nullptr);  // no number: 0
+    if (repeatEnd(last, vars->repeatTime) > now) return true;
   }
   char text[24];
   std::snprintf(text, sizeof text, "%" PRId64, now);
@@ -136,15 +140,14 @@ static bool suppressRepeat(MsgIdFilterVars *vars, const Event *event) {
 }
 
 uint8_t QlxMsgIdFilterFIsLoggable(QlxObject *filter, Event *event, va_list *args) {
-  MsgIdFilterVars *vars = varsOf(filter);
   if (!filter || !event) return 0;
+  MsgIdFilterVars *vars = varsOf(filter);
   if (!vars) return 1;
   qlxPDXMLUFormatterCacheMessageID(vars->idFormatter, event, args);
-  const uint8_t matches = QlxMsgIdFilterMatchMsgId(vars->patterns, event->messageId);
+  const bool matches = QlxMsgIdFilterMatchMsgId(vars->patterns, event->messageId);
   if (matches == (vars->mode == kBlock)) return 0;
   const bool hasId = event->messageId && *event->messageId;
-  if (hasId && vars->repeatTime > 0 && suppressRepeat(vars, event)) return 0;
-  return 1;
+  return !(hasId && vars->repeatTime > 0 && isRepeat(vars, event));
 }
 
 const ObjClass qlxMsgIdFilterClass = {

@@ -26,12 +26,17 @@ QLX_API uint8_t QlxLevelFilterFIsLoggable(QlxObject *filter, Event *event, va_li
 /** @return variables that block "*W *I", without suppression of repeats, and with a reference to
  *          the formatter "msgFormatter"; null when memory ran out */
 QLX_API void *QlxMsgIdFilterFAllocVars(void);
+
 /** Null is ignored. */
 QLX_API void QlxMsgIdFilterFFreeVars(void *vars);
+
 /** The keys "mode", "msgIds" and "msgIdRepeatTime", and the common ones. Deliberate: a key of the
  *  three without a value leaves its setting. */
 QLX_API void QlxMsgIdFilterFCfgChange(QlxObject *filter, const char *key);
-/** Stores the event's identifier on it, tests it, and notes the time of one that passes. */
+
+/** Stores the event's identifier on it, tests it, and notes the time of one that passes. Without
+ *  variables (memory ran out, or the toolkit closes) the filter passes everything. @return 1 or 0;
+ *  0 when the filter or the event is null */
 QLX_API uint8_t QlxMsgIdFilterFIsLoggable(QlxObject *filter, Event *event, va_list *args);
 
 /** Whether any of the patterns matches; 0 when an argument is null. Takes no lock. */

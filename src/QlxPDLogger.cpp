@@ -20,14 +20,15 @@ struct PDLoggerVars {
   char *product;
   char *component;
   char *client;
-  char *server;        // the fully qualified host name at first
-  char *serverFormat;  // "IP" at first
+  char *server;        // at first the host's name
+  char *serverFormat;  // at first "IP"
   char *productInstance;
-  QlxObject *idFormatter;  // counted; shared by all loggers of this class
+  QlxObject *idFormatter;  // counted: the object that all loggers of this class share
 };
 
-// One row for each stamped value, in the order in which an event gets them: the property of the
-// logger and of the event, and where the logger keeps it (owned, null: not stamped).
+// A stamped value: its property, the same on the logger and on the event, and where the logger
+// keeps it (owned, null at first unless said otherwise; null is not stamped). In the order in which
+// an event gets them.
 struct Stamp {
   const char *key;
   char *PDLoggerVars::*value;
@@ -50,7 +51,7 @@ PDLoggerVars *varsOf(QlxObject *logger) {
 }
 
 char *hostName() {
-  std::array<char, kMaxHostChars + 1> name{};  // one more than the call is told: it terminates
+  std::array<char, kMaxHostChars + 1> name{};  // a name that fills what the call gets has no end
   const CxStatus status = CxSystemGetFQHostname(name.data(), kMaxHostChars);
   return OslStringDup(status.kind == '-' ? name.data() : "NO_HOSTNAME");
 }
@@ -86,12 +87,16 @@ void QlxPDLoggerFCfgChange(QlxObject *logger, const char *key) {
   QlxBasicLoggerFCfgChange(logger, key);
 }
 
+static void stampValues(Event *event, const PDLoggerVars *vars) {
+  for (const Stamp &stamp : kStamps) {
+    if (const char *value = vars->*stamp.value) QlxSetEventProp(event, stamp.key, value);
+  }
+}
+
 void QlxPDLoggerFLog(QlxObject *logger, Event *event, va_list *args) {
   if (!logger || !event) return;
-  PDLoggerVars *vars = varsOf(logger);
-  for (const Stamp &stamp : kStamps) {
-    if (vars && vars->*stamp.value) QlxSetEventProp(event, stamp.key, vars->*stamp.value);
-  }
+  const PDLoggerVars *vars = varsOf(logger);
+  if (vars) stampValues(event, vars);
   QlxSetEventPropLong(event, "processId", static_cast<int32_t>(CxProcessGetCurrentID()));
   QlxSetEventPropLong(event, "threadId", static_cast<int32_t>(CxThreadGetCurrentID()));
   qlxPDXMLUFormatterCacheMessageID(vars ? vars->idFormatter : nullptr, event, args);

@@ -38,16 +38,22 @@ QLX_API void QlxBasicLoggerFCfgChange(QlxObject *logger, const char *key);
  * The problem-determination logger: a basic logger that stamps every event with the identity of the
  * product and of the place where it runs.
  */
-/** @return variables with the host's name as server, "IP" as its format, and a reference to the
- *          formatter "quill.pdMsgIdFormatter"; null when memory ran out */
+/** @return variables with the host's name as server ("NO_HOSTNAME" when it cannot be learned), "IP"
+ *          as its format, and a reference to the formatter "quill.pdMsgIdFormatter"; null when
+ *          memory ran out */
 QLX_API void *QlxPDLoggerFAllocVars(void);
+
 /** Null is ignored. */
 QLX_API void QlxPDLoggerFFreeVars(void *vars);
+
 /** The seven values that are stamped, and the basic logger's keys. Deliberate: an absent value is
  *  not stamped, also not "server" and "serverFormat", which have a value at first. */
 QLX_API void QlxPDLoggerFCfgChange(QlxObject *logger, const char *key);
-/** Sets the values, "processId", "threadId" and the message identifier on the event and passes it
- *  to the listeners. */
+
+/** Sets the values, "processId" and "threadId" as properties of the event, over those it has, and,
+ *  when it has none, the message identifier that its text starts with, or "". Then passes it to the
+ *  listeners. The message is bound for that also when nobody listens, so that a failed bind shows
+ *  in the result of the log call. */
 QLX_API void QlxPDLoggerFLog(QlxObject *logger, Event *event, va_list *args);
 
 QLX_END_DECLS

@@ -62,8 +62,12 @@ QLX_API char *QlxPDXMLFormatterFGetHeader(QlxObject *formatter);
 QLX_API char *QlxPDXMLFormatterFGetTrailer(QlxObject *formatter);
 
 /**
- * The trace formatter's line: a record separator (U+001E), then time, level, host, process and
- * thread, source, message identifier and text with " - " between them.
+ * The trace formatter's line: a record separator (U+001E), then time, level, host up to its first
+ * dot, process and thread, source, message identifier and text, with " - " between them also where
+ * a field is empty, and a line feed.
+ *
+ * Deliberate: the class has no fCfgChange, so no key reaches its objects, not even "logging". The
+ * date pattern and the locale of a formatter that has them all the same do count.
  *
  * @return the line; null when the formatter or the event is null, and when memory ran out
  */

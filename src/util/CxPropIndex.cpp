@@ -4,19 +4,15 @@
 
 #include <qlx/memory.h>
 
+#include "CxHash.h"
+
 static constexpr int32_t kMinIndexedEntries = 64;  // a shorter list is walked as fast
 static constexpr uint32_t kFirstSlots = 256;
-
-static uint32_t hashOf(const char *key) {
-  uint32_t hash = 2166136261U;  // FNV-1a
-  for (; *key; ++key) hash = (hash ^ static_cast<uint8_t>(*key)) * 16777619U;
-  return hash;
-}
 
 // The slot that has the key, or else the free one where it belongs.
 static uint32_t *slotOf(const CxPropIndex *index, const CxPropList *list, const char *key) {
   const uint32_t mask = index->capacity - 1;
-  uint32_t place = hashOf(key) & mask;
+  uint32_t place = cxHashText(key) & mask;
   while (index->slots[place] && OslStringCmp(list->entries[index->slots[place] - 1].key, key) != 0)
     place = (place + 1) & mask;
   return &index->slots[place];

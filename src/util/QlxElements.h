@@ -8,6 +8,8 @@
 #include <qlx/memory.h>
 #include <qlx/props.h>
 
+#include "CxHash.h"
+
 inline bool qlxStringsEqual(const char *a, const char *b) {
   return OslStringCmp(a, b) == 0;
 }

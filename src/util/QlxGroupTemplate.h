@@ -2,19 +2,20 @@
 //
 // `Elements` names the records (Head, Node), the types (Element, Parameter) and the element
 // operations: copyIn makes what is stored, handOut what a caller gets, dispose ends what is stored,
-// match compares.
+// match compares, hash is the same for what matches.
 #ifndef QLX_SRC_QLXGROUPTEMPLATE_H
 #define QLX_SRC_QLXGROUPTEMPLATE_H
 
-#include "QlxNodes.h"
+#include "QlxIndexedNodes.h"
 
 template <typename Elements>
-struct QlxGroupTemplate : QlxNodes<typename Elements::Head, typename Elements::Node> {
+struct QlxGroupTemplate : QlxIndexedNodes<QlxGroupTemplate<Elements>, typename Elements::Head,
+                                          typename Elements::Node> {
   using Head = typename Elements::Head;
   using Node = typename Elements::Node;
   using Element = typename Elements::Element;
   using Parameter = typename Elements::Parameter;
-  using Nodes = QlxNodes<Head, Node>;
+  using Nodes = QlxIndexedNodes<QlxGroupTemplate, Head, Node>;
 
   static Head *alloc() { return Nodes::newHead(); }
 
@@ -24,10 +25,7 @@ struct QlxGroupTemplate : QlxNodes<typename Elements::Head, typename Elements::N
     OslMemoryFree(group);
   }
 
-  static Node *find(Head *group, Parameter element) {
-    if (!element) return nullptr;
-    return Nodes::firstOf(group, [&](Node *node) { return Elements::match(node->value, element); });
-  }
+  static Node *find(Head *group, Parameter element) { return Nodes::find(group, element); }
 
   static uint8_t add(Head *group, Parameter element) {
     if (!group || !element || find(group, element)) return 0;
@@ -55,6 +53,10 @@ struct QlxGroupTemplate : QlxNodes<typename Elements::Head, typename Elements::N
   }
 
   static Element get(Node *it) { return it ? Elements::handOut(it->value) : nullptr; }
+
+  static Parameter keyOf(const Node *node) { return node->value; }
+  static uint32_t hashOf(Parameter element) { return Elements::hash(element); }
+  static bool equal(Parameter a, Parameter b) { return Elements::match(a, b); }
 
  private:
   // Out of the chain first: disposing of an element may come back to the group.

@@ -18,6 +18,7 @@ struct ListenerGroupElements {
   static constexpr auto handOut = qlxIntlAcquireObject;
   static constexpr auto dispose = qlxIntlReleaseObject;
   static constexpr auto match = qlxSame<QlxObject>;
+  static constexpr auto hash = cxHashAddress;
 };
 
 using Algorithms = QlxGroupTemplate<ListenerGroupElements>;

@@ -6,15 +6,19 @@
 #ifndef QLX_SRC_QLXMAPTEMPLATE_H
 #define QLX_SRC_QLXMAPTEMPLATE_H
 
-#include "QlxNodes.h"
+#include <utility>
+
+#include "CxHash.h"
+#include "QlxIndexedNodes.h"
 
 template <typename Elements>
-struct QlxMapTemplate : QlxNodes<typename Elements::Head, typename Elements::Node> {
+struct QlxMapTemplate
+    : QlxIndexedNodes<QlxMapTemplate<Elements>, typename Elements::Head, typename Elements::Node> {
   using Head = typename Elements::Head;
   using Node = typename Elements::Node;
   using Element = typename Elements::Element;
   using Parameter = typename Elements::Parameter;
-  using Nodes = QlxNodes<Head, Node>;
+  using Nodes = QlxIndexedNodes<QlxMapTemplate, Head, Node>;
 
   static Head *alloc() { return Nodes::newHead(); }
 
@@ -31,16 +35,18 @@ struct QlxMapTemplate : QlxNodes<typename Elements::Head, typename Elements::Nod
     return map;
   }
 
-  static Node *find(Head *map, const char *key) {
-    return Nodes::firstOf(map, [&](Node *node) { return OslStringCmp(node->key, key) == 0; });
-  }
+  static Node *find(Head *map, const char *key) { return Nodes::find(map, key); }
 
   static uint8_t put(Head *map, const char *key, Parameter value) {
     if (!map || !key) return 0;
     Node *node = find(map, key);
     if (!node) return putNew(map, key, value);
-    replace(node, value);
-    return 1;
+    if (Elements::kCopiesFirst) return replace(node, copyIn(value));
+    // While the old value is disposed of, which may come back to the map, no node shows it. It may
+    // also have removed the node or stored another value by then.
+    dispose(std::exchange(node->value, nullptr));
+    node = find(map, key);
+    return node ? replace(node, copyIn(value)) : putNew(map, key, value);
   }
 
   static Element get(Head *map, const char *key) { return getValue(find(map, key)); }
@@ -63,6 +69,10 @@ struct QlxMapTemplate : QlxNodes<typename Elements::Head, typename Elements::Nod
     return it && it->value ? Elements::handOut(it->value) : nullptr;
   }
 
+  static const char *keyOf(const Node *node) { return node->key; }
+  static uint32_t hashOf(const char *key) { return cxHashText(key); }
+  static bool equal(const char *a, const char *b) { return OslStringCmp(a, b) == 0; }
+
  private:
   static uint8_t putNew(Head *map, const char *key, Parameter value) {
     auto node = Nodes::newNode(map);
@@ -74,12 +84,9 @@ struct QlxMapTemplate : QlxNodes<typename Elements::Head, typename Elements::Nod
     return 1;
   }
 
-  // While an old value is disposed of, which may come back to the map, no node shows it.
-  static void replace(Node *node, Parameter value) {
-    Element old = node->value;
-    node->value = Elements::kCopiesFirst ? copyIn(value) : nullptr;
-    dispose(old);
-    if (!Elements::kCopiesFirst) node->value = copyIn(value);
+  static uint8_t replace(Node *node, Element stored) {
+    dispose(std::exchange(node->value, stored));
+    return 1;
   }
 
   static Element copyIn(Parameter value) { return value ? Elements::copyIn(value) : nullptr; }

@@ -18,6 +18,7 @@ struct StringGroupElements {
   static constexpr auto handOut = OslStringDup;
   static constexpr auto dispose = OslMemoryFree;
   static constexpr auto match = qlxStringsEqual;
+  static constexpr auto hash = cxHashText;
 };
 
 using Algorithms = QlxGroupTemplate<StringGroupElements>;

@@ -1,0 +1,63 @@
+// A chain of nodes that are found by a key: short ones are walked, long ones have an index, which
+// stands behind the head in the head's own block. `Container` says what a node's key is and how
+// keys compare: Key keyOf(Node *), uint32_t hashOf(Key), bool equal(Key, Key); no key is null.
+#ifndef QLX_SRC_QLXINDEXEDNODES_H
+#define QLX_SRC_QLXINDEXEDNODES_H
+
+#include "QlxIndex.h"
+#include "QlxNodes.h"
+
+template <typename Container, typename Head, typename Node>
+struct QlxIndexedNodes : QlxNodes<Head, Node> {
+  using Nodes = QlxNodes<Head, Node>;
+
+  static Head *newHead() {
+    return reinterpret_cast<Head *>(
+        static_cast<HeadAndIndex *>(OslMemoryCalloc(1, sizeof(HeadAndIndex))));
+  }
+
+  // The chain's first node with that key. One who writes into nodes behind the back of a long
+  // container hides them from it.
+  template <typename Key>
+  static Node *find(Head *head, Key key) {
+    if (!head || !key) return nullptr;
+    const QlxIndex &index = indexOf(head);
+    const auto matches = [&](const void *node) { return Container::equal(keyOf(node), key); };
+    if (!index.slots) return Nodes::firstOf(head, matches);
+    return static_cast<Node *>(qlxIndexFind(index, Container::hashOf(key), matches));
+  }
+
+  static void linkAtTail(Node *node) {
+    Nodes::linkAtTail(node);
+    QlxIndex &index = indexOf(node->owner);
+    if (++index.count < kIndexedFrom) return;
+    const bool fresh = !index.slots;
+    if (!qlxIndexReserve(&index)) return;
+    for (Node *each = fresh ? node->owner->head : node; each; each = each->next) {
+      qlxIndexAdd(&index, each, hashOf(each));
+    }
+  }
+
+  static typename Nodes::OwnedNode unlink(Node *node) {
+    QlxIndex &index = indexOf(node->owner);
+    --index.count;
+    if (index.slots && index.count < kIndexedFrom / 2) qlxIndexDrop(&index);
+    if (index.slots) qlxIndexRemove(&index, node, hashOf(node));
+    return Nodes::unlink(node);
+  }
+
+ private:
+  static constexpr uint32_t kIndexedFrom = 17;  // nodes; fewer are walked as fast
+
+  struct HeadAndIndex {
+    Head head;
+    QlxIndex index;
+  };
+
+  static QlxIndex &indexOf(Head *head) { return reinterpret_cast<HeadAndIndex *>(head)->index; }
+
+  static auto keyOf(const void *node) { return Container::keyOf(static_cast<const Node *>(node)); }
+  static uint32_t hashOf(const void *node) { return Container::hashOf(keyOf(node)); }
+};
+
+#endif

@@ -49,8 +49,9 @@ class FileHandlerFixture : public ChainTest {
   std::string generations() {
     std::string all;
     for (const char *name : {"app.log", "app1.log", "app2.log", "app3.log"}) {
-      all += (all.empty() ? "" : " ") + (dir.has(name) ? dir.read(name) : "-");
+      all += (dir.has(name) ? dir.read(name) : "-") + " ";
     }
+    all.pop_back();
     for (char &c : all) c = c == '\n' ? '|' : c;
     return all;
   }

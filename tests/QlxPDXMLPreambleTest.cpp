@@ -1,0 +1,137 @@
+// The product elements that are written once, in front of the first record after each header.
+#include "support/FailingMemory.h"
+#include "support/PDXMLFormatterFixture.h"
+#include "support/TempDir.h"
+
+namespace {
+
+constexpr const char *kSingleFlags[] = {"singleServer", "singleProduct", "singleComponent",
+                                        "singleProductId"};
+const std::u16string kProducts[] = {
+    u" <Server Format=\"\">x</Server>\n",
+    u" <ProductId>x</ProductId>\n",
+    u" <Component>x</Component>\n",
+    u" <ProductInstance>x</ProductInstance>\n",
+};
+
+class PDXMLPreambleTest : public PDXMLFormatterFixture {
+ protected:
+  static EventPtr productEvent() {
+    EventPtr event = makeEvent();
+    for (const char *key : {"server", "product", "component", "productInstance"})
+      QlxSetEventProp(event.get(), key, "x");
+    return event;
+  }
+};
+
+TEST_F(PDXMLPreambleTest, ASingleElementStandsBeforeTheFirstRecordAndInNone) {
+  for (size_t single = 0; single < std::size(kSingleFlags); ++single) {
+    for (const char *flag : kSingleFlags) configureTo(flag, "false");
+    configureTo(kSingleFlags[single], "true");
+    resetHeader();
+    std::u16string others;
+    for (size_t i = 0; i < std::size(kProducts); ++i)
+      if (i != single) others += kProducts[i];
+    EXPECT_EQ(record(productEvent()), kProducts[single] + trace(others)) << kSingleFlags[single];
+    EXPECT_EQ(record(productEvent()), trace(others)) << kSingleFlags[single];
+  }
+}
+
+TEST_F(PDXMLPreambleTest, AllSingleElementsStandInTheirOrder) {
+  for (const char *flag : kSingleFlags) configureTo(flag, "true");
+  std::u16string all;
+  for (const std::u16string &element : kProducts) all += element;
+  EXPECT_EQ(record(productEvent()), all + trace());
+  EXPECT_EQ(record(productEvent()), trace());
+  for (const char *flag : kSingleFlags) configureTo(flag, "false");
+  EXPECT_EQ(record(productEvent()), trace(all));
+}
+
+TEST_F(PDXMLPreambleTest, EachHeaderMakesItDueAgain) {
+  configureTo("singleProduct", "true");
+  const EventPtr event = makeEvent();
+  QlxSetEventProp(event.get(), "product", "x");
+  for (int opened = 0; opened < 3; ++opened) {
+    EXPECT_EQ(record(event), kProducts[1] + trace());
+    EXPECT_EQ(record(event), trace());
+    resetHeader();
+  }
+}
+
+TEST_F(PDXMLPreambleTest, AFirstRecordWithoutTheElementLeavesItOutForGood) {
+  configureTo("singleProduct", "true");
+  EXPECT_EQ(record(makeEvent()), trace());
+  const EventPtr event = makeEvent();
+  QlxSetEventProp(event.get(), "product", "x");
+  EXPECT_EQ(record(event), trace());
+}
+
+TEST_F(PDXMLPreambleTest, AFileHasItAtEachOpening) {
+  const TempDir dir;
+  const Handle handler = get("handler", "qlx_filehandler");
+  QlxHandlerSetFormatter(handler.get(), formatter_.get());
+  const std::string path = dir.path("app.xml");
+  for (const auto &[key, value] : {std::pair{"fileName", path.c_str()},
+                                   std::pair{"maxFileBytes", "500"}, std::pair{"maxFiles", "3"}})
+    ASSERT_EQ(QlxSetObjProp(handler.get(), key, value), 1);
+  configureTo("singleProduct", "true");
+  const std::u16string wide = trace();
+  const std::string narrow(wide.begin(), wide.end());
+  const std::string preamble = " <ProductId>x</ProductId>\n";
+  ASSERT_GT(3 * narrow.size(), 500U);
+  ASSERT_LT(2 * narrow.size() + preamble.size(), 500U);
+  for (int i = 0; i < 4; ++i) {
+    const EventPtr event = makeEvent();
+    QlxSetEventProp(event.get(), "product", "x");
+    const ApiLock lock;
+    QlxFileUHandlerFProcess(handler.get(), event.get(), nullptr);
+    EXPECT_EQ(event->status.code, 0);
+  }
+  EXPECT_EQ(dir.read("app1.xml"), preamble + narrow + narrow + narrow);
+  EXPECT_EQ(dir.read("app.xml"), preamble + narrow);
+}
+
+// ---- Configuration
+
+TEST_F(PDXMLPreambleTest, AFlagWhosePropertyIsGoneIsClear) {
+  constexpr const char *kFlags[] = {"singleServer",    "singleProduct",  "singleComponent",
+                                    "singleProductId", "forceAsMessage", "forceAsTrace"};
+  for (const char *flag : kFlags) configureTo(flag, "true");
+  resetHeader();
+  for (const char *flag : kFlags) {
+    const ApiLock lock;
+    qlxIntlStringToStringMapRem(formatter_->props, flag);
+    QlxPDXMLFormatterFCfgChange(formatter_.get(), flag);
+  }
+  std::u16string all;
+  for (const std::u16string &element : kProducts) all += element;
+  EXPECT_EQ(record(productEvent()), trace(all));
+  EXPECT_TRUE(record(markedMessage(u"text")).starts_with(u"<Message "));
+}
+
+// ---- Without memory
+
+TEST_F(PDXMLPreambleTest, ARecordThatLosesAPieceIsNullAndItsPreambleStaysDue) {
+  configureTo("singleServer", "true");
+  const EventPtr event = productEvent();
+  QlxSetEventProp(event.get(), "long", std::string(4000, 'x').c_str());
+  const std::u16string whole = record(event);
+  size_t lost = 0;
+  for (uint64_t nth = 1;; ++nth) {
+    resetHeader();
+    {
+      FailingMemory memory;
+      memory.failOnce(nth);
+      const std::u16string found = record(event);
+      if (memory.failures() == 0) break;
+      const bool withoutText = has(found, u"<![CDATA[]]></LogText>");
+      EXPECT_TRUE(found == u"<null>" || found == whole || withoutText) << nth;
+      if (found != u"<null>") continue;
+    }
+    ++lost;
+    EXPECT_EQ(record(event), whole) << "with its preamble, after " << nth;
+  }
+  EXPECT_GE(lost, 2U) << "the first block, and when it grows";
+}
+
+}  // namespace

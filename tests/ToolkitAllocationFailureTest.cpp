@@ -9,13 +9,12 @@
 #include <memory>
 #include <string>
 
-#include <unicode/utypes.h>
-
 #include <qlx/class.h>
 #include <qlx/qlx.h>
 
 #include "support/CaptureStdout.h"
 #include "support/EveryFailure.h"
+#include "support/FailureResult.h"
 #include "support/ResourceBundles.h"
 #include "support/Status.h"
 #include "support/TempDir.h"
@@ -57,18 +56,6 @@ file.fileName = )" + dir_.path("logs/app.log"));
   }
 
   std::string config() const { return dir_.path("app.properties"); }
-
-  // A result tells that nothing failed, or that memory was short.
-  static void expectResult(const Tries &tries, QlxLogResult result) {
-    const CxStatus status{result.statusKind, result.statusCode};
-    EXPECT_TRUE(status == kSuccess || status == failure(ENOMEM)) << status;
-    EXPECT_TRUE(result.msgStatus == 0 || result.msgStatus == U_MEMORY_ALLOCATION_ERROR)
-        << result.msgStatus;
-    if (tries.nothingFailed()) {
-      EXPECT_EQ(status, kSuccess);
-      EXPECT_EQ(result.msgStatus, 0);
-    }
-  }
 
   // One call of each kind: a message with parameters, a long one, texts with and without a source.
   void logAll(const Tries &tries, QlxObject *logger) const {

@@ -76,6 +76,9 @@ class Child {
     return WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
   }
 
+  // The caller has waited for its end.
+  void forget() { id_ = -1; }
+
   int kill() {
     send(SIGKILL);
     return end();

@@ -72,6 +72,7 @@ int main(int, char **argv) {
     return std::chrono::duration<double>(Clock::now() - start).count();
   };
 
+  std::printf("seed %ju\n", plan.seed);
   std::mt19937_64 random(plan.seed);
   Outcome sum;
   uint64_t shown = 0;

@@ -211,7 +211,7 @@ class Round {
     outcome_.torn = static_cast<uint64_t>(found.fragments);
     outcome_.rollovers = static_cast<uint64_t>(std::max(found.files - 1, 0));
     outcome_.oversized = found.largestFile >= plan_.bytes + kLargestRecord;
-    outcome_.failures += board_->failures;
+    outcome_.failures += board_->failures + (outcome_.records < plan_.records);
     outcome_.semaphore = key_.value();
     outcome_.badSemaphores = outcome_.semaphore != 1;
   }

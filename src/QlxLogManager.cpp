@@ -91,9 +91,50 @@ static void forEachChild(ObjCfg *cfg, Visit visit) {
   }
 }
 
+static bool storesParent(const ObjCfg *child, const ObjCfg *parent) {
+  return OslStringCmp(child->parentName, parent->name) == 0;
+}
+
+static bool isLinkedChild(const ObjCfg *parent, const char *name) {
+  const StringToObjCfgMapNode *child = qlxIntlStringToObjCfgMapGetNode(gLogMgr.configs, name);
+  return child && storesParent(child->value, parent);
+}
+
+// Whether a walk over the children would find none to move. Once it is so it stays so, until
+// somebody adds a child or a child gets another parent: the walk is not repeated for each sibling.
+static bool areChildrenLinked(ObjCfg *parent) {
+  if (parent->childrenLinked) return true;
+  for (StringGroupNode *it = qlxIntlObjCfgChildrenNames(parent); it; it = it->next) {
+    if (!isLinkedChild(parent, it->value)) return false;
+  }
+  parent->childrenLinked = 1;
+  return true;
+}
+
+void qlxLogMgrChildStrays(const char *parentName) {
+  const StringToObjCfgMapNode *parent =
+      qlxIntlStringToObjCfgMapGetNode(gLogMgr.configs, parentName);
+  if (parent) parent->value->childrenLinked = 0;
+}
+
+// Adds a registered child.
+static void linkChild(ObjCfg *parent, ObjCfg *child) {
+  const uint8_t linked = parent->childrenLinked;
+  qlxIntlObjCfgAddChild(parent, child);
+  parent->childrenLinked = linked && storesParent(child, parent);
+}
+
 static void moveChild(ObjCfg *from, ObjCfg *to, ObjCfg *child) {
   qlxIntlObjCfgRemChild(from, child);
-  qlxIntlObjCfgAddChild(to, child);
+  linkChild(to, child);
+}
+
+static void moveStrays(ObjCfg *from, ObjCfg *to) {
+  if (areChildrenLinked(from)) return;
+  forEachChild(from, [&](ObjCfg *child) {
+    fetchParentName(child);
+    if (!storesParent(child, from)) moveChild(from, to, child);
+  });
 }
 
 // ---- Registry
@@ -101,13 +142,11 @@ static void moveChild(ObjCfg *from, ObjCfg *to, ObjCfg *child) {
 void qlxIntlLogMgrAddCfg(ObjCfg *cfg) {
   if (!cfg || !gLogMgr.initialised || isRoot(cfg->name) || qlxIntlLogMgrHasCfg(cfg->name)) return;
   if (!qlxIntlStringToObjCfgMapPut(gLogMgr.configs, cfg->name, cfg)) return;
+  cfg->childrenLinked = 0;
   if (const ObjCfgRef parent{fetchParent(cfg)}) {
     qlxIntlObjCfgSetParent(cfg, parent.get());
-    forEachChild(parent.get(), [&](ObjCfg *child) {
-      const char *parentName = fetchParentName(child);
-      if (OslStringCmp(parentName, parent->name) != 0) moveChild(parent.get(), cfg, child);
-    });
-    qlxIntlObjCfgAddChild(parent.get(), cfg);
+    moveStrays(parent.get(), cfg);
+    linkChild(parent.get(), cfg);
   }
   qlxIntlStringGroupAdd(gLogMgr.configNames, cfg->name);
 }

@@ -21,6 +21,9 @@ void qlxCloseLogMgr(void);
  */
 char *qlxLogMgrGetParentConfigName(ObjCfg *cfg);
 
+/** Told when a configuration that stored this parent name got another one. */
+void qlxLogMgrChildStrays(const char *parentName);
+
 /**
  * Sets a property of a configuration, which is made when it is new and then marked as read from the
  * file. The value may be empty, the two names may not.

@@ -9,6 +9,7 @@
 #include <qlx/props.h>
 
 #include "QlxLocked.h"
+#include "QlxLogManager.h"
 #include "QlxProps.h"
 
 static void destroyObjCfg(ObjCfg *cfg) {
@@ -59,8 +60,9 @@ void qlxSetParentName(ObjCfg *cfg, const char *parentName) {
   if (OslStringCmp(cfg->parentName, parentName) == 0) return;
   char *copy = OslStringDup(parentName);
   if (!copy) return;
-  OslMemoryFree(cfg->parentName);
+  const OwnedStr old{cfg->parentName};
   cfg->parentName = copy;
+  qlxLogMgrChildStrays(old.get());
 }
 
 void qlxIntlObjCfgSetParent(ObjCfg *cfg, ObjCfg *parent) {
@@ -70,6 +72,7 @@ void qlxIntlObjCfgSetParent(ObjCfg *cfg, ObjCfg *parent) {
 void qlxIntlObjCfgAddChild(ObjCfg *cfg, ObjCfg *child) {
   if (!cfg || !child) return;
   if (!cfg->children) cfg->children = qlxIntlAllocStringGroup();
+  cfg->childrenLinked = 0;
   qlxIntlStringGroupAdd(cfg->children, child->name);
   qlxIntlObjCfgSetParent(child, cfg);
 }

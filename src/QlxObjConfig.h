@@ -13,6 +13,9 @@ struct ObjCfg {
   StringGroup *children;     // owned names, null until the first child
   StringToStringMap *props;  // owned, null until the first property
   uint8_t fromFile;          // 1: made while the properties file was read
+  // 1: each of the children is registered and stores this one's name. The log manager sets it, and
+  // it holds while this one is registered.
+  uint8_t childrenLinked;
 };
 
 using ObjCfgRef = Owned<ObjCfg, qlxIntlReleaseObjCfg>;  // one counted reference

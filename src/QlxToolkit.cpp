@@ -34,7 +34,7 @@ static struct {
   StringToObjClassMap *classes;             // owns the records
   std::array<StringGroup *, kKinds> names;  // class names by kind
   StringToObjMap *instances;                // one reference to each object
-  uint32_t instancesChanged;                // counts the changes of `instances`
+  StringToObjMapNode *nextToClose;          // where the walk over `instances` goes on
   uint8_t closing;                          // 1 while the objects are taken apart
 } gToolkit;
 
@@ -90,7 +90,6 @@ static void freeClasses() {
 void qlxToolkitAddObjInstance(const char *objectName, QlxObject *object) {
   if (!objectName || !object) return;
   if (!gToolkit.instances) gToolkit.instances = qlxIntlAllocStringToObjMap();
-  gToolkit.instancesChanged++;
   qlxIntlStringToObjMapPut(gToolkit.instances, objectName, object);
 }
 
@@ -99,8 +98,10 @@ QlxObject *qlxToolkitGetObjInstance(const char *objectName) {
 }
 
 void qlxToolkitRemObjInstance(const char *objectName) {
-  gToolkit.instancesChanged++;
-  qlxIntlStringToObjMapRem(gToolkit.instances, objectName);
+  StringToObjMapNode *node = qlxIntlStringToObjMapGetNode(gToolkit.instances, objectName);
+  if (!node) return;
+  if (gToolkit.nextToClose == node) gToolkit.nextToClose = node->next;
+  qlxIntlStringToObjMapRemNode(gToolkit.instances, node);
 }
 
 QlxObject *qlxToolkitLogger(void) {
@@ -135,23 +136,18 @@ static constexpr void (*kClosingSteps[])(QlxObject *) = {
 };
 
 // Takes one step with every object whose next step it is. A class's operation that runs meanwhile
-// may change the registry: the walk then starts anew. False: no object was there.
+// may change the registry: who removes the next object moves the walk on. False: no object was
+// there.
 static bool takeStep(uint8_t step) {
   bool any = false;
-  StringToObjMapNode *it = qlxIntlStringToObjMapIterator(gToolkit.instances);
-  while (it) {
-    if (closingStepsTaken(it->value) == step) {
-      const ObjectRef object{qlxIntlAcquireObject(it->value)};
-      const uint32_t changed = gToolkit.instancesChanged;
-      countClosingStep(object.get());
-      kClosingSteps[step](object.get());
-      any = true;
-      if (changed != gToolkit.instancesChanged) {
-        it = qlxIntlStringToObjMapIterator(gToolkit.instances);
-        continue;
-      }
-    }
-    it = it->next;
+  gToolkit.nextToClose = qlxIntlStringToObjMapIterator(gToolkit.instances);
+  while (const StringToObjMapNode *node = gToolkit.nextToClose) {
+    gToolkit.nextToClose = node->next;
+    if (closingStepsTaken(node->value) != step) continue;
+    const ObjectRef object{qlxIntlAcquireObject(node->value)};
+    countClosingStep(object.get());
+    kClosingSteps[step](object.get());
+    any = true;
   }
   return any;
 }

@@ -17,7 +17,8 @@
 
 static constexpr int kFinalErrors[] = {EACCES, EINVAL, ENOENT, ENOSPC};  // of making a set
 static constexpr int kMaxRetries = 10;
-static constexpr int kEagerAttempts = 40;  // each gives up the processor; a sleep costs more
+static constexpr int kEagerAttempts = 40;
+static constexpr int kAttemptsPerTurn = 10;  // of the processor, which the holder may need
 static constexpr unsigned kRetrySeconds = 1;
 
 // semctl()'s argument is the caller's to declare.
@@ -62,13 +63,13 @@ static bool take(const QlxFileHandlerVars *vars, int flags) {
   return semop(vars->semId, &take, 1) == 0;
 }
 
-// Most holders are done within microseconds: giving up the processor to them is cheaper than being
-// put to sleep and woken.
+// Most holders are done within two microseconds: asking again for as long, and then giving up the
+// processor, is cheaper than being put to sleep and woken.
 static bool takeEagerly(const QlxFileHandlerVars *vars) {
-  for (int attempt = 0; attempt < kEagerAttempts; ++attempt) {
+  for (int attempt = 1; attempt <= kEagerAttempts; ++attempt) {
     if (take(vars, IPC_NOWAIT)) return true;
     if (errno != EAGAIN) return false;
-    sched_yield();
+    if (attempt % kAttemptsPerTurn == 0) sched_yield();
   }
   return false;
 }

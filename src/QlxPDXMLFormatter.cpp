@@ -93,8 +93,8 @@ static void emitProducts(CxUStringBuff *record, const PDXMLVars *vars, Event *ev
 }
 
 static void emitId(CxUStringBuff *record, const Event *event, const UChar *text) {
-  // An event that carries an identifier, even an empty one, is not looked at again.
-  const MessageId parsed = event->messageId ? MessageId{} : qlxMessageIdOf(text);
+  const MessageId parsed = qlxMessageIdOf(text);
+  // An empty identifier of the event's own says that there is none.
   const char *id = event->messageId ? event->messageId : parsed.text;
   RecordText(record) << (*id ? id : "None");
 }

@@ -59,10 +59,7 @@ class Scanner {
   bool scan(ArgTypes *types) {
     for (bool quoted = false; *at_; ++at_) {
       if (*at_ == u'\'') {
-        if (at_[1] == u'\'')
-          ++at_;
-        else
-          quoted = !quoted;
+        quoted = !quoted;  // two in a row, which stand for one, do it twice
       } else if (*at_ == u'{' && !quoted) {
         ++at_;
         if (!scanArgument(types)) return false;

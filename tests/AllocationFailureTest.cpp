@@ -6,9 +6,13 @@
 #include <qlx/class.h>
 #include <qlx/qlx.h>
 
+#include "QlxClasses.h"
+#include "QlxHeldFormats.h"
 #include "QlxObjConfig.h"
 #include "support/EveryFailure.h"
+#include "support/ResourceBundles.h"
 #include "support/Status.h"
+#include "support/Take.h"
 #include "support/TempDir.h"
 
 namespace {
@@ -240,6 +244,65 @@ TEST(AllocationFailureTest, MessagesAreCopiedWholeOrNotAtAll) {
     qlxSetI18MsgLocale(message, nullptr);
     QlxFreeI18Msg(message);
   });
+}
+
+// Properties of a message event, long enough for the record's block to grow.
+void describe(Event *event) {
+  event->time = 1155718135123.0;
+  QlxSetEventProp(event, "product", "qlx");
+  QlxSetEventProp(event, "own", std::string(2000, 'x').c_str());
+  QlxSetEventProp(event, "qlx_prop_srcfile", "main.c");
+}
+
+std::u16string xmlRecord(QlxObject *formatter, Event *event, ...) {
+  va_list args;
+  va_start(args, event);
+  qlxPDXMLUFormatterCacheMessageID(formatter, event, &args);
+  const std::u16string record = take(QlxPDXMLUFormatterFFormat(formatter, event, &args));
+  va_end(args);
+  return record;
+}
+
+// A record with its text and its identifier, when a failed bind has left them out.
+std::u16string completed(std::u16string record, const std::u16string &text,
+                         const std::u16string &id) {
+  const auto fill = [&](const std::u16string &empty, const std::u16string &full) {
+    const size_t at = record.find(empty);
+    if (at != std::u16string::npos) record.replace(at, empty.size(), full);
+  };
+  fill(u"<LogText><![CDATA[]]>", u"<LogText><![CDATA[" + text + u"]]>");
+  fill(u"Id=\"None\"", u"Id=\"" + id + u"\"");
+  return record;
+}
+
+TEST(AllocationFailureTest, XmlRecordsAreWholeOrNullButForAMessageThatCannotBeBound) {
+  const ResourceBundles bundles;
+  ASSERT_TRUE(bundles.add("root", R"(k { "ABC001I {0} and {1,number,integer}" })"));
+  Event *event = QlxVaAllocUEvent(INFO, bundles.path().c_str(), "k", nullptr);
+  describe(event);
+  std::u16string whole;
+  withEveryFailure([&](Tries &tries) {
+    qlxDropHeldFormats();
+    ObjClass formatterClass = qlxPDXMLFormatterClass;
+    QlxObject formatter{};
+    formatter.objClass = &formatterClass;
+    formatter.vars = tries.exactly([] { return QlxPDXMLFormatterFAllocVars(); });
+    const std::u16string record = xmlRecord(&formatter, event, u"text", 7);
+    if (whole.empty()) whole = record;
+    if (tries.nothingFailed()) {
+      EXPECT_EQ(record, whole);
+      EXPECT_STREQ(event->messageId, "ABC001I");
+    }
+    if (record != u"<null>") {
+      EXPECT_EQ(completed(record, u"ABC001I text and 7", u"ABC001I"), whole);
+    }
+    QlxPDXMLFormatterFFreeVars(formatter.vars);
+    QlxSetEventMessageId(event, nullptr);
+    qlxDropHeldFormats();
+  });
+  EXPECT_NE(whole.find(u"<Param><![CDATA[text]]></Param><Param><![CDATA[7]]></Param>"),
+            std::u16string::npos);
+  QlxFreeEvent(event);
 }
 
 }  // namespace

@@ -30,6 +30,10 @@ std::u16string emitted(const Emit &emit) {
 
 // ---- Words
 
+std::u16string wordOf(int32_t level) {
+  return emitted([level](CxUStringBuff *record) { qlxPDXMLEmitULevel(record, level); });
+}
+
 TEST(PDXMLLevelTest, EachNamedLevelHasItsWord) {
   const struct {
     int32_t level;
@@ -38,13 +42,12 @@ TEST(PDXMLLevelTest, EachNamedLevelHasItsWord) {
       {DEBUG_MAX, u"MAX"}, {DEBUG_MID, u"MID"}, {DEBUG_MIN, u"MIN"}, {INFO, u"INFO"},
       {WARN, u"WARN"},     {ERROR, u"ERROR"},   {FATAL, u"ERROR"},
   };
-  for (const auto &[level, word] : kCases)
-    EXPECT_EQ(emitted([=](auto *record) { qlxPDXMLEmitULevel(record, level); }), word) << level;
+  for (const auto &[level, word] : kCases) EXPECT_EQ(wordOf(level), word) << level;
 }
 
 TEST(PDXMLLevelTest, AnyOtherLevelIsOther) {
   for (const int32_t level : {0, -1, 999, 1001, 4500, 8000, int32_t{OFF}, int32_t{UNSPECIFIED}})
-    EXPECT_EQ(emitted([=](auto *record) { qlxPDXMLEmitULevel(record, level); }), u"OTHER") << level;
+    EXPECT_EQ(wordOf(level), u"OTHER") << level;
 }
 
 TEST(PDXMLKeyTest, TheKeysOfOtherElementsAreNoFreeAttributes) {

@@ -60,17 +60,16 @@ ListenerGroupNode *qlxIntlGetListeners(QlxObject *object) {
 namespace {
 
 // Counted references to a group's members, so that an operation may change the group meanwhile.
+// Without memory for all of them: to the first few.
 class Snapshot {
  public:
-  explicit Snapshot(ListenerGroupNode *head) {
-    size_t needed = 0;
-    for (const ListenerGroupNode *node = head; node; node = node->next) ++needed;
+  Snapshot(const ListenerGroupNode *head, size_t needed) {
     if (needed > few_.size()) {
       many_.reset(static_cast<QlxObject **>(
           OslMemoryMalloc(static_cast<uint32_t>(needed * sizeof(QlxObject *)))));
       if (many_) members_ = many_.get();
     }
-    const size_t room = many_ ? needed : few_.size();  // without memory: the first ones
+    const size_t room = many_ ? needed : few_.size();
     for (; head && count_ < room; head = head->next) {
       members_[count_++] = qlxIntlAcquireObject(head->value);
     }
@@ -83,6 +82,7 @@ class Snapshot {
 
   QlxObject **begin() const { return members_; }
   QlxObject **end() const { return members_ + count_; }
+  size_t size() const { return count_; }
 
  private:
   std::array<QlxObject *, 16> few_;
@@ -93,6 +93,42 @@ class Snapshot {
 
 }  // namespace
 
+static size_t countFrom(const ListenerGroupNode *node) {
+  size_t count = 0;
+  for (; node; node = node->next) ++count;
+  return count;
+}
+
+static ListenerGroupNode *nodeOf(QlxObject *listener, QlxObject *object) {
+  return QlxListenerGroupGetLink(qlxFetchListenerGroup(object, 0), listener);
+}
+
+// The listener after the last of these that is still there.
+static QlxObject *listenerAfter(const Snapshot &listeners, QlxObject *object) {
+  for (QlxObject **last = listeners.end(); last != listeners.begin();) {
+    const ListenerGroupNode *node = nodeOf(*--last, object);
+    if (node) return node->next ? node->next->value : nullptr;
+  }
+  return nullptr;
+}
+
+static void passTo(QlxObject *listener, Event *event, va_list *args) {
+  const ObjClass *objClass = listener->objClass;
+  const bool processes = isKind(listener, Filter) || isKind(listener, Handler);
+  if (!processes || !objClass->op1.fProcess || (listener->marks & kMarkPassing)) return;
+  objClass->op1.fProcess(listener, event, args);
+}
+
+// Passes an event to the listeners from a node on, to no more than `left`. Returns the one that is
+// next where memory was short for all of them.
+static ObjectRef passToSome(const ListenerGroupNode *node, size_t &left, QlxObject *object,
+                            Event *event, va_list *args) {
+  const Snapshot listeners(node, left);
+  for (QlxObject *listener : listeners) passTo(listener, event, args);
+  left -= listeners.size();
+  return ObjectRef{left > 0 ? qlxIntlAcquireObject(listenerAfter(listeners, object)) : nullptr};
+}
+
 void QlxBasicObjectFLog(QlxObject *object, Event *event, va_list *args) {
   if (!object || !loadEnabled(object)) return;
   ListenerGroupNode *head = qlxIntlGetListeners(object);
@@ -101,12 +137,9 @@ void QlxBasicObjectFLog(QlxObject *object, Event *event, va_list *args) {
   if (!head || (object->marks & kMarkPassing)) return;
   object->marks |= kMarkPassing;
   const ObjectRef held{qlxIntlAcquireObject(object)};
-  for (QlxObject *listener : Snapshot(head)) {
-    const ObjClass *objClass = listener->objClass;
-    const bool processes = isKind(listener, Filter) || isKind(listener, Handler);
-    if (!processes || !objClass->op1.fProcess || (listener->marks & kMarkPassing)) continue;
-    objClass->op1.fProcess(listener, event, args);
-  }
+  size_t left = countFrom(head);
+  ObjectRef next = passToSome(head, left, object, event, args);
+  while (next) next = passToSome(nodeOf(next.get(), object), left, object, event, args);
   object->marks &= static_cast<uint8_t>(~kMarkPassing);
 }
 

@@ -55,10 +55,11 @@ static StringGroup *namesOfKind(int32_t kind) {
 void qlxToolkitAddClassDef(const char *className, ObjClass *objClass) {
   if (!objClass) return;
   qlxToolkitInitObjClasses();
-  ObjClass *known = qlxToolkitGetClassDef(className);
-  if (known == objClass) return;
-  // The first of a name stays. It may be a built-in class that was registered just now.
-  if (known || !qlxIntlStringToObjClassMapPut(gToolkit.classes, className, objClass)) {
+  if (qlxToolkitGetClassDef(objClass->name) == objClass) return;
+  // Under its own name only: each record is freed once. The first of a name stays; it may be a
+  // built-in class that was registered just now.
+  if (OslStringCmp(objClass->name, className) != 0 || qlxToolkitGetClassDef(className) ||
+      !qlxIntlStringToObjClassMapPut(gToolkit.classes, className, objClass)) {
     return qlxFreeObjClass(objClass);
   }
   qlxIntlStringGroupAdd(namesOfKind(objClass->kind), className);

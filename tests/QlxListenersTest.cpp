@@ -1,3 +1,5 @@
+#include <algorithm>
+
 #include <qlx/class/containers.h>
 
 #include "support/FailingMemory.h"
@@ -180,23 +182,100 @@ TEST_F(ListenersTest, ManyGetTheEventInOrder) {
   EXPECT_EQ(passed(logger), expected);
 }
 
-TEST_F(ListenersTest, TheFirstOfManyGetTheEventWhenMemoryRanOut) {
+// Fifty handlers, and a logger that passes an event to them while there is no memory.
+class ManyListenersTest : public ListenersTest {
+ protected:
+  void SetUp() override {
+    ListenersTest::SetUp();
+    for (int i = 0; i < 50; ++i) all.push_back(attach(logger, name(i).c_str(), host->kHandler));
+    event.reset(QlxVaAllocUEvent(INFO, nullptr, nullptr, u"text"));
+    host->calls.clear();
+  }
+  void TearDown() override {
+    all.clear();
+    event.reset();
+    ListenersTest::TearDown();
+  }
+
+  static std::string name(int i) { return "h" + std::to_string(i); }
+
+  // Calls `act` while that handler has the event.
+  void on(int i, std::function<void()> act) {
+    host->onEvent = [this, i, act](QlxObject *handler, Event *) {
+      if (handler == all[static_cast<size_t>(i)].get()) act();
+    };
+  }
+
+  void remove(int i) { qlxIntlRemListener(logger.get(), all[static_cast<size_t>(i)].get()); }
+
+  // The numbers of the handlers that got the event, in order.
+  std::vector<int> passedWithoutMemory() {
+    return passedWithout([](FailingMemory &memory) { memory.failFrom(1); });
+  }
+  template <typename Plan>
+  std::vector<int> passedWithout(Plan plan) {
+    {
+      const ApiLock lock;
+      FailingMemory memory;
+      plan(memory);
+      QlxBasicObjectFLog(logger.get(), event.get(), nullptr);
+    }
+    std::vector<int> numbers;
+    for (const std::string &call : host->calls) {
+      if (call.starts_with("process h")) numbers.push_back(std::stoi(call.substr(9)));
+    }
+    return numbers;
+  }
+
+  static std::vector<int> without(std::vector<int> gone) {
+    std::vector<int> numbers;
+    for (int i = 0; i < 50; ++i) {
+      if (std::find(gone.begin(), gone.end(), i) == gone.end()) numbers.push_back(i);
+    }
+    return numbers;
+  }
+
   std::vector<Handle> all;
-  for (int i = 0; i < 20; ++i) {
-    all.push_back(attach(logger, ("h" + std::to_string(i)).c_str(), HostClasses::kHandler));
-  }
-  Event *event = QlxVaAllocUEvent(INFO, nullptr, nullptr, u"text");
-  host->calls.clear();
-  {
-    const ApiLock lock;
-    FailingMemory memory;
-    memory.failFrom(1);
-    QlxBasicObjectFLog(logger.get(), event, nullptr);
-  }
-  EXPECT_EQ(host->count("process h0"), 1);
-  EXPECT_EQ(host->count("process h15"), 1);
-  QlxFreeEvent(event);
+  Owned<Event, QlxFreeEvent> event;
+};
+
+TEST_F(ManyListenersTest, GetTheEventInOrderWhenMemoryRanOut) {
+  EXPECT_EQ(passedWithoutMemory(), without({}));
   for (const Handle &handler : all) EXPECT_EQ(handler->refCount, 3u);
+}
+
+TEST_F(ManyListenersTest, MayRemoveThemselvesAndOthersWhenMemoryRanOut) {
+  on(15, [this] {
+    for (int i : {14, 15, 16, 20, 49}) remove(i);
+  });
+  EXPECT_EQ(passedWithoutMemory(), without({16, 20, 49}));
+}
+
+TEST_F(ManyListenersTest, GetItOnceAlsoWhenTheyAreAddedAnewMeanwhile) {
+  on(3, [this] {
+    remove(4);
+    qlxIntlAddListener(logger.get(), all[4].get());
+  });
+  const auto onlyTheFirst = [](FailingMemory &memory) { memory.failOnce(1); };
+  EXPECT_EQ(passedWithout(onlyTheFirst), without({}));
+  EXPECT_EQ(qlxFetchListenerGroup(logger.get(), 0)->tail->value, all[4].get());
+}
+
+TEST_F(ManyListenersTest, MayReplaceTheWholeGroupWhenMemoryRanOut) {
+  on(3, [this] { qlxFreeListeners(logger.get()); });
+  EXPECT_EQ(passedWithoutMemory().size(), 16u);
+}
+
+// What the last release of a listener runs may remove those that come next.
+TEST_F(ManyListenersTest, MayEndAndTakeTheNextOnesAlongWhenMemoryRanOut) {
+  on(0, [this] {
+    remove(5);
+    QlxObject *ending = all[5].release();
+    qlxIntlReleaseObject(ending);
+  });
+  host->onClose = [this](QlxObject *) { remove(16), remove(17); };
+  EXPECT_EQ(passedWithoutMemory().size(), 16u);
+  EXPECT_FALSE(exists("h5"));
 }
 
 // ---- Chains that come back

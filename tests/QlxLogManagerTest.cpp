@@ -1,5 +1,7 @@
 #include "QlxLogManager.h"
 
+#include <random>
+
 #include "support/ConfigTest.h"
 #include "support/FailingMemory.h"
 
@@ -165,6 +167,80 @@ TEST_F(LogManagerTest, MovesTheSiblingsWhoseParentWasChangedMeanwhileAndNoOther)
   EXPECT_EQ(parentNameOf(two), "p.late");
   EXPECT_EQ(parentNameOf(three), "p.late");
   EXPECT_EQ(parentNameOf(four), "p");
+}
+
+TEST_F(LogManagerTest, MovesASiblingThatTheHostPutThereByItself) {
+  const Config p = registered("p"), one = registered("p.1"), other = registered("other");
+  const Config stray = registered("stray");
+  link(p, stray);
+  QlxObjCfgSetParent(stray.get(), other.get());
+  const Config late = registered("p.late");
+  EXPECT_EQ(childrenOf(p), "p.1|p.late|");
+  EXPECT_EQ(childrenOf(late), "stray|");
+}
+
+TEST_F(LogManagerTest, MakesASiblingAnewThatIsNotRegisteredAnyMore) {
+  const Config p = registered("p"), one = registered("p.1");
+  link(p, make("p.ghost"));
+  const Config late = registered("p.late");
+  EXPECT_EQ(QlxLogMgrHasCfg("p.ghost"), 1);
+}
+
+// Random changes by a small host, once as it is and once with every child looked at each time: the
+// configurations must be linked alike.
+class LinkingTest : public LogManagerTest {
+ protected:
+  static constexpr const char *kNames[] = {"a", "a.b", "a.c", "a.b.d", "a.b.e", "a.f", "g", "g.h"};
+
+  std::string linkedAfter(uint32_t seed, bool forget) {
+    QlxCloseToolkit();
+    QlxOpenToolkit(nullptr, nullptr);
+    std::vector<Config> held;
+    for (const char *name : kNames) held.push_back(make(name));
+    std::mt19937 random(seed);
+    for (int step = 0; step < 60; ++step) {
+      for (const char *name : kNames) {
+        if (forget && QlxLogMgrHasCfg(name)) registered(name)->childrenLinked = 0;
+      }
+      change(held, random);
+    }
+    std::string state = configNames();
+    for (const Config &cfg : held) state += stateOf(cfg);
+    for (const char *name : kNames) {
+      if (QlxLogMgrHasCfg(name)) state += stateOf(registered(name));
+    }
+    return state;
+  }
+
+ private:
+  static std::string stateOf(const Config &cfg) {
+    return "\n" + std::string(cfg->name) + " " + std::to_string(cfg->refCount) + " < " +
+           parentNameOf(cfg) + ": " + childrenOf(cfg);
+  }
+
+  static void change(const std::vector<Config> &held, std::mt19937 &random) {
+    const Config &cfg = held[random() % held.size()], &other = held[random() % held.size()];
+    switch (random() % 10) {
+      case 0:
+        return QlxLogMgrRemCfg(cfg.get());
+      case 1:
+        return QlxLogMgrUpdateCfg(cfg.get());
+      case 2:
+        return QlxObjCfgSetParent(cfg.get(), other.get());
+      case 3:
+        return QlxObjCfgAddChild(cfg.get(), other.get());
+      case 4:
+        return QlxObjCfgRemChild(cfg.get(), other.get());
+      default:
+        return QlxLogMgrAddCfg(cfg.get());
+    }
+  }
+};
+
+TEST_F(LinkingTest, IsTheSameWhetherOrNotEveryChildIsLookedAt) {
+  for (uint32_t seed = 1; seed <= 500; ++seed) {
+    ASSERT_EQ(linkedAfter(seed, false), linkedAfter(seed, true)) << seed;
+  }
 }
 
 TEST_F(LogManagerTest, OneThatNamesItselfAsParentIsAddedWithoutOne) {

@@ -1,4 +1,5 @@
 // Maps: every behaviour with all instances, through the public functions and through the twins.
+#include <functional>
 #include <thread>
 
 #include "support/ContainerTest.h"
@@ -414,6 +415,50 @@ TEST_F(StringToObjMapTest, ShowsNoValueWhileItIsReplaced) {
   qlxIntlStringToObjMapPut(map, "key", objects.at(1));
   EXPECT_EQ(objects.at(0)->objClass, nullptr);
   EXPECT_FALSE(sawItself);
+}
+
+// What the end of the old value runs may change the map that is just being put into.
+class ReplacingTest : public ::testing::Test {
+ protected:
+  ReplacingTest() {
+    objects.objClass.fFreeVars = [](void *test) { static_cast<ReplacingTest *>(test)->atTheEnd(); };
+    objects.at(0)->refCount = 1;
+    objects.at(0)->vars = this;
+    qlxIntlStringToObjMapPut(map, "key", objects.at(0));
+    qlxIntlStringToObjMapPut(map, "other", objects.at(1));
+  }
+  ~ReplacingTest() override { qlxIntlFreeStringToObjMap(map); }
+
+  uint8_t replace() { return qlxIntlStringToObjMapPut(map, "key", objects.at(2)); }
+
+  Objects objects;
+  StringToObjMap *map = qlxIntlAllocStringToObjMap();
+  std::function<void()> atTheEnd;
+};
+
+TEST_F(ReplacingTest, TheOldValuesEndMayRemoveTheKey) {
+  atTheEnd = [this] { qlxIntlStringToObjMapRem(map, "key"); };
+  EXPECT_EQ(replace(), 1);
+  EXPECT_EQ(keysIn(map), "otherkey");
+  EXPECT_EQ(numbersIn(map, objects), (Numbers{1, 2}));
+  EXPECT_EQ(objects.references(2), 1);
+}
+
+TEST_F(ReplacingTest, TheOldValuesEndMayStoreAnother) {
+  atTheEnd = [this] { qlxIntlStringToObjMapPut(map, "key", objects.at(1)); };
+  EXPECT_EQ(replace(), 1);
+  EXPECT_EQ(keysIn(map), "keyother");
+  EXPECT_EQ(numbersIn(map, objects), (Numbers{2, 1}));
+  EXPECT_EQ(objects.references(1), 1);
+  EXPECT_EQ(objects.references(2), 1);
+}
+
+TEST_F(ReplacingTest, TheOldValuesEndMayEmptyTheMap) {
+  atTheEnd = [this] {
+    while (map->head) qlxIntlStringToObjMapRemNode(map, map->head);
+  };
+  EXPECT_EQ(replace(), 1);
+  EXPECT_EQ(keysIn(map), "key");
 }
 
 TEST_F(StringToObjMapTest, ShowsNoValueWhileItIsRemoved) {

@@ -28,7 +28,8 @@ QLX_API QlxObject *qlxToolkitLogger(void);
 QLX_API ObjClass *qlxToolkitGetClassDef(const char *className);
 
 /** Hands a class record to the registry, which owns it from then on; the first one of a name stays
- *  and another is freed. A null record is ignored. */
+ *  and another is freed, as is one whose own name is not `className`. A null record and one that is
+ *  registered already are ignored. */
 QLX_API void qlxToolkitAddClassDef(const char *className, ObjClass *objClass);
 
 /** Makes the registries and registers the built-in classes, once. */

@@ -31,11 +31,12 @@ constexpr Row kRows[] = {
     {"text", Call::Text, 100'000},
     {"message", Call::Message, 100'000},
     {"message-localized", Call::Localized, 100'000},
-    {"rolling", Call::Text, 100'000, 1, 1, kMiB},
+    // At any scale some rollovers.
+    {"rolling", Call::Text, 100'000, 1, 1, kMiB, 3, Layout::Line, false, 30'000},
     {"threads-2", Call::Text, 100'000, 2},
     {"threads-8", Call::Text, 100'000, 8},
     // All generations are kept here: 60000 records are eight or nine of the twelve MiB.
-    {"processes-4", Call::Text, 60'000, 1, 4, kMiB, 12},
+    {"processes-4", Call::Text, 60'000, 1, 4, kMiB, 12, Layout::Line, false, 30'000},
     {"xml", Call::Text, 100'000, 1, 1, 1'000'000'000, 3, Layout::Xml},
     {"trace", Call::Text, 100'000, 1, 1, 1'000'000'000, 3, Layout::Trace},
     {"xml-stamped", Call::Text, 100'000, 1, 1, 1'000'000'000, 3, Layout::Xml, true},
@@ -281,7 +282,8 @@ int workersOf(const Row &row) {
   return row.threads * row.processes;
 }
 int64_t recordsOfEach(const Row &row, double scale) {
-  return std::max<int64_t>(1, row.records * std::min(scale, 1.0) / workersOf(row));
+  const int64_t all = row.records * std::min(scale, 1.0);
+  return std::max(all, row.least) / workersOf(row);
 }
 int64_t warmUpOf(int64_t each) {
   return std::max<int64_t>(10, each / 50);

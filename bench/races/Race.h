@@ -45,6 +45,7 @@ struct Row {
   int files = 3;  // generations, the active one among them
   Layout layout = Layout::Line;
   bool stamped = false;  // with host, process and thread
+  int64_t least = 8;     // records at any scale
 };
 
 // What a logger is opened with.

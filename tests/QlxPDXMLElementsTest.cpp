@@ -179,6 +179,14 @@ class PDXMLTranslationTest : public ::testing::Test {
     });
   }
 
+  std::u16string elementWith(const char *bundle, ...) {
+    va_list args;
+    va_start(args, bundle);
+    const std::u16string element = elementOf(bundle, &args);
+    va_end(args);
+    return element;
+  }
+
   // What stands between the start and the end of the element, for the event's own bundle.
   std::u16string parameters(const char *key, ...) {
     use(key);
@@ -286,15 +294,8 @@ TEST_F(PDXMLTranslationTest, WithoutBundleOrKeyTheAttributesAreEmpty) {
   add(R"(k { "{0}" })");
   event_.reset(QlxVaAllocUEvent(INFO, nullptr, nullptr, u"text"));
   EXPECT_EQ(elementOf(nullptr, nullptr), startOf("", "") + u"</TranslationInfo>\n");
-  const auto withArgs = [this](const char *bundle, ...) {
-    va_list args;
-    va_start(args, bundle);
-    const std::u16string element = elementOf(bundle, &args);
-    va_end(args);
-    return element;
-  };
-  EXPECT_EQ(withArgs(nullptr, u"text"), startOf("", "") + u"</TranslationInfo>\n");
-  EXPECT_EQ(withArgs(bundles_.path().c_str(), u"text"),
+  EXPECT_EQ(elementWith(nullptr, u"text"), startOf("", "") + u"</TranslationInfo>\n");
+  EXPECT_EQ(elementWith(bundles_.path().c_str(), u"text"),
             startOf(bundles_.path(), "") + u"</TranslationInfo>\n");
 }
 
@@ -308,33 +309,25 @@ TEST_F(PDXMLTranslationTest, AnEventWithoutAMessageHasNoElement) {
 TEST_F(PDXMLTranslationTest, ThePatternIsTheOneOfTheMessagesLocale) {
   add(R"(k { "{0}" })");
   ASSERT_TRUE(bundles_.add("de", R"(k { "{0} {1,number,integer}" })"));
-  const auto inLocale = [this](const char *locale, ...) {
+  const auto inLocale = [this](const char *locale) {
     use("k");
     qlxSetI18MsgLocale(event_->message, locale);
-    va_list args;
-    va_start(args, locale);
-    const std::u16string element = elementOf(event_->message->bundle, &args);
-    va_end(args);
-    return element.substr(startOf(event_->message->bundle, "k").size());
+    const std::string bundle = event_->message->bundle;
+    return elementWith(bundle.c_str(), u"x", 7).substr(startOf(bundle, "k").size());
   };
-  EXPECT_EQ(inLocale(nullptr, u"x", 7), param(u"x") + u"</TranslationInfo>\n");
-  EXPECT_EQ(inLocale("de_AT", u"x", 7), param(u"x") + param(u"7") + u"</TranslationInfo>\n");
+  EXPECT_EQ(inLocale(nullptr), param(u"x") + u"</TranslationInfo>\n");
+  EXPECT_EQ(inLocale("de_AT"), param(u"x") + param(u"7") + u"</TranslationInfo>\n");
 }
 
 TEST_F(PDXMLTranslationTest, AnUnknownPathIsOpenedByThePartAfterItsLastSlash) {
   add(R"(k { "{0}" })");
   const std::string before = u_getDataDirectory();
   u_setDataDirectory(bundles_.folder().c_str());
-  const auto withArgs = [this](const char *bundle, ...) {
+  for (const char *bundle : {"/no/such/folder/messages", "no/messages"}) {
     event_.reset(QlxVaAllocUEvent(INFO, bundle, "k", nullptr));
-    va_list args;
-    va_start(args, bundle);
-    const std::u16string element = elementOf(bundle, &args);
-    va_end(args);
-    return element;
-  };
-  EXPECT_EQ(withArgs("/no/such/folder/messages", u"x"),
-            startOf("/no/such/folder/messages", "k") + param(u"x") + u"</TranslationInfo>\n");
+    EXPECT_EQ(elementWith(bundle, u"x"),
+              startOf(bundle, "k") + param(u"x") + u"</TranslationInfo>\n");
+  }
   u_setDataDirectory(before.c_str());
 }
 

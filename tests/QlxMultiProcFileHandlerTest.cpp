@@ -567,7 +567,7 @@ TEST_F(MultiProcFileHandlerTest, WaitsForAStoppedHolderAndGoesOnWhenItIsKilled) 
     });
     holder.awaitStop();
     Child other([this] { EXPECT_EQ(logged(u"other"), kSuccess); });
-    key.awaitWaiting(1);
+    ASSERT_TRUE(key.awaitWaiting(1));
     EXPECT_EQ(dir.read("app.log"), "holder\n");
     holder.send(killed ? SIGKILL : SIGCONT);
     EXPECT_EQ(other.end(), 0);

@@ -195,7 +195,7 @@ TEST_F(SharedLockTest, LockWaitsForAStoppedHolder) {
     EXPECT_EQ(key.value(), 0);
     unlock();
   });
-  key.awaitWaiting(1);
+  ASSERT_TRUE(key.awaitWaiting(1));
   EXPECT_EQ(key.value(), 0);
   holder.send(SIGCONT);
   EXPECT_EQ(holder.end(), 0);
@@ -218,7 +218,7 @@ TEST_F(SharedLockTest, LockWaitsUntilTheMakerOfTheSetHasFreedIt) {
     EXPECT_EQ(lock(), 1);
     unlock();
   });
-  key.awaitWaiting(1);
+  ASSERT_TRUE(key.awaitWaiting(1));
   maker.send(SIGCONT);
   EXPECT_EQ(maker.end(), 0);
   EXPECT_EQ(other.end(), 0);
@@ -301,7 +301,7 @@ TEST_F(SharedLockTest, ASignalInterruptsTheWaiting) {
     EXPECT_EQ(calls.slept, (std::vector<unsigned>{1}));
     unlock();
   });
-  key.awaitWaiting(1);
+  ASSERT_TRUE(key.awaitWaiting(1));
   other.send(SIGUSR1);
   interrupted.await();
   unlock();
@@ -335,7 +335,7 @@ TEST_F(SharedLockTest, LockFailsWhenTheSetIsRemoved) {
   setUp();
   lock();
   Child waiting([&] { EXPECT_EQ(qlxSharedLockTake(&vars), failure(EIDRM)); });
-  key.awaitWaiting(1);
+  ASSERT_TRUE(key.awaitWaiting(1));
   key.remove();
   EXPECT_EQ(waiting.end(), 0);
   EXPECT_EQ(qlxSharedLockTake(&vars), failure(EINVAL));

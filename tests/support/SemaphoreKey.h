@@ -38,12 +38,18 @@ class SemaphoreKey {
   int value() const { return control(set(), GETVAL); }
   int waiting() const { return control(set(), GETNCNT); }
 
-  // Returns as soon as so many processes wait for the semaphore.
-  void awaitWaiting(int count) const {
-    while (waiting() != count) usleep(100);
+  // True as soon as so many processes wait for the semaphore; false when they never do.
+  bool awaitWaiting(int count) const {
+    for (int looks = 0; looks < kMaxLooks; ++looks) {
+      if (waiting() == count) return true;
+      usleep(100);
+    }
+    return false;
   }
 
  private:
+  static constexpr int kMaxLooks = 100000;  // ten seconds and more
+
   // Past the C library, where a test may have put calls of its own.
   int get(int count, int flags) const {
     return static_cast<int>(syscall(SYS_semget, key_, count, flags));

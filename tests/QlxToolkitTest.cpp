@@ -2,10 +2,8 @@
 
 #include <cerrno>
 
-#include "support/CaptureStdout.h"
 #include "support/FailingMemory.h"
 #include "support/InertHandle.h"
-#include "support/PlainFormatter.h"
 #include "support/Status.h"
 
 namespace {

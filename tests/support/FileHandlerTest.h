@@ -1,0 +1,24 @@
+// A test with a rolling file handler, "file", behind the logger.
+#ifndef QLX_TESTS_FILEHANDLERTEST_H
+#define QLX_TESTS_FILEHANDLERTEST_H
+
+#include "support/FileHandlerFixture.h"
+
+class FileHandlerTest : public FileHandlerFixture {
+ protected:
+  FileHandlerTest() : FileHandlerFixture("qlx_filehandler") {}
+
+  // Tells the handler of a key that has no value.
+  void changeAbsent(const char *key) {
+    const ApiLock lock;
+    if (handler->props) qlxIntlStringToStringMapRem(handler->props, key);
+    QlxFileHandlerFCfgChange(handler.get(), key);
+  }
+
+  void close() {
+    const ApiLock lock;
+    QlxFileHandlerFClose(handler.get());
+  }
+};
+
+#endif

@@ -92,6 +92,12 @@ size_t spanOf(std::string_view text, Accepts accepts) {
 bool isDigit(char c) {
   return c >= '0' && c <= '9';
 }
+// Digits, after the blanks that pad them, if any.
+size_t spanOfNumber(std::string_view text) {
+  const size_t blanks = spanOf(text, [](char c) { return c == ' '; });
+  const size_t digits = spanOf(text.substr(blanks), isDigit);
+  return digits ? blanks + digits : 0;
+}
 bool isInWord(char c) {
   return c != ' ' && c != '<' && c != '(' && c != '\n';
 }
@@ -100,7 +106,7 @@ bool isInWord(char c) {
 // match. `length` becomes the length of the placeholder.
 size_t matchOne(std::string_view shape, std::string_view text, std::string_view wanted,
                 size_t &length) {
-  if (shape.starts_with("{number}")) return length = 8, spanOf(text, isDigit);
+  if (shape.starts_with("{number}")) return length = 8, spanOfNumber(text);
   if (shape.starts_with("{word}")) return length = 6, spanOf(text, isInWord);
   if (shape.starts_with("{text}")) return length = 6, text.starts_with(wanted) * wanted.size();
   length = 1;

@@ -60,8 +60,9 @@ struct Setup {
   bool stamped;
 };
 
-// How a record looks: literal text, but # is a digit, {number} some digits, {word} some characters
-// up to a blank, '<' or '(', {text} the text of the row's call. Records follow one another.
+// How a record looks: literal text, but # is a digit, {number} some digits (padded by blanks),
+// {word} some characters up to a blank, '<' or '(', {text} the text of the row's call. Records
+// follow one another.
 struct Shape {
   std::string record;
   std::string lastOfHeader;  // a file's first lines, up to the one that starts so, are no records

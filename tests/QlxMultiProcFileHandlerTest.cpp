@@ -651,6 +651,28 @@ TEST_F(MultiProcFileHandlerTest, EmptiesTheFileAlsoWhenTheCopyCannotBeWritten) {
   EXPECT_TRUE(semaphoreIsFree());
 }
 
+TEST_F(MultiProcFileHandlerTest, TellsOfACopyThatMayNotHaveReachedTheDisk) {
+  rollAlways("3");
+  log(u"one");
+  obstruct("app2.log");  // generation 1 stays in its place
+  std::filesystem::create_symlink("/dev/null", dir.path("app1.log"));
+  EXPECT_EQ(logged(u"two"), failure(EINVAL));  // what the null device answers a flush
+  EXPECT_EQ(dir.read("app.log"), "two\n");
+}
+
+TEST_F(MultiProcFileHandlerTest, ClosesTheCopy) {
+  const auto descriptors = [] {
+    const std::filesystem::directory_iterator all("/proc/self/fd");
+    return std::distance(begin(all), end(all));
+  };
+  rollAlways("3");
+  log(u"one");
+  const auto before = descriptors();
+  log(u"two");
+  EXPECT_EQ(generations(), "two| one| - -");
+  EXPECT_EQ(descriptors(), before);
+}
+
 TEST_F(MultiProcFileHandlerTest, TellsOfAFileThatCannotBeMeasuredAndWritesNowhere) {
   forward();
   log(u"one");

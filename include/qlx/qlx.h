@@ -16,6 +16,7 @@
 #include <qlx/kmsid.h>
 #include <qlx/level.h>
 #include <qlx/logger.h>
+#include <qlx/macros.h>
 #include <qlx/memory.h>
 #include <qlx/message.h>
 #include <qlx/object.h>

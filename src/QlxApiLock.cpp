@@ -8,9 +8,13 @@
 #include <qlx/system.h>
 #include <qlx/toolkit.h>
 
+#include "QlxFileWatch.h"
 #include "QlxHeldFormats.h"
 
 namespace {
+
+constexpr int kAttempts = 30;
+constexpr int kPausesBetween = 10;
 
 std::atomic<CxMutex> gMutex;     // set once
 std::atomic<bool> gForkHandled;  // the fork handlers are registered, or about to be
@@ -27,9 +31,14 @@ void beforeFork() {
   qlxHeldFormatsLock();
 }
 
-void afterFork() {
+void afterForkInParent() {
   qlxHeldFormatsUnlock();
   if (heldByThisThread() && gTakenForFork) qlxAPIMutexUnlock();
+}
+
+void afterForkInChild() {
+  qlxFileWatchForget();
+  afterForkInParent();
 }
 
 // Threads that make their first call at the same time may each make a mutex; the first one stays.
@@ -40,10 +49,27 @@ CxStatus makeMutex() {
   if (status.kind != '-') return status;
   // Without memory for the registration the lock still works; only a fork while another thread logs
   // is then unprotected.
-  if (!gForkHandled.exchange(true)) (void)pthread_atfork(beforeFork, afterFork, afterFork);
+  if (!gForkHandled.exchange(true))
+    (void)pthread_atfork(beforeFork, afterForkInParent, afterForkInChild);
   CxMutex none = nullptr;
   if (!gMutex.compare_exchange_strong(none, made)) CxMutexDestroy(&made);
   return status;
+}
+
+void pauseProcessor() {
+#if defined(__x86_64__) || defined(__i386__)
+  __builtin_ia32_pause();
+#endif
+}
+
+// Tries for about as long as a record takes: another thread's call ends sooner than a sleep and the
+// waking from it would.
+bool takesSoon(CxMutex mutex) {
+  for (int attempt = 0; attempt < kAttempts; ++attempt) {
+    if (pthread_mutex_trylock(mutex) == 0) return true;
+    for (int i = 0; i < kPausesBetween; ++i) pauseProcessor();
+  }
+  return false;
 }
 
 bool succeeded(CxStatus status) {
@@ -57,7 +83,7 @@ bool succeeded(CxStatus status) {
 uint8_t qlxAPIMutexLock(void) {
   if (!gMutex.load(std::memory_order_acquire) && !succeeded(makeMutex())) return 0;
   CxMutex mutex = gMutex.load(std::memory_order_acquire);
-  if (!succeeded(CxMutexLock(&mutex))) return 0;
+  if (!takesSoon(mutex) && !succeeded(CxMutexLock(&mutex))) return 0;
   gHolder.store(pthread_self(), std::memory_order_relaxed);
   return 1;
 }

@@ -2,7 +2,11 @@
 // message. Its operations are the defaults of every formatter class.
 #include <qlx/class/formatter.h>
 
-#include <qlx/buffers.h>
+#include <array>
+#include <cstring>
+#include <string_view>
+
+#include <qlx/class/containers.h>
 #include <qlx/class/event.h>
 #include <qlx/class/message.h>
 #include <qlx/class/object.h>
@@ -11,18 +15,25 @@
 
 #include "QlxClasses.h"
 #include "QlxConfigKeys.h"
+#include "QlxFormatted.h"
 #include "QlxHeldFormats.h"
 #include "QlxI18Msg.h"
 #include "QlxObject.h"
 #include "QlxProps.h"
+#include "util/CxDecimal.h"
+#include "util/CxUStringBuff.h"
+#include "util/CxUnits.h"
 
-static constexpr const char *kDefaultSeparator = " ";
+static constexpr std::string_view kDefaultSeparator = " ";
 
-// Properties of an event, in the order in which a line has them; the line number stands between.
-static constexpr const char *kSourceKeys[] = {"qlx_prop_srcfile", "qlx_prop_srcfunction"};
-static constexpr const char *kSourceLineKey = "qlx_prop_srcline";
-static constexpr const char *kProductKeys[] = {"organization", "product", "component", "client",
-                                               "server"};
+// Properties of an event, in the order in which a line has them.
+static constexpr std::string_view kLineKeys[] = {
+    "qlx_prop_srcfile", "qlx_prop_srcfunction",
+    "qlx_prop_srcline", "organization",
+    "product",          "component",
+    "client",           "server",
+};
+static constexpr size_t kSourceLine = 2;  // its place: a number, the others are texts
 
 // Replaces a setting by the object's property; an empty value is kept as such.
 template <auto Setting>
@@ -55,39 +66,112 @@ void QlxBasicFormatterFCfgChange(QlxObject *formatter, const char *key) {
   QlxBasicObjectFCfgChange(formatter, key);
 }
 
-// Appends a value, unless it is absent, and the separator after it.
-static void appendField(CxUStringBuff *line, const char *value, const char *separator) {
-  if (!value) return;
-  CxUStringBuffAppendStr(line, value);
-  CxUStringBuffAppendStr(line, separator);
-}
+// ---- A line, written in one of two ways: as UTF-16, or straight as bytes while all of it is ASCII
 
-static void appendLineNumber(CxUStringBuff *line, const char *value, const char *separator) {
-  uint8_t isNumber = 0;
-  const int32_t number = qlxPropStrToInt32(value, &isNumber);
-  if (!isNumber) return;
-  CxUStringBuffAppendInt32(line,
-                           number);  // Deliberate: a negative one has its unsigned 64-bit form
-  CxUStringBuffAppendStr(line, separator);
-}
+namespace {
 
-static void appendProperties(CxUStringBuff *line, const Event *event, const char *separator) {
-  const StringToStringMap *props = event->props;
-  if (!props) return;
-  for (const char *key : kSourceKeys) appendField(line, qlxPeekMapProp(props, key), separator);
-  appendLineNumber(line, qlxPeekMapProp(props, kSourceLineKey), separator);
-  for (const char *key : kProductKeys) appendField(line, qlxPeekMapProp(props, key), separator);
-}
+// What cannot be appended, for want of memory, is left out.
+class WideLine {
+ public:
+  explicit WideLine(CxUStringBuff *text) : text_(text) {}
 
-// Binds the event's message; the library's own binder writes straight into the line.
-static void appendMessage(CxUStringBuff *line, Event *event, fBindMsg bind, va_list *args) {
-  if (bind != qlxIntlBindUI18Msg) {
-    const OwnedUStr text{QlxBindEventUMsg(event, bind, args)};
-    if (text) CxUStringBuffAppendUStr(line, text.get());
-    return;
+  bool append(std::string_view text) { return cxUStringBuffAppend(text_, text) || true; }
+
+  bool appendDate(const char *pattern, double time) {
+    return qlxAppendHeldDate(text_, pattern, time) || true;
   }
-  if (event->locale) qlxSetI18MsgLocale(event->message, event->locale);
-  qlxIntlBindI18MsgTo(event->message, args, line);
+
+  bool appendNumber(uint64_t number) { return CxUStringBuffAppendUInt64(text_, number) || true; }
+
+  // The library's own binder writes straight into the line.
+  bool appendMessage(Event *event, fBindMsg bind, va_list *args) {
+    if (bind != qlxIntlBindUI18Msg) {
+      const OwnedUStr text{QlxBindEventUMsg(event, bind, args)};
+      if (text) CxUStringBuffAppendUStr(text_, text.get());
+      return true;
+    }
+    if (event->locale) qlxSetI18MsgLocale(event->message, event->locale);
+    qlxIntlBindI18MsgTo(event->message, args, text_);
+    return true;
+  }
+
+ private:
+  CxUStringBuff *text_;
+};
+
+class AsciiLine {
+ public:
+  explicit AsciiLine(CxAsciiLine *line) : line_(line) {}
+
+  bool append(std::string_view text) { return line_->append(text); }
+
+  bool appendDate(const char *pattern, double time) {
+    return qlxAppendHeldDateAscii(line_, pattern, time);
+  }
+
+  bool appendNumber(uint64_t number) {
+    char digits[kMaxDecimalDigits];
+    char *const end = digits + kMaxDecimalDigits;
+    const char *first = cxDecimalBefore(end, number, '0');
+    return line_->append({first, static_cast<size_t>(end - first)});
+  }
+
+  bool appendMessage(Event *event, fBindMsg bind, va_list *args) {
+    I18Msg *message = event->message;
+    if (bind != qlxIntlBindUI18Msg) return false;
+    if (event->locale) qlxSetI18MsgLocale(message, event->locale);
+    if (message && !message->bundle && message->text) {
+      const size_t units = cxUnitsLength(message->text);
+      if (qlxIsPlainPattern(message->text, units)) return line_->append(message->text, units);
+    }
+    KeptBuffer text;
+    qlxIntlBindI18MsgTo(message, args, text.get());
+    return line_->append(text.get()->data, text.get()->length);
+  }
+
+ private:
+  CxAsciiLine *line_;
+};
+
+using LineValues = std::array<const char *, std::size(kLineKeys)>;
+
+}  // namespace
+
+// All of these keys differ in their length or in their last four bytes.
+static uint32_t lastFour(std::string_view key) {
+  uint32_t bytes;
+  std::memcpy(&bytes, key.data() + key.size() - sizeof bytes, sizeof bytes);
+  return bytes;
+}
+
+// The values of the line's keys; null for a key that is absent.
+static LineValues findLineValues(const Event *event) {
+  LineValues values{};
+  for (const auto *node = event->props ? event->props->head : nullptr; node; node = node->next) {
+    const std::string_view key{node->key};
+    for (size_t i = 0; i < values.size(); ++i) {
+      if (key.size() != kLineKeys[i].size() || lastFour(key) != lastFour(kLineKeys[i])) continue;
+      if (key == kLineKeys[i]) values[i] = node->value;
+      break;
+    }
+  }
+  return values;
+}
+
+template <typename Line>
+static bool appendProperties(Line &line, const Event *event, std::string_view separator) {
+  const LineValues values = findLineValues(event);
+  for (size_t i = 0; i < values.size(); ++i) {
+    uint8_t usable = values[i] != nullptr;
+    const int32_t number = i == kSourceLine ? qlxPropStrToInt32(values[i], &usable) : 0;
+    if (!usable) continue;
+    // Deliberate: a negative number has its unsigned 64-bit form.
+    const bool appended = i == kSourceLine
+                              ? line.appendNumber(static_cast<uint64_t>(int64_t{number}))
+                              : line.append(values[i]);
+    if (!appended || !line.append(separator)) return false;
+  }
+  return true;
 }
 
 // Null for an object of another kind, which keeps something else in the same place.
@@ -96,21 +180,32 @@ static const char *datePatternOf(const QlxObject *formatter) {
   return formatter && !isOther ? formatter->kind2.dateTimeFormat : nullptr;
 }
 
-UChar *QlxBasicUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {
-  if (!event || !isKind(formatter, Formatter)) return nullptr;
+template <typename Line>
+static bool appendEvent(Line line, QlxObject *formatter, Event *event, va_list *args) {
+  if (!event || !isKind(formatter, Formatter)) return false;
   const fBindMsg bind = formatter->objClass->op4.fBindMsg;
-  if (!bind) return nullptr;
-  const char *separator = separatorOf(formatter) ? separatorOf(formatter) : kDefaultSeparator;
-
-  CxUStringBuff line{};
-  qlxAppendHeldDate(&line, datePatternOf(formatter), event->time);
-  CxUStringBuffAppendStr(&line, separator);
-  appendProperties(&line, event, separator);
+  if (!bind) return false;
+  const char *own = separatorOf(formatter);
+  const std::string_view separator = own ? std::string_view{own} : kDefaultSeparator;
   // Deliberate: the locale stays on the event, and what formats the event later binds in it too.
   if (localeOf(formatter)) qlxSetEventLocale(event, localeOf(formatter));
-  appendMessage(&line, event, bind, args);
-  CxUStringBuffAppendStr(&line, "\n");
-  return CxUStringBuffTakeUStr(&line);
+  return line.appendDate(datePatternOf(formatter), event->time) && line.append(separator) &&
+         appendProperties(line, event, separator) && line.appendMessage(event, bind, args) &&
+         line.append("\n");
+}
+
+uint8_t qlxBasicFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
+                                CxUStringBuff *text) {
+  return appendEvent(WideLine{text}, formatter, event, args) && text->length > 0;
+}
+
+bool qlxBasicFormatterAppendAscii(QlxObject *formatter, Event *event, va_list *args,
+                                  CxAsciiLine *line) {
+  return appendEvent(AsciiLine{line}, formatter, event, args);
+}
+
+UChar *QlxBasicUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {
+  return qlxFormatNew(qlxBasicFormatterAppend, formatter, event, args);
 }
 
 char *QlxBasicFormatterFGetHeader(QlxObject *) {

@@ -4,11 +4,9 @@
 #include "QlxFileHandler.h"
 
 #include <algorithm>
-#include <array>
 #include <cerrno>
 #include <cstdio>
 #include <fcntl.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include <qlx/class/object.h>
@@ -16,7 +14,6 @@
 #include <qlx/memory.h>
 #include <qlx/toolkit.h>
 #include <qlx/ustring.h>
-#include <unicode/ustring.h>
 
 #include "QlxClasses.h"
 #include "QlxConfigKeys.h"
@@ -24,6 +21,7 @@
 #include "QlxObject.h"
 #include "util/CxFile.h"
 #include "util/CxStatus.h"
+#include "util/CxUnits.h"
 #include "util/CxUString.h"
 
 static constexpr const char *kFirstFileName = "default.log";
@@ -34,7 +32,6 @@ static constexpr int32_t kDefaultMaxFiles = 3;
 static constexpr uint32_t kFirstFilePermission = 0744;
 static constexpr uint32_t kFirstDirPermission = 0771;
 static constexpr int32_t kFirstSemKey = 31821;
-static constexpr uint32_t kLineUnits = 2047;  // longer texts are narrowed in a block of their own
 
 // ---- The variables
 
@@ -46,6 +43,7 @@ static void nameActiveFile(QlxFileHandlerVars *vars, const char *name) {
 
 static void closeFile(QlxFileHandlerVars *vars) {
   vars->opened = 0;
+  qlxFileWatchEnd(&vars->watch);
   if (vars->file != -1) qlxKeepFailure(nullptr, CxFileClose(&vars->file));
 }
 
@@ -109,15 +107,9 @@ CxStatus qlxFileHandlerWrite(QlxFileHandlerVars *vars, const char *bytes, uint32
   return cxIntlFileWriteAll(&vars->file, bytes, length, &vars->size);
 }
 
-CxStatus qlxFileHandlerWriteText(QlxFileHandlerVars *vars, const UChar *text) {
-  const auto units = static_cast<uint32_t>(u_strlen(text));
-  if (units <= kLineUnits) {
-    std::array<char, cxUStringNarrowRoom(kLineUnits)> line;
-    return qlxFileHandlerWrite(vars, line.data(), cxUStringNarrow(line.data(), text, units));
-  }
-  const OwnedStr narrow{CxUStringDupUCharToStr(text)};
-  if (!narrow) return cxFailure(ENOMEM);
-  return qlxFileHandlerWrite(vars, narrow.get(), OslStringLen(narrow.get()));
+CxStatus qlxFileHandlerWriteText(QlxFileHandlerVars *vars, const FormattedBytes &text) {
+  if (!text.data()) return cxFailure(ENOMEM);
+  return qlxFileHandlerWrite(vars, text.data(), text.length());
 }
 
 // Writes a header or a trailer and frees it; null writes nothing.
@@ -146,19 +138,10 @@ static void rollOver(QlxObject *handler, QlxFileHandlerVars *vars) {
   vars->size = 0;
 }
 
-// Does not ask for the times: after a look at them the next write has to store them anew, which
-// costs as much again as the write.
-static bool activeFileExists(const QlxFileHandlerVars *vars) {
-  struct statx type;
-  if (statx(AT_FDCWD, vars->fullName, 0, STATX_TYPE, &type) == 0) return S_ISREG(type.stx_mode);
-  struct stat info;  // missing, or a system that refuses statx
-  return stat(vars->fullName, &info) == 0 && S_ISREG(info.st_mode);
-}
-
 // Whether the open file can take the next event; if not it is closed. Deliberate: another regular
 // file under its name is not noticed, what is open goes on.
 static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
-  if (!activeFileExists(vars)) {
+  if (!qlxFileWatchFindsFile(&vars->watch, vars->fullName)) {
     QlxFileHandlerFClose(handler);
     return false;
   }
@@ -212,13 +195,18 @@ void QlxFileHandlerFClose(QlxObject *handler) {
   closeFile(vars);
 }
 
+// Formatting has effects of its own on the event, so it is done without an open file too.
+static void formatAndWrite(QlxObject *handler, QlxFileHandlerVars *vars, Event *event,
+                           va_list *args) {
+  const FormattedBytes text{handler, event, args};
+  if (text && vars->opened == 1) qlxKeepFailure(event, qlxFileHandlerWriteText(vars, text));
+}
+
 void QlxFileUHandlerFProcess(QlxObject *handler, Event *event, va_list *args) {
   QlxFileHandlerVars *vars = qlxFileHandlerVars(handler);
   if (!vars || !event || !loadEnabled(handler)) return;
   qlxKeepFailure(event, QlxFileHandlerFOpenWithErr(handler));
-  // Formatting has effects of its own on the event, so it is done without an open file too.
-  const OwnedUStr text{qlxIntlUHandlerDoFmt(handler, event, args)};
-  if (text && vars->opened == 1) qlxKeepFailure(event, qlxFileHandlerWriteText(vars, text.get()));
+  formatAndWrite(handler, vars, event, args);
   QlxBasicObjectFLog(handler, event, args);
 }
 

@@ -5,6 +5,9 @@
 #include <qlx/class/handler.h>
 #include <qlx/types.h>
 
+#include "QlxFileWatch.h"
+#include "QlxFormatted.h"
+
 QLX_BEGIN_DECLS
 
 typedef struct QlxFileHandlerVars {
@@ -26,6 +29,7 @@ typedef struct QlxFileHandlerVars {
   int32_t semKey;           // key of the semaphore that processes share
   int32_t semId;            // its identifier; -1: none
   uint8_t logInternalErrs;  // kept without effect
+  QlxFileWatch watch;       // of the active file while it is open
 } QlxFileHandlerVars;
 
 /** Removes the oldest generation and moves every other file, the active one too, up by one. The
@@ -60,7 +64,7 @@ bool qlxFileHandlerIsFull(const QlxFileHandlerVars *vars);
 CxStatus qlxFileHandlerWrite(QlxFileHandlerVars *vars, const char *bytes, uint32_t length);
 
 /** Writes a text in the default code page. */
-CxStatus qlxFileHandlerWriteText(QlxFileHandlerVars *vars, const UChar *text);
+CxStatus qlxFileHandlerWriteText(QlxFileHandlerVars *vars, const FormattedBytes &text);
 
 QLX_END_DECLS
 

@@ -2,6 +2,7 @@
 #include "QlxHeldFormats.h"
 
 #include <algorithm>
+#include <array>
 #include <cstdlib>
 #include <cstring>
 #include <optional>
@@ -15,6 +16,7 @@
 #include <qlx/ustring.h>
 
 #include "util/CxOwned.h"
+#include "util/CxUnits.h"
 
 static constexpr UChar kDefaultPattern[] = u"yyyy-MM-dd HH:mm:ss.SSS";
 static constexpr int32_t kMillisDigits = 3;
@@ -30,6 +32,8 @@ struct HeldDate {
   int64_t second;  // since 1970
   CxUStringBuff text;
   int32_t fraction;  // where in the text the milliseconds stand, or -1: it has none
+  std::array<char, 64> ascii;
+  uint32_t asciiLength;  // of the text's bytes when they are ASCII and fit; else 0
 };
 
 // A whole number of milliseconds, taken apart.
@@ -157,6 +161,10 @@ static bool keep(HeldDate &held, int64_t second) {
   held.fraction = *fraction;
   held.second = second;
   held.hasText = true;
+  const uint32_t units = held.text.length;
+  const bool plain =
+      units <= held.ascii.size() && cxNarrowAscii(held.ascii.data(), held.text.data, units);
+  held.asciiLength = plain ? units : 0;
   return true;
 }
 
@@ -186,13 +194,30 @@ static uint8_t appendBy(HeldDate &held, CxUStringBuff *text, double time) {
   return appendDate(text, held, time, nullptr, &status);
 }
 
-uint8_t qlxAppendHeldDate(CxUStringBuff *text, const char *pattern, double time) {
-  const HeldFormatsLock lock;
+// The place of a pattern under the defaults of this moment; null when memory ran out.
+static HeldDate *fetchCurrent(const char *pattern) {
   qlxIntlCheckHeldLocale();
   qlxIntlCheckHeldZone();
-  qlxIntlCheckHeldCodePage();
+  if (pattern) qlxIntlCheckHeldCodePage();
   HeldDate *held = fetch(pattern);
-  if (!held) return 0;
-  held->lastUse = ++gUses;
-  return appendBy(*held, text, time);
+  if (held) held->lastUse = ++gUses;
+  return held;
+}
+
+uint8_t qlxAppendHeldDate(CxUStringBuff *text, const char *pattern, double time) {
+  const HeldFormatsLock lock;
+  HeldDate *held = fetchCurrent(pattern);
+  return held ? appendBy(*held, text, time) : 0;
+}
+
+bool qlxAppendHeldDateAscii(CxAsciiLine *line, const char *pattern, double time) {
+  const HeldFormatsLock lock;
+  HeldDate *held = fetchCurrent(pattern);
+  const std::optional<Moment> moment = held ? momentOf(time) : std::nullopt;
+  if (!moment || !keep(*held, moment->second) || held->asciiLength == 0) return false;
+  std::array<char, 64> text = held->ascii;
+  int32_t millis = moment->millis;
+  for (int32_t at = kMillisDigits - 1; held->fraction >= 0 && at >= 0; --at, millis /= 10)
+    text[static_cast<size_t>(held->fraction + at)] = static_cast<char>('0' + millis % 10);
+  return line->append({text.data(), held->asciiLength});
 }

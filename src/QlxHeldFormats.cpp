@@ -21,6 +21,7 @@ static std::array<UChar, 128> gZone;
 static void dropAll() {
   qlxIntlDropHeldMessages();
   qlxIntlDropHeldDates();
+  qlxIntlDropHeldNumbers();
 }
 
 template <size_t size>
@@ -52,6 +53,7 @@ void qlxIntlCheckHeldZone(void) {
 void qlxDropHeldFormats(void) {
   const HeldFormatsLock lock;
   dropAll();
+  qlxIntlDropHeldBundles();
 }
 
 void qlxHeldFormatsLock(void) {

@@ -11,9 +11,12 @@
 #define QLX_SRC_QLXHELDFORMATS_H
 
 #include <cstdint>
+#include <string_view>
 
 #include <qlx/types.h>
 
+#include "QlxPatternTypes.h"
+#include "util/CxAsciiLine.h"
 #include "util/CxUStringBuff.h"
 
 inline constexpr int kMaxHeldMessages = 64;
@@ -29,10 +32,34 @@ QLX_BEGIN_DECLS
 uint32_t qlxAppendHeldMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
                               va_list *args, UErrorCode *status);
 
+// The same for a pattern of a bundle, which is searched by its name or, when that fails, by the
+// part after the name's last "/". The bundle is not null.
+struct MessageName {
+  const char *bundle;
+  const char *key;
+  const char *locale;
+};
+uint32_t qlxAppendBundleMessage(CxUStringBuff *text, const MessageName &message, va_list *args,
+                                UErrorCode *status);
+
+// Learns the types of such a pattern's arguments; false when there is none or it cannot be read.
+bool qlxScanBundlePattern(const MessageName &message, ArgTypes *types);
+
 // Appends a time in milliseconds since 1970-01-01 UTC, formatted by an 8-bit date pattern in the
 // default locale and zone; a null pattern is "yyyy-MM-dd HH:mm:ss.SSS" and the offset from UTC.
 // Returns 1, or 0 when memory ran out; what ICU cannot format is empty.
 uint8_t qlxAppendHeldDate(CxUStringBuff *text, const char *pattern, double time);
+
+// The same as bytes; false when the text is not ASCII, or not one that is kept for its second.
+bool qlxAppendHeldDateAscii(CxAsciiLine *line, const char *pattern, double time);
+
+// Appends a number in the default locale as a message pattern's "#" or "#.#####" writes it. Returns
+// 1, or 0 when memory ran out; what ICU cannot format is empty.
+typedef enum QlxHeldNumber { kHeldWhole, kHeldFraction } QlxHeldNumber;
+uint8_t qlxAppendHeldNumber(CxUStringBuff *text, QlxHeldNumber which, double value);
+
+// Whether a pattern is its own text, in every locale.
+bool qlxIsPlainPattern(const UChar *pattern, size_t units);
 
 // Drops everything; formatting afterwards holds anew.
 void qlxDropHeldFormats(void);
@@ -42,8 +69,12 @@ void qlxHeldFormatsLock(void);
 void qlxHeldFormatsUnlock(void);
 
 // For the modules that hold, which have the lock.
+uint32_t qlxIntlAppendHeldMessage(CxUStringBuff *text, const char *locale,
+                                  std::u16string_view pattern, va_list *args, UErrorCode *status);
+void qlxIntlDropHeldBundles(void);
 void qlxIntlDropHeldMessages(void);
 void qlxIntlDropHeldDates(void);
+void qlxIntlDropHeldNumbers(void);
 
 // Each drops everything when that default is not the one of its last call.
 void qlxIntlCheckHeldLocale(void);

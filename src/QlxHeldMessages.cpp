@@ -13,7 +13,9 @@
 #include <qlx/memory.h>
 #include <qlx/ustring.h>
 
+#include "QlxComposed.h"
 #include "util/CxOwned.h"
+#include "util/CxUnits.h"
 
 struct PatternKey {
   const char *locale;  // null is the default locale, and not the same as ""
@@ -23,7 +25,9 @@ struct PatternKey {
 
 struct HeldMessage {
   UMessageFormat *format;  // null: a free place, all zero
-  PatternKey key;          // with copies of the two texts, owned
+  bool isComposed;         // false: the pattern is left to ICU
+  QlxComposed composed;
+  PatternKey key;  // with copies of the two texts, owned
   bool usesZone;
   uint64_t lastUse;  // larger is later
 };
@@ -111,10 +115,11 @@ static void hold(const PatternKey &key, bool usesZone, icu::LocalUMessageFormatP
   if (!pattern || (key.locale && !locale)) return;
   HeldMessage &place = *std::ranges::min_element(gMessages, {}, &HeldMessage::lastUse);
   drop(place);
-  place = {format.orphan(),
-           {locale.release(), {pattern.release(), key.pattern.size()}, key.hash},
-           usesZone,
-           ++gUses};
+  place.format = format.orphan();
+  place.key = {locale.release(), {pattern.release(), key.pattern.size()}, key.hash};
+  place.usesZone = usesZone;
+  place.lastUse = ++gUses;
+  place.isComposed = qlxCompose(&place.composed, place.key.pattern, place.format);
 }
 
 // The highest number that an argument of the pattern may have, or -1. What only looks like an
@@ -171,12 +176,10 @@ static uint32_t append(CxUStringBuff *text, const UMessageFormat *format,
   });
 }
 
-static bool isSyntax(char16_t unit) {
-  return unit == u'{' || unit == u'}' || unit == u'\'';
-}
-
-static bool isPlain(std::u16string_view pattern) {
-  return std::ranges::none_of(pattern, isSyntax);
+bool qlxIsPlainPattern(const UChar *pattern, size_t length) {
+  return !cxAnyUnit(pattern, length, [](auto units) {
+    return (units == u'{') | (units == u'}') | (units == u'\'');
+  });
 }
 
 // A pattern without syntax is its own text, in every locale.
@@ -191,16 +194,23 @@ static uint32_t appendPlain(CxUStringBuff *text, std::u16string_view pattern, UE
   return units;
 }
 
-uint32_t qlxAppendHeldMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
-                              va_list *args, UErrorCode *status) {
-  const std::u16string_view units{pattern, static_cast<size_t>(u_strlen(pattern))};
-  if (isPlain(units)) return appendPlain(text, units, status);
-  const PatternKey key{locale, units, hashOf(units)};
+static uint32_t appendHeld(CxUStringBuff *text, const HeldMessage &held, va_list *args,
+                           UErrorCode *status) {
+  const uint32_t before = text->length;
+  *status = U_ZERO_ERROR;
+  if (args && held.isComposed && qlxAppendComposed(text, &held.composed, args)) {
+    return text->length - before;
+  }
+  return append(text, held.format, held.key.pattern, args, status);
+}
 
-  const HeldFormatsLock lock;
+uint32_t qlxIntlAppendHeldMessage(CxUStringBuff *text, const char *locale,
+                                  std::u16string_view pattern, va_list *args, UErrorCode *status) {
+  if (qlxIsPlainPattern(pattern.data(), pattern.size())) return appendPlain(text, pattern, status);
+  const PatternKey key{locale, pattern, hashOf(pattern)};
   if (HeldMessage *held = findCurrent(key)) {
     held->lastUse = ++gUses;
-    return append(text, held->format, key.pattern, args, status);
+    return appendHeld(text, *held, args, status);
   }
   const bool usesZone = mayUseZone(key.pattern);
   *status = U_ZERO_ERROR;
@@ -209,4 +219,10 @@ uint32_t qlxAppendHeldMessage(CxUStringBuff *text, const char *locale, const UCh
   const UMessageFormat *format = fresh.getAlias();
   hold(key, usesZone, fresh);
   return append(text, format, key.pattern, args, status);
+}
+
+uint32_t qlxAppendHeldMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
+                              va_list *args, UErrorCode *status) {
+  const HeldFormatsLock lock;
+  return qlxIntlAppendHeldMessage(text, locale, {pattern, cxUnitsLength(pattern)}, args, status);
 }

@@ -1,10 +1,8 @@
-// Localized messages: made, copied, and bound to text. A bundle is opened for each bind (ICU keeps
-// what it loaded); the parsed patterns are held between calls.
+// Localized messages: made, copied, and bound to text.
 #include "QlxI18Msg.h"
 
 #include <cstring>
 
-#include <unicode/ures.h>
 #include <unicode/ustdio.h>
 #include <unicode/ustring.h>
 
@@ -76,28 +74,14 @@ void qlxSetI18MsgLocale(I18Msg *message, const char *locale) {
   message->shared = 0;
 }
 
-UResourceBundle *qlxOpenMessageBundle(const char *name, const char *locale, UErrorCode *status) {
-  UResourceBundle *bundle = ures_open(name, locale, status);
-  const char *separator = std::strrchr(name, '/');
-  if (U_SUCCESS(*status) || !separator) return bundle;
-  *status = U_ZERO_ERROR;
-  return ures_open(separator + 1, locale, status);
-}
-
 // Appends the message's text. An empty text and a message without a pattern are no failures.
 static uint32_t bindTo(I18Msg *message, va_list *args, CxUStringBuff *text, UErrorCode *status) {
   if (!message->bundle) {
     if (!message->text) return 0;
     return qlxAppendHeldMessage(text, message->locale, message->text, args, status);
   }
-  const icu::LocalUResourceBundlePointer bundle{
-      qlxOpenMessageBundle(message->bundle, message->locale, status)};
-  if (U_FAILURE(*status)) return 0;
-  *status = U_ZERO_ERROR;
-  int32_t length = 0;
-  const UChar *pattern = ures_getStringByKey(bundle.getAlias(), message->key, &length, status);
-  if (U_FAILURE(*status)) return 0;
-  return qlxAppendHeldMessage(text, message->locale, pattern, args, status);
+  return qlxAppendBundleMessage(text, {message->bundle, message->key, message->locale}, args,
+                                status);
 }
 
 uint8_t qlxIntlBindI18MsgTo(I18Msg *message, va_list *args, CxUStringBuff *text) {

@@ -3,13 +3,8 @@
 #define QLX_SRC_QLXI18MSG_H
 
 #include <qlx/class/message.h>
-#include <unicode/ures.h>
 
 QLX_BEGIN_DECLS
-
-// Opens a resource bundle by its name or, when that fails, by the part after the name's last "/".
-// The caller closes it, also after a failure.
-UResourceBundle *qlxOpenMessageBundle(const char *name, const char *locale, UErrorCode *status);
 
 // Binds as qlxIntlBindUI18Msg() does and appends the text. Returns 1, or 0 where that gives null;
 // the buffer's text is unchanged then.

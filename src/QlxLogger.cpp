@@ -12,10 +12,9 @@
 #include "QlxClasses.h"
 #include "QlxConfigKeys.h"
 #include "QlxLocked.h"
+#include "QlxLoggedEvent.h"
 #include "QlxObject.h"
 #include "QlxProps.h"
-
-using EventPtr = Owned<Event, QlxFreeEvent>;
 
 static constexpr QlxLogResult kNothingLogged = {'-', 0, 0};
 
@@ -56,18 +55,18 @@ void qlxLogUMessageEntry(QlxLogResult *result, QlxObject *logger, int32_t level,
   report(result, kNothingLogged);
   const fLog log = qlxIntlLoggerGetFLog(logger);
   if (!log) return;
-  const EventPtr event{QlxVaAllocUEvent(level, bundle, key, nullptr)};
-  if (!event) return;
-  QlxSetEventIsMessage(event.get(), 1);
+  const LoggedEvent event{level, bundle, key, nullptr};
+  if (!event.get()) return;
+  event->isMessage = 1;
   passToLogger(result, logger, log, event.get(), args);
 }
 
 static void setSource(Event *event, const char *file, const char *function, int32_t line) {
   if (file) {
-    QlxSetEventProp(event, "qlx_prop_srcfile", file);
-    QlxSetEventPropInt(event, "qlx_prop_srcline", line);
+    qlxStampEvent(event, "qlx_prop_srcfile", file);
+    qlxStampEventInt(event, "qlx_prop_srcline", line);
   }
-  if (function) QlxSetEventProp(event, "qlx_prop_srcfunction", function);
+  if (function) qlxStampEvent(event, "qlx_prop_srcfunction", function);
 }
 
 void qlxLogUDebugEntry(QlxLogResult *result, QlxObject *logger, int32_t level, const char *file,
@@ -75,9 +74,9 @@ void qlxLogUDebugEntry(QlxLogResult *result, QlxObject *logger, int32_t level, c
   report(result, kNothingLogged);
   const fLog log = qlxIntlLoggerGetFLog(logger);
   if (!log) return;
-  const EventPtr event{QlxVaAllocUEvent(level, nullptr, nullptr, text)};
-  if (!event) return;
-  QlxSetEventIsMessage(event.get(), 0);
+  const LoggedEvent event{level, nullptr, nullptr, text};
+  if (!event.get()) return;
+  event->isMessage = 0;
   setSource(event.get(), file, function, line);
   passToLogger(result, logger, log, event.get(), args);
 }

@@ -7,6 +7,8 @@
 #include <qlx/event.h>
 #include <qlx/memory.h>
 
+#include "QlxFormatted.h"
+#include "QlxI18Msg.h"
 #include "util/CxOwned.h"
 
 static MessageId parse(const char *text) {
@@ -39,6 +41,8 @@ char *qlxPDXMLUGetMessageID(const UChar *text) {
 
 void qlxPDXMLUFormatterCacheMessageID(QlxObject *, Event *event, va_list *args) {
   if (!event || event->messageId) return;
-  const OwnedUStr text{QlxBindEventUMsg(event, qlxIntlBindUI18Msg, args)};
-  QlxSetEventMessageId(event, qlxMessageIdOf(text.get()).text);
+  if (event->locale) qlxSetI18MsgLocale(event->message, event->locale);
+  KeptBuffer text;
+  qlxIntlBindI18MsgTo(event->message, args, text.get());
+  QlxSetEventMessageId(event, qlxMessageIdOf(text.get()->data).text);
 }

@@ -116,14 +116,14 @@ void QlxMultiProcFileHandlerFClose(QlxObject *handler) {
 // ---- Writing
 
 // Runs while this process holds the semaphore.
-static void checkSizeAndWrite(QlxFileHandlerVars *vars, Event *event, const UChar *text) {
+static void checkSizeAndWrite(QlxFileHandlerVars *vars, Event *event, const FormattedBytes &text) {
   qlxKeepFailure(event, qlxFileHandlerMeasure(vars));
   if (qlxFileHandlerIsFull(vars)) rollOver(vars, event);
   qlxKeepFailure(event, qlxFileHandlerWriteText(vars, text));
 }
 
 // Deliberate: a record whose lock fails is dropped; the event tells of it.
-static void writeText(QlxFileHandlerVars *vars, Event *event, const UChar *text) {
+static void writeText(QlxFileHandlerVars *vars, Event *event, const FormattedBytes &text) {
   const CxStatus lock = qlxSharedLockTake(vars);
   qlxKeepFailure(event, lock);
   if (qlxFailed(lock)) return;
@@ -131,13 +131,19 @@ static void writeText(QlxFileHandlerVars *vars, Event *event, const UChar *text)
   qlxMultiProcFileHandlerUnlockSem(vars);
 }
 
+// The text is gone before the listeners get the event.
+static void formatAndWrite(QlxObject *handler, QlxFileHandlerVars *vars, Event *event,
+                           va_list *args) {
+  const FormattedBytes text{handler, event, args};
+  if (text) writeText(vars, event, text);
+}
+
 void QlxMultiProcFileUHandlerFProcess(QlxObject *handler, Event *event, va_list *args) {
   QlxFileHandlerVars *vars = qlxFileHandlerVars(handler);
   if (!vars || !event || !loadEnabled(handler)) return;
   qlxKeepFailure(event, openShared(vars));
   if (vars->opened != 1) return;  // Deliberate: the listeners do not get the event either
-  const OwnedUStr text{qlxIntlUHandlerDoFmt(handler, event, args)};
-  if (text) writeText(vars, event, text.get());
+  formatAndWrite(handler, vars, event, args);
   QlxBasicObjectFLog(handler, event, args);
 }
 

@@ -11,6 +11,7 @@
 #include <qlx/system.h>
 
 #include "QlxClasses.h"
+#include "QlxLoggedEvent.h"
 #include "QlxObject.h"
 
 namespace {
@@ -89,7 +90,7 @@ void QlxPDLoggerFCfgChange(QlxObject *logger, const char *key) {
 
 static void stampValues(Event *event, const PDLoggerVars *vars) {
   for (const Stamp &stamp : kStamps) {
-    if (const char *value = vars->*stamp.value) QlxSetEventProp(event, stamp.key, value);
+    if (const char *value = vars->*stamp.value) qlxStampEvent(event, stamp.key, value);
   }
 }
 
@@ -97,8 +98,8 @@ void QlxPDLoggerFLog(QlxObject *logger, Event *event, va_list *args) {
   if (!logger || !event) return;
   const PDLoggerVars *vars = varsOf(logger);
   if (vars) stampValues(event, vars);
-  QlxSetEventPropLong(event, "processId", static_cast<int32_t>(CxProcessGetCurrentID()));
-  QlxSetEventPropLong(event, "threadId", static_cast<int32_t>(CxThreadGetCurrentID()));
+  qlxStampEventInt(event, "processId", static_cast<int32_t>(CxProcessGetCurrentID()));
+  qlxStampEventInt(event, "threadId", static_cast<int32_t>(CxThreadGetCurrentID()));
   qlxPDXMLUFormatterCacheMessageID(vars ? vars->idFormatter : nullptr, event, args);
   QlxBasicObjectFLog(logger, event, args);
 }

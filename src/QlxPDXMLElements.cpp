@@ -5,15 +5,12 @@
 #include <algorithm>
 #include <iterator>
 
-#include <unicode/localpointer.h>
-#include <unicode/ures.h>
-
 #include <qlx/buffers.h>
 #include <qlx/class/event.h>
 #include <qlx/event.h>
 #include <qlx/memory.h>
 
-#include "QlxI18Msg.h"
+#include "QlxHeldFormats.h"
 #include "QlxPatternTypes.h"
 #include "QlxProps.h"
 #include "QlxRecordText.h"
@@ -117,9 +114,7 @@ static void emitValue(RecordText &out, ArgType type, va_list *args) {
 }
 
 // Deliberate: ends at the first index without a type, whatever comes after it.
-static void emitParameters(CxUStringBuff *record, const UChar *pattern, va_list *args) {
-  ArgTypes types;
-  if (!args || !qlxScanPatternTypes(pattern, &types)) return;
+static void emitParameters(CxUStringBuff *record, const ArgTypes &types, va_list *args) {
   RecordText out(record);
   va_list copy;
   va_copy(copy, *args);
@@ -132,25 +127,15 @@ static void emitParameters(CxUStringBuff *record, const UChar *pattern, va_list 
   va_end(copy);
 }
 
-static void emitBundleParameters(CxUStringBuff *record, const I18Msg *message, const char *bundle,
-                                 va_list *args) {
-  if (!bundle) return;
-  UErrorCode status = U_ZERO_ERROR;
-  const icu::LocalUResourceBundlePointer opened{
-      qlxOpenMessageBundle(bundle, message->locale, &status)};
-  if (U_FAILURE(status)) return;
-  status = U_ZERO_ERROR;
-  int32_t length = 0;
-  const UChar *pattern = ures_getStringByKey(opened.getAlias(), message->key, &length, &status);
-  if (U_SUCCESS(status)) emitParameters(record, pattern, args);
-}
-
 void qlxPDXMLEmitUTranslationInfo(CxUStringBuff *record, Event *event, const char *bundle,
                                   va_list *args) {
   if (!event || !event->message) return;
   // Deliberate: the attribute's name has a blank in it.
   RecordText(record) << u" <TranslationInfo Resource Bundle=\"" << bundle << u"\" MsgKey=\""
                      << event->message->key << u"\">";
-  emitBundleParameters(record, event->message, bundle, args);
+  ArgTypes types;
+  const bool known =
+      bundle && qlxScanBundlePattern({bundle, event->message->key, event->message->locale}, &types);
+  if (known && args) emitParameters(record, types, args);
   RecordText(record) << u"</TranslationInfo>\n";
 }

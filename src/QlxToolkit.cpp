@@ -10,8 +10,11 @@
 #include <qlx/toolkit.h>
 
 #include "QlxClasses.h"
+#include "QlxFileWatch.h"
+#include "QlxFormatted.h"
 #include "QlxHeldFormats.h"
 #include "QlxLocked.h"
+#include "QlxLoggedEvent.h"
 #include "QlxLogManager.h"
 #include "QlxObjClass.h"
 #include "QlxObject.h"
@@ -170,7 +173,10 @@ static void closeToolkit() {
   qlxCloseLogMgr();
   qlxFreeInstancesMap();
   freeClasses();
+  qlxDropKeptEvent();
+  qlxDropFormatted();
   qlxDropHeldFormats();
+  qlxFileWatchStop();
   gToolkit.open = 0;
 }
 

@@ -7,6 +7,8 @@
 #include <cstring>
 #include <optional>
 
+#include "QlxFormatted.h"
+#include "QlxLoggedEvent.h"
 #include "support/ChainTest.h"
 #include "support/FailingMemory.h"
 #include "support/Status.h"
@@ -405,6 +407,8 @@ TEST_F(PDLoggerTest, AllItsMemoryIsGivenBackWhenItIsReleased) {
     QlxLogInfo(made.get(), nullptr, nullptr);
     EXPECT_GT(memory.live(), 0);
   }
+  qlxDropKeptEvent();  // what is kept for the next call
+  qlxDropFormatted();
   EXPECT_EQ(memory.live(), 0);
 }
 

@@ -16,54 +16,28 @@
 
 #include "CxDecimal.h"
 #include "CxStatus.h"
+#include "CxUnits.h"
 
 static constexpr uint32_t kMaxParmUnits = 256;
 static constexpr uint32_t kMaxBytesPerUnit = cxUStringNarrowRoom(0);
 
 // ICU on this platform is built for UTF-8 as the default code page and then never changes it; built
 // otherwise, all text takes the way over its converter.
-static bool defaultIsUtf8() {
-  return std::strcmp(ucnv_getDefaultName(), "UTF-8") == 0;
-}
-
-// Whether no unit has a bit of `mask`, which is the mask of one unit repeated over eight bytes.
-template <uint64_t mask, typename Unit>
-static bool hasNoneOf(const Unit *text, uint32_t length) {
-  constexpr uint32_t kStep = sizeof mask / sizeof(Unit);
-  for (; length >= kStep; length -= kStep, text += kStep) {
-    uint64_t units;
-    std::memcpy(&units, text, sizeof units);
-    if (units & mask) return false;
-  }
-  for (; length > 0; --length, ++text)
-    if (*text & static_cast<Unit>(mask)) return false;
-  return true;
-}
-
-static bool isAscii(const char *text, uint32_t length) {
-  return hasNoneOf<0x8080808080808080U>(text, length);
-}
-
-static bool isAscii(const UChar *text, uint32_t length) {
-  return hasNoneOf<0xFF80FF80FF80FF80U>(text, length);
+bool cxUStringDefaultIsUtf8(void) {
+  const char *name = ucnv_getDefaultName();
+  for (const char *expected = "UTF-8"; *name == *expected; ++name, ++expected)
+    if (*name == '\0') return true;
+  return false;
 }
 
 bool cxUStringIsPlainAscii(const char *text, uint32_t length) {
-  return isAscii(text, length) && defaultIsUtf8();
+  uint8_t seen = 0;
+  for (uint32_t i = 0; i < length; ++i) seen |= static_cast<uint8_t>(text[i]);
+  return seen < 0x80 && cxUStringDefaultIsUtf8();
 }
 
-// Copies ASCII between the two widths. The inner loop of a fixed length is what compilers make
-// vector code of at every level of optimization.
-template <typename To, typename From>
-static void copyAscii(To *__restrict out, const From *__restrict text, uint32_t length) {
-  constexpr uint32_t kStep = 8;
-  for (; length >= kStep; length -= kStep, out += kStep, text += kStep)
-    for (uint32_t i = 0; i < kStep; ++i) out[i] = static_cast<To>(text[i]);
-  for (; length > 0; --length) *out++ = static_cast<To>(*text++);
-}
-
-void cxUStringWiden(UChar *out, const char *text, uint32_t length) {
-  copyAscii(out, text, length);
+bool cxUStringWiden(UChar *out, const char *text, uint32_t length) {
+  return cxWidenAscii(out, text, length) && cxUStringDefaultIsUtf8();
 }
 
 // u_uastrncpy and u_austrncpy are u_uastrcpy and u_austrcpy that stop at the end of the room: no
@@ -81,8 +55,7 @@ static void *allocText(uint32_t units, uint32_t perUnit) {
 }
 
 uint32_t cxUStringNarrow(char *out, const UChar *text, uint32_t length) {
-  if (isAscii(text, length) && defaultIsUtf8()) {
-    copyAscii(out, text, length);
+  if (cxNarrowAscii(out, text, length) && cxUStringDefaultIsUtf8()) {
     out[length] = 0;
     return length;
   }
@@ -103,8 +76,7 @@ UChar *CxUStringDupStrToUChar(const char *text) {
   const uint32_t length = OslStringLen(text);
   auto *copy = static_cast<UChar *>(allocText(length, sizeof(UChar)));
   if (!copy) return nullptr;
-  if (cxUStringIsPlainAscii(text, length)) {
-    cxUStringWiden(copy, text, length);
+  if (cxUStringWiden(copy, text, length)) {
     copy[length] = 0;
   } else {
     cxUStringConvert(copy, text, length);
@@ -113,13 +85,13 @@ UChar *CxUStringDupStrToUChar(const char *text) {
 }
 
 char *CxUStringDupUCharToStr(const UChar *text) {
-  return text ? narrow(text, static_cast<uint32_t>(u_strlen(text))) : nullptr;
+  return text ? narrow(text, static_cast<uint32_t>(cxUnitsLength(text))) : nullptr;
 }
 
 UChar *CxUStringDup(const UChar *text) {
   if (!text) return nullptr;
   auto *copy =
-      static_cast<UChar *>(allocText(static_cast<uint32_t>(u_strlen(text)), sizeof(UChar)));
+      static_cast<UChar *>(allocText(static_cast<uint32_t>(cxUnitsLength(text)), sizeof(UChar)));
   return copy ? u_strcpy(copy, text) : nullptr;
 }
 
@@ -193,7 +165,7 @@ CxStatus CxUStringToStdout(const UChar *text) {
   if (!text) return kCxSuccess;
   UFILE *handle = takeStdout();
   if (!handle) return kCxSuccess;
-  u_file_write(text, u_strlen(text), handle);
+  u_file_write(text, static_cast<int32_t>(cxUnitsLength(text)), handle);
   u_fputc(u'\n', handle);
   giveBackStdout(handle);
   return kCxSuccess;

@@ -7,11 +7,15 @@
 
 QLX_BEGIN_DECLS
 
+// Whether the default code page is UTF-8.
+bool cxUStringDefaultIsUtf8(void);
+
 // Whether `length` bytes are ASCII and mean themselves in the default code page.
 bool cxUStringIsPlainAscii(const char *text, uint32_t length);
 
-// Widens plain ASCII to `length` code units, without a terminator.
-void cxUStringWiden(UChar *out, const char *text, uint32_t length);
+// Widens `length` bytes to as many code units, without a terminator. False, with `out` in any
+// state, unless all are ASCII and mean themselves in the default code page.
+bool cxUStringWiden(UChar *out, const char *text, uint32_t length);
 
 // Converts `length` bytes without a zero among them and terminates: `out` has room for `length` + 1
 // code units, and the result is never longer than the bytes. Returns its length.

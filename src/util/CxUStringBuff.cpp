@@ -2,23 +2,17 @@
 // block wherever its length there is known or fits; nothing else is allocated then.
 #include "CxUStringBuff.h"
 
-#include <array>
 #include <cstring>
 #include <string_view>
 
-#include <unicode/umsg.h>
-#include <unicode/ustring.h>
-
+#include "../QlxHeldFormats.h"
 #include "CxDecimal.h"
 #include "CxOwned.h"
 #include "CxStringBuff.h"
 #include "CxUString.h"
+#include "CxUnits.h"
 
 static constexpr uint32_t kFirstCapacityBytes = 1024;
-
-// Holds every double's text: 309 digits, a sign with its direction marks and five fraction digits,
-// where a digit may take two units.
-static constexpr int32_t kMaxNumberUnits = 640;
 
 uint8_t cxUStringBuffHasCapacity(CxUStringBuff *buffer, uint32_t extra) {
   if (!buffer) return 0;
@@ -56,7 +50,7 @@ static bool isOwn(const CxUStringBuff *buffer, const UChar *text) {
   return buffer->data && place >= start && place - start <= buffer->length * sizeof(UChar);
 }
 
-static uint8_t appendUnits(CxUStringBuff *buffer, const UChar *text, uint32_t units) {
+uint8_t cxUStringBuffAppendUnits(CxUStringBuff *buffer, const UChar *text, uint32_t units) {
   if (!buffer) return 0;
   const bool own = isOwn(buffer, text);
   const size_t offset = own ? static_cast<size_t>(text - buffer->data) : 0;
@@ -73,18 +67,22 @@ static bool fits(const CxUStringBuff *buffer, uint32_t bytes) {
 // Appends bytes of the default code page, none of them zero. The buffer grows by what they become,
 // so what might become shorter and does not fit as it is takes the way over a copy.
 static uint8_t appendBytes(CxUStringBuff *buffer, const char *text, uint32_t bytes) {
-  if (cxUStringIsPlainAscii(text, bytes)) {
-    if (!cxUStringBuffHasCapacity(buffer, bytes)) return 0;
-    cxUStringWiden(endOf(buffer), text, bytes);
-    return extend(buffer, bytes);
+  const bool plainAndLong =
+      buffer && buffer->data && !fits(buffer, bytes) && cxUStringIsPlainAscii(text, bytes);
+  if (!cxUStringBuffHasCapacity(buffer, plainAndLong ? bytes : 0)) return 0;
+  if (fits(buffer, bytes)) {
+    if (cxUStringWiden(endOf(buffer), text, bytes)) return extend(buffer, bytes);
+    return extend(buffer, cxUStringConvert(endOf(buffer), text, bytes));
   }
-  if (!cxUStringBuffHasCapacity(buffer, 0)) return 0;
-  if (fits(buffer, bytes)) return extend(buffer, cxUStringConvert(endOf(buffer), text, bytes));
   if (bytes >= kMaxBuffBytes) return 0;
   const OwnedUStr units{
       static_cast<UChar *>(OslMemoryMalloc((bytes + 1) * static_cast<uint32_t>(sizeof(UChar))))};
   if (!units) return 0;
-  return appendUnits(buffer, units.get(), cxUStringConvert(units.get(), text, bytes));
+  return cxUStringBuffAppendUnits(buffer, units.get(), cxUStringConvert(units.get(), text, bytes));
+}
+
+uint8_t cxUStringBuffAppend(CxUStringBuff *buffer, std::string_view text) {
+  return appendBytes(buffer, text.data(), static_cast<uint32_t>(text.size()));
 }
 
 uint8_t CxUStringBuffAppendChar(CxUStringBuff *buffer, char character) {
@@ -103,7 +101,8 @@ uint8_t CxUStringBuffAppendStrN(CxUStringBuff *buffer, const char *text, int32_t
 }
 
 uint8_t CxUStringBuffAppendUStr(CxUStringBuff *buffer, const UChar *text) {
-  return text ? appendUnits(buffer, text, static_cast<uint32_t>(u_strlen(text))) : 0;
+  return text ? cxUStringBuffAppendUnits(buffer, text, static_cast<uint32_t>(cxUnitsLength(text)))
+              : 0;
 }
 
 uint8_t CxUStringBuffAppendInt32(CxUStringBuff *buffer, int32_t value) {
@@ -119,26 +118,15 @@ uint8_t CxUStringBuffAppendUInt64(CxUStringBuff *buffer, uint64_t value) {
   UChar digits[kMaxDecimalDigits];
   UChar *const end = digits + kMaxDecimalDigits;
   const UChar *first = cxDecimalBefore(end, value, u'0');
-  return appendUnits(buffer, first, static_cast<uint32_t>(end - first));
-}
-
-// Appends a number as a message pattern writes it in the default locale; nothing when ICU fails.
-static uint8_t appendFormatted(CxUStringBuff *buffer, std::u16string_view pattern, double value) {
-  std::array<UChar, kMaxNumberUnits> text;
-  UErrorCode status = U_ZERO_ERROR;
-  const int32_t units =
-      u_formatMessage(nullptr, pattern.data(), static_cast<int32_t>(pattern.size()), text.data(),
-                      kMaxNumberUnits, &status, value);
-  const bool usable = U_SUCCESS(status) && units > 0;
-  return appendUnits(buffer, text.data(), usable ? static_cast<uint32_t>(units) : 0);
+  return cxUStringBuffAppendUnits(buffer, first, static_cast<uint32_t>(end - first));
 }
 
 uint8_t CxUStringBuffAppendUDate(CxUStringBuff *buffer, double date) {
-  return appendFormatted(buffer, u"{0,number,#}", date);
+  return buffer ? qlxAppendHeldNumber(buffer, kHeldWhole, date) : 0;
 }
 
 uint8_t CxUStringBuffAppendUDouble(CxUStringBuff *buffer, double value) {
-  return appendFormatted(buffer, u"{0,number,#.#####}", value);
+  return buffer ? qlxAppendHeldNumber(buffer, kHeldFraction, value) : 0;
 }
 
 UChar *CxUStringBuffTakeUStr(CxUStringBuff *buffer) {

@@ -2,6 +2,8 @@
 #ifndef QLX_SRC_CXUSTRINGBUFF_H
 #define QLX_SRC_CXUSTRINGBUFF_H
 
+#include <string_view>
+
 #include <qlx/buffers.h>
 
 QLX_BEGIN_DECLS
@@ -9,6 +11,12 @@ QLX_BEGIN_DECLS
 // Makes room for `extra` code units and the terminator behind the text; makes the first block.
 // Returns 1, or 0 with the text unchanged.
 uint8_t cxUStringBuffHasCapacity(CxUStringBuff *buffer, uint32_t extra);
+
+// Appends bytes of the default code page, none of them zero, as CxUStringBuffAppendStr() does.
+uint8_t cxUStringBuffAppend(CxUStringBuff *buffer, std::string_view text);
+
+// Appends code units, as CxUStringBuffAppendUStr() does.
+uint8_t cxUStringBuffAppendUnits(CxUStringBuff *buffer, const UChar *text, uint32_t units);
 
 QLX_END_DECLS
 

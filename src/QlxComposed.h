@@ -1,0 +1,42 @@
+// A message pattern taken apart into literal text and arguments of three plain types, so that a
+// text is put together without the machinery for all the other patterns. The numbers are written by
+// the formatters of the parsed message itself.
+#ifndef QLX_SRC_QLXCOMPOSED_H
+#define QLX_SRC_QLXCOMPOSED_H
+
+#include <cstdarg>
+#include <string_view>
+
+#include <unicode/numfmt.h>
+#include <unicode/umsg.h>
+
+#include <qlx/buffers.h>
+
+inline constexpr int32_t kMaxComposedPieces = 24;
+inline constexpr int32_t kMaxComposedArguments = 10;
+
+enum class ComposedType : uint8_t { kNone, kText, kInteger, kDouble };
+
+struct ComposedPiece {
+  const UChar *text;                // a literal; null: an argument
+  int32_t length;                   // of the literal, or the argument's number
+  const icu::NumberFormat *format;  // of an argument that is a number
+};
+
+struct QlxComposed {
+  int32_t pieceCount;
+  int32_t argumentCount;
+  ComposedPiece pieces[kMaxComposedPieces];
+  ComposedType types[kMaxComposedArguments];
+};
+
+// Takes a pattern apart that `message` was made of; both outlive the result. False when the pattern
+// has anything but text, {n}, {n,number} and {n,number,integer}, each number below 10 and none left
+// out, or is too long.
+bool qlxCompose(QlxComposed *composed, std::u16string_view pattern, const UMessageFormat *message);
+
+// Appends the text. False, with the buffer's text unchanged, when an argument is a null string or
+// memory ran out.
+bool qlxAppendComposed(CxUStringBuff *text, const QlxComposed *composed, va_list *args);
+
+#endif

@@ -1,0 +1,41 @@
+// Whether a path still leads to a regular file, asked before every record. A look at the path costs
+// more than the record's write, so the system is asked to tell of changes instead: watches on
+// the file and on the directories above it, and one cheap question for all of the process.
+#ifndef QLX_SRC_QLXFILEWATCH_H
+#define QLX_SRC_QLXFILEWATCH_H
+
+#include <stdint.h>
+
+#include <qlx/base.h>
+
+QLX_BEGIN_DECLS
+
+typedef struct QlxFileWatch {
+  uint8_t watching;     // 1: what follows holds, and a change is told
+  uint8_t looks;        // at the path since the file was opened, as far as they are counted
+  int32_t watchNumber;  // of the file itself
+  uint32_t changesSeen;
+  int64_t lastLook;  // seconds
+} QlxFileWatch;
+
+/**
+ * Whether the path leads to a regular file, now: nothing that happened before the call is missed,
+ * except that a change which the system does not tell of, such as another file system mounted over
+ * a directory, may be seen a second late. A zeroed watch looks at the path; how it goes on is its
+ * own affair. Where nothing can be watched (a relative path, symbolic links, a network's file
+ * system, no watches left) it looks every time.
+ */
+bool qlxFileWatchFindsFile(QlxFileWatch *watch, const char *path);
+
+/** Ends the watch of a file that is closed; the next question starts anew. */
+void qlxFileWatchEnd(QlxFileWatch *watch);
+
+/** Gives the descriptors back; paths are looked at until the next watch starts. */
+void qlxFileWatchStop(void);
+
+/** For the child of a fork, which must not take the parent's notices. */
+void qlxFileWatchForget(void);
+
+QLX_END_DECLS
+
+#endif

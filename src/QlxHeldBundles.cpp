@@ -1,0 +1,149 @@
+// Resource bundles, held by name and locale, and by where ICU looks for them: in its data
+// directory, and in the default locale when it has no bundle of the locale. ICU keeps what it has
+// loaded anyway; held is the handle.
+#include "QlxHeldFormats.h"
+
+#include <algorithm>
+#include <cstring>
+
+#include <unicode/putil.h>
+#include <unicode/uloc.h>
+#include <unicode/ures.h>
+
+#include <qlx/memory.h>
+
+#include "QlxPatternTypes.h"
+#include "util/CxOwned.h"
+
+struct BundleKey {
+  const char *name;
+  const char *locale;  // null is the default locale, and not the same as ""
+  const char *defaultLocale;
+};
+
+static constexpr const char *BundleKey::*kKeyTexts[] = {&BundleKey::name, &BundleKey::locale,
+                                                        &BundleKey::defaultLocale};
+
+struct HeldBundle {
+  UResourceBundle *bundle;  // null: a free place, all zero
+  BundleKey key;            // with copies of the texts, owned
+  uint64_t lastUse;         // larger is later
+};
+
+static constexpr int kMaxHeldBundles = 16;
+
+static HeldBundle gBundles[kMaxHeldBundles];
+static char *gDataDirectory;  // in which the held ones were searched; owned
+static uint64_t gUses;
+
+static void freeTexts(BundleKey &key) {
+  for (auto text : kKeyTexts) OslMemoryFree(const_cast<char *>(key.*text));
+}
+
+static void drop(HeldBundle &held) {
+  ures_close(held.bundle);
+  freeTexts(held.key);
+  held = {};
+}
+
+void qlxIntlDropHeldBundles(void) {
+  for (HeldBundle &held : gBundles)
+    if (held.bundle) drop(held);
+  OslMemoryFree(gDataDirectory);
+  gDataDirectory = nullptr;
+}
+
+// ICU takes what is open for what another directory has under the same name.
+static void checkDataDirectory() {
+  const char *directory = u_getDataDirectory();
+  if (gDataDirectory && std::strcmp(gDataDirectory, directory) == 0) return;
+  qlxIntlDropHeldBundles();
+  gDataDirectory = OslStringDup(directory);
+}
+
+static bool isSame(const char *a, const char *b) {
+  return a && b ? std::strcmp(a, b) == 0 : a == b;
+}
+
+static bool isSame(const BundleKey &a, const BundleKey &b) {
+  return std::ranges::all_of(kKeyTexts, [&](auto text) { return isSame(a.*text, b.*text); });
+}
+
+// A pattern of a held bundle is in use while it is formatted, so nothing here is dropped when a
+// default turns out to be another one.
+static HeldBundle *find(const BundleKey &key) {
+  for (HeldBundle &held : gBundles)
+    if (held.bundle && isSame(held.key, key)) return &held;
+  return nullptr;
+}
+
+// Opens a bundle by its name or, when that fails, by the part after the name's last "/".
+static icu::LocalUResourceBundlePointer open(const char *name, const char *locale,
+                                             UErrorCode *status) {
+  icu::LocalUResourceBundlePointer bundle{ures_open(name, locale, status)};
+  const char *separator = std::strrchr(name, '/');
+  if (U_SUCCESS(*status) || !separator) return bundle;
+  *status = U_ZERO_ERROR;
+  return icu::LocalUResourceBundlePointer{ures_open(separator + 1, locale, status)};
+}
+
+// Takes the bundle over when there is memory to hold it. One that cannot be opened is not held: it
+// may be there the next time.
+static void hold(const BundleKey &key, icu::LocalUResourceBundlePointer &bundle) {
+  BundleKey copy = key;
+  bool whole = true;
+  for (auto text : kKeyTexts) {
+    copy.*text = OslStringDup(key.*text);
+    whole = whole && (copy.*text || !(key.*text));
+  }
+  if (!whole) return freeTexts(copy);
+  HeldBundle &place = *std::ranges::min_element(gBundles, {}, &HeldBundle::lastUse);
+  drop(place);
+  place = {bundle.orphan(), copy, ++gUses};
+}
+
+static std::u16string_view lookUp(const UResourceBundle *bundle, const char *key,
+                                  UErrorCode *status) {
+  *status = U_ZERO_ERROR;
+  int32_t length = 0;
+  const UChar *pattern = ures_getStringByKey(bundle, key, &length, status);
+  if (U_FAILURE(*status)) return {};
+  return {pattern, static_cast<size_t>(length)};
+}
+
+template <typename Use>
+static void withPattern(const MessageName &message, UErrorCode *status, Use use) {
+  checkDataDirectory();
+  const BundleKey key{message.bundle, message.locale, uloc_getDefault()};
+  if (HeldBundle *held = find(key)) {
+    held->lastUse = ++gUses;
+    return use(lookUp(held->bundle, message.key, status));
+  }
+  icu::LocalUResourceBundlePointer fresh = open(message.bundle, message.locale, status);
+  if (U_FAILURE(*status)) return;
+  const UResourceBundle *bundle = fresh.getAlias();
+  hold(key, fresh);
+  use(lookUp(bundle, message.key, status));
+}
+
+uint32_t qlxAppendBundleMessage(CxUStringBuff *text, const MessageName &message, va_list *args,
+                                UErrorCode *status) {
+  const HeldFormatsLock lock;
+  uint32_t appended = 0;
+  withPattern(message, status, [&](std::u16string_view pattern) {
+    if (U_SUCCESS(*status)) {
+      appended = qlxIntlAppendHeldMessage(text, message.locale, pattern, args, status);
+    }
+  });
+  return appended;
+}
+
+bool qlxScanBundlePattern(const MessageName &message, ArgTypes *types) {
+  const HeldFormatsLock lock;
+  UErrorCode status = U_ZERO_ERROR;
+  bool scanned = false;
+  withPattern(message, &status, [&](std::u16string_view pattern) {
+    scanned = U_SUCCESS(status) && qlxScanPatternTypes(pattern.data(), types);
+  });
+  return scanned;
+}

@@ -1,0 +1,68 @@
+// The two formats in which the buffers write doubles, held for the default locale.
+#include "QlxHeldFormats.h"
+
+#include <string_view>
+
+#include <unicode/unum.h>
+
+#include "util/CxDecimal.h"
+#include "util/CxUStringBuff.h"
+
+struct HeldNumber {
+  std::u16string_view pattern;
+  UNumberFormat *format;  // null: not opened
+  bool plainDigits;       // a whole number that is not negative is its ASCII digits
+};
+
+static HeldNumber gNumbers[] = {{u"#", nullptr, false}, {u"#.#####", nullptr, false}};
+
+// Beyond this not every whole number is a double.
+static constexpr double kMaxWhole = 9007199254740992.0;
+
+void qlxIntlDropHeldNumbers(void) {
+  for (HeldNumber &held : gNumbers) {
+    unum_close(held.format);
+    held.format = nullptr;
+  }
+}
+
+// Any digit may be another one in the locale, and any locale may put signs around them.
+static bool writesPlainDigits(const UNumberFormat *format) {
+  constexpr std::u16string_view kDigits = u"1234567890";
+  UChar text[32];
+  UErrorCode status = U_ZERO_ERROR;
+  const int32_t units = unum_formatInt64(format, 1234567890, text, 32, nullptr, &status);
+  return U_SUCCESS(status) && kDigits == std::u16string_view{text, static_cast<size_t>(units)};
+}
+
+// As a message format makes it: the locale's own, which then gets the pattern. One that takes no
+// pattern, as that of a locale with worded numbers, stays as it is.
+static void open(HeldNumber &held) {
+  UErrorCode status = U_ZERO_ERROR;
+  held.format = unum_open(UNUM_DECIMAL, nullptr, 0, nullptr, nullptr, &status);
+  if (U_FAILURE(status)) held.format = nullptr;
+  if (!held.format) return;
+  unum_applyPattern(held.format, 0, held.pattern.data(), static_cast<int32_t>(held.pattern.size()),
+                    nullptr, &status);
+  held.plainDigits = writesPlainDigits(held.format);
+}
+
+uint8_t qlxAppendHeldNumber(CxUStringBuff *text, QlxHeldNumber which, double value) {
+  const HeldFormatsLock lock;
+  qlxIntlCheckHeldLocale();
+  HeldNumber &held = gNumbers[which];
+  if (!held.format) open(held);
+  if (!held.format) return cxUStringBuffHasCapacity(text, 0);
+  if (held.plainDigits && value >= 0 && value < kMaxWhole) {
+    const auto whole = static_cast<uint64_t>(value);
+    const bool negativeZero = whole == 0 && __builtin_signbit(value);
+    if (static_cast<double>(whole) == value && !negativeZero) {
+      return CxUStringBuffAppendUInt64(text, whole);
+    }
+  }
+  UErrorCode status = U_ZERO_ERROR;
+  qlxAppendFormatted(text, &status, [&](UChar *room, int32_t units, UErrorCode *answer) {
+    return unum_formatDouble(held.format, value, room, units, nullptr, answer);
+  });
+  return status != U_MEMORY_ALLOCATION_ERROR;
+}

@@ -1,0 +1,37 @@
+// A line of bytes that holds as long as all of it is ASCII and fits: nearly every line of a log.
+// Its appending functions answer whether it still holds; after a false the line is of no use.
+// Header only; nothing is allocated.
+#ifndef QLX_SRC_CXASCIILINE_H
+#define QLX_SRC_CXASCIILINE_H
+
+#include <array>
+#include <string_view>
+
+#include "CxUnits.h"
+
+class CxAsciiLine {
+ public:
+  const char *data() const { return bytes_.data(); }
+  uint32_t length() const { return static_cast<uint32_t>(length_); }
+
+  bool append(std::string_view text) {
+    if (text.size() > room() || !cxCopyAscii(end(), text.data(), text.size())) return false;
+    length_ += text.size();
+    return true;
+  }
+
+  bool append(const UChar *text, size_t units) {
+    if (units > room() || !cxNarrowAscii(end(), text, units)) return false;
+    length_ += units;
+    return true;
+  }
+
+ private:
+  size_t room() const { return bytes_.size() - length_; }
+  char *end() { return bytes_.data() + length_; }
+
+  std::array<char, 4096> bytes_;  // not cleared
+  size_t length_ = 0;
+};
+
+#endif

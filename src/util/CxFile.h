@@ -10,7 +10,8 @@ QLX_BEGIN_DECLS
 // what was written to *written, also when it fails in the end.
 CxStatus cxIntlFileWriteAll(CxFile *file, const char *bytes, uint32_t length, uint64_t *written);
 
-// The last step of truncating, for itself: 22 when the file has a byte; a failed look at it gives its errno.
+// The last step of truncating, for itself: 22 when the file has a byte; a failed look at it gives
+// its errno.
 CxStatus cxIntlFileCheckEmpty(CxFile file);
 
 QLX_END_DECLS

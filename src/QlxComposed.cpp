@@ -39,7 +39,7 @@ class Parser {
       if (!addLiteral(part.getIndex())) return false;
       from_ = part.getLimit();
       if (part.getType() == UMSGPAT_PART_TYPE_MSG_LIMIT) return hasAllArguments();
-      if (part.getType() == UMSGPAT_PART_TYPE_SKIP_SYNTAX) continue;
+      if (isQuote(part.getType())) continue;
       if (part.getType() != UMSGPAT_PART_TYPE_ARG_START || !addArgument(i)) return false;
       i = parts_.getLimitPartIndex(i);
       from_ = parts_.getPart(i).getLimit();
@@ -48,6 +48,11 @@ class Parser {
   }
 
  private:
+  // What is left out of the text, or where a quote that stands for itself could be doubled.
+  static bool isQuote(UMessagePatternPartType type) {
+    return type == UMSGPAT_PART_TYPE_SKIP_SYNTAX || type == UMSGPAT_PART_TYPE_INSERT_CHAR;
+  }
+
   ComposedPiece *newPiece() {
     return out_->pieceCount < kMaxComposedPieces ? &out_->pieces[out_->pieceCount++] : nullptr;
   }

@@ -14,6 +14,7 @@
 
 #include "QlxPatternTypes.h"
 #include "util/CxOwned.h"
+#include "util/CxUnits.h"
 
 struct BundleKey {
   const char *name;
@@ -102,13 +103,13 @@ static void hold(const BundleKey &key, icu::LocalUResourceBundlePointer &bundle)
   place = {bundle.orphan(), copy, ++gUses};
 }
 
+// The text ends at its first zero, where it has one.
 static std::u16string_view lookUp(const UResourceBundle *bundle, const char *key,
                                   UErrorCode *status) {
   *status = U_ZERO_ERROR;
-  int32_t length = 0;
-  const UChar *pattern = ures_getStringByKey(bundle, key, &length, status);
+  const UChar *pattern = ures_getStringByKey(bundle, key, nullptr, status);
   if (U_FAILURE(*status)) return {};
-  return {pattern, static_cast<size_t>(length)};
+  return {pattern, cxUnitsLength(pattern)};
 }
 
 template <typename Use>

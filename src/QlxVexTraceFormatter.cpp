@@ -8,14 +8,16 @@
 #include <qlx/buffers.h>
 #include <qlx/class/event.h>
 #include <qlx/class/message.h>
-#include <qlx/class/msgid.h>
 #include <qlx/event.h>
 #include <qlx/memory.h>
 
 #include "QlxClasses.h"
 #include "QlxHeldFormats.h"
+#include "QlxMsgId.h"
 #include "QlxObject.h"
 #include "QlxProps.h"
+#include "QlxRecordText.h"
+#include "util/CxOwned.h"
 
 namespace {
 
@@ -38,67 +40,54 @@ struct Record {
 
 }  // namespace
 
-static void appendTime(CxUStringBuff *line, const Record &record) {
-  CxUStringBuffAppendUStr(line, u"[");
-  qlxAppendHeldDate(line, record.formatter->kind2.dateTimeFormat, record.event->time);
-  CxUStringBuffAppendUStr(line, u"]");
+static void appendTime(RecordText &line, const Record &record) {
+  line << u"[";
+  line.by(qlxAppendHeldDate, record.formatter->kind2.dateTimeFormat, record.event->time) << u"]";
 }
 
-static void appendLevel(CxUStringBuff *line, const Record &record) {
+static void appendLevel(RecordText &line, const Record &record) {
   const auto *row = std::ranges::find(kLevelWords, record.event->level, &LevelWord::level);
-  CxUStringBuffAppendUStr(line, row != std::end(kLevelWords) ? row->word : u"OTHER");
+  line << (row != std::end(kLevelWords) ? row->word : u"OTHER");
 }
 
 // Up to the first dot.
-static void appendShortHost(CxUStringBuff *line, const Record &record) {
+static void appendShortHost(RecordText &line, const Record &record) {
   const char *server = qlxPeekMapProp(record.event->props, "server");
   if (!server) return;
-  CxUStringBuffAppendStrN(line, server, static_cast<int32_t>(OslStringStrcspn(server, ".")));
+  line.by(CxUStringBuffAppendStrN, server, static_cast<int32_t>(OslStringStrcspn(server, ".")));
 }
 
 // Deliberate: the thread is an unsigned 32-bit number, the process has the buffer's unsigned form.
-static void appendProcessAndThread(CxUStringBuff *line, const Record &record) {
+static void appendProcessAndThread(RecordText &line, const Record &record) {
   uint8_t hasProcess = 0, hasThread = 0;
   const int32_t process = QlxGetEventPropLong(record.event, "processId", &hasProcess);
   const int32_t thread = QlxGetEventPropLong(record.event, "threadId", &hasThread);
-  if (hasProcess) {
-    CxUStringBuffAppendUStr(line, u"p");
-    CxUStringBuffAppendInt32(line, process);
-  }
-  if (hasProcess && hasThread) CxUStringBuffAppendUStr(line, u":");
-  if (hasThread) {
-    CxUStringBuffAppendUStr(line, u"t");
-    CxUStringBuffAppendUInt64(line, static_cast<uint32_t>(thread));
-  }
+  if (hasProcess) (line << u"p").by(CxUStringBuffAppendInt32, process);
+  if (hasProcess && hasThread) line << u":";
+  if (hasThread) (line << u"t").by(CxUStringBuffAppendUInt64, static_cast<uint32_t>(thread));
 }
 
-static void appendSource(CxUStringBuff *line, const Record &record) {
+static void appendSource(RecordText &line, const Record &record) {
   const char *file = qlxPeekMapProp(record.event->props, "qlx_prop_srcfile");
   const char *function = qlxPeekMapProp(record.event->props, "qlx_prop_srcfunction");
-  if (file) CxUStringBuffAppendStr(line, file);
-  if (file && function) CxUStringBuffAppendUStr(line, u":");
-  if (function) CxUStringBuffAppendStr(line, function);
+  line << file << (file && function ? u":" : u"") << function;
   uint8_t hasLine = 0;
   const int32_t number = QlxGetEventPropInt(record.event, "qlx_prop_srcline", &hasLine);
-  if (!hasLine) return;
-  CxUStringBuffAppendUStr(line, u"(");
-  CxUStringBuffAppendInt32(line, number);
-  CxUStringBuffAppendUStr(line, u")");
+  if (hasLine) (line << u"(").by(CxUStringBuffAppendInt32, number) << u")";
 }
 
 // An event that has an identifier, be it empty, is not looked at for one.
-static void appendMessageId(CxUStringBuff *line, const Record &record) {
+static void appendMessageId(RecordText &line, const Record &record) {
   const char *own = record.event->messageId;
-  const OwnedStr parsed{own ? nullptr : qlxPDXMLUGetMessageID(record.text)};
-  CxUStringBuffAppendStr(line, own ? own : parsed.get());
+  line << (own ? own : qlxMessageIdOf(record.text).text);
 }
 
-static void appendText(CxUStringBuff *line, const Record &record) {
-  CxUStringBuffAppendUStr(line, record.text);
+static void appendText(RecordText &line, const Record &record) {
+  line << record.text;
 }
 
 // The fields of every line, empty or not, in their order.
-static constexpr void (*kFields[])(CxUStringBuff *line, const Record &record) = {
+static constexpr void (*kFields[])(RecordText &line, const Record &record) = {
     appendTime,   appendLevel,     appendShortHost, appendProcessAndThread,
     appendSource, appendMessageId, appendText,
 };
@@ -108,15 +97,16 @@ UChar *QlxVexTraceUFormatterFFormat(QlxObject *formatter, Event *event, va_list 
   if (formatter->kind3.locale) qlxSetEventLocale(event, formatter->kind3.locale);
   const OwnedUStr text{QlxBindEventUMsg(event, qlxIntlBindUI18Msg, args)};
 
-  CxUStringBuff line{};
+  CxUStringBuff whole{};
+  RecordText line(&whole);
   const UChar *before = u"\x1e";  // a record separator (U+001E), then what stands between fields
   for (const auto append : kFields) {
-    CxUStringBuffAppendUStr(&line, before);
-    append(&line, {formatter, event, text.get()});
+    line << before;
+    append(line, {formatter, event, text.get()});
     before = u" - ";
   }
-  CxUStringBuffAppendUStr(&line, u"\n");
-  return CxUStringBuffTakeUStr(&line);
+  line << u"\n";
+  return CxUStringBuffTakeUStr(&whole);
 }
 
 const ObjClass qlxVexTraceFormatterClass = {

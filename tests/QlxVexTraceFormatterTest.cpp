@@ -5,6 +5,7 @@
 #include <string>
 
 #include "QlxLocked.h"
+#include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"
 #include "support/ResourceBundles.h"
 #include "support/Take.h"
@@ -249,6 +250,26 @@ TEST_F(VexTraceFormatterTest, NoFormatterNoEventNoLine) {
   EXPECT_EQ(QlxVexTraceUFormatterFFormat(nullptr, event.get(), nullptr), nullptr);
   EXPECT_EQ(QlxVexTraceUFormatterFFormat(formatter.get(), nullptr, nullptr), nullptr);
   EXPECT_EQ(QlxVexTraceUFormatterFFormat(logger.get(), event.get(), nullptr), nullptr);
+}
+
+// ---- Without memory
+
+TEST_F(VexTraceFormatterTest, ALineThatLosesAPieceIsNull) {
+  const EventPtr event = makeEvent(std::u16string(9000, u'x').c_str());
+  set(event, "server", "alpha");
+  set(event, "qlx_prop_srcfile", std::string(2000, 'f').c_str());
+  const std::u16string whole = line(event);
+  const std::u16string withoutText = whole.substr(0, whole.find(u'x')) + u"\n";
+  size_t lost = 0;
+  for (uint64_t nth = 1;; ++nth) {
+    FailingMemory memory;
+    memory.failOnce(nth);
+    const std::u16string found = line(event);
+    if (memory.failures() == 0) break;
+    EXPECT_TRUE(found == u"<null>" || found == whole || found == withoutText) << nth;
+    lost += found == u"<null>";
+  }
+  EXPECT_EQ(lost, 3U) << "the first block, and when it grows for the file and for the text";
 }
 
 // ---- A whole host

@@ -64,11 +64,14 @@ class Parser {
     return piece;
   }
 
+  // Around a style there may be blanks.
   bool is(int32_t partIndex, UMessagePatternPartType type, std::u16string_view word) const {
     const Part &part = parts_.getPart(partIndex);
-    const auto start = static_cast<size_t>(part.getIndex());
-    return part.getType() == type &&
-           pattern_.substr(start, static_cast<size_t>(part.getLength())) == word;
+    std::u16string_view text = pattern_.substr(static_cast<size_t>(part.getIndex()),
+                                               static_cast<size_t>(part.getLength()));
+    while (text.starts_with(u' ')) text.remove_prefix(1);
+    while (text.ends_with(u' ')) text.remove_suffix(1);
+    return part.getType() == type && text == word;
   }
 
   // The parts of an argument: its start, number, and, for a simple one, type and style.

@@ -409,7 +409,7 @@ TEST(QlxComposedTest, GeneratedPatternsGiveInEveryLocaleWhatParsingAnewGives) {
       compare(test);
       if (HasFailure()) return;
     }
-  EXPECT_GT(composed, static_cast<int>(locales.size()) * rounds() * 2);
+  EXPECT_GT(composed, static_cast<int>(locales.size()) * rounds());
 }
 
 TEST(QlxComposedTest, EveryNumberIsInEveryLocaleWhatParsingAnewGives) {
@@ -448,17 +448,18 @@ TEST(QlxComposedTest, CommonPatternsAreComposed) {
        {u"{0}", u"} {0}", u"{0} and {1}", u"{1} before {0}", u"{0} {0}",
         u"File {0} has {1,number} bytes", u"{0,number,integer} of {1,number,integer}", u"'{'{0}'}'",
         u"it''s {0}", u"it's {0}", u"l'objet {0} n'est pas l\x00E0", u"{0} 'open",
-        u"{ 0 } { 1 , number }", u"{0}{1}{2}{3}{4}{5}{6}{7}{8}{9}", u"no arguments, it''s",
-        u"\U0001F600{0}\xD800"})
+        u"{ 0 } { 1 , number }", u"{0, number, integer} { 1 , number , integer }",
+        u"{0}{1}{2}{3}{4}{5}{6}{7}{8}{9}", u"no arguments, it''s", u"\U0001F600{0}\xD800"})
     EXPECT_TRUE(isComposed(pattern)) << toUtf8(pattern);
 }
 
 TEST(QlxComposedTest, OtherPatternsAreLeftToIcu) {
   for (const UChar *pattern :
        {u"{1}", u"{0} {2}", u"{0}{1}{2}{3}{4}{5}{6}{7}{8}{9}{10}", u"{0,number,percent}",
-        u"{0,number,#}", u"{0,NUMBER}", u"{0,number,INTEGER}", u"{0,date}", u"{0,time,short}",
-        u"{0,choice,0#a|1#b}", u"{0,plural,other{#}}", u"{0,select,other{x}}", u"{name}",
-        u"{0} {0,number}", u"{0,number} {0,number,integer}", u"{0", u"{}", u"{0,spellout}"})
+        u"{0,number,#}", u"{0,NUMBER}", u"{0,number,INTEGER}", u"{0,number,inte ger}", u"{0,date}",
+        u"{0,time,short}", u"{0,choice,0#a|1#b}", u"{0,plural,other{#}}", u"{0,select,other{x}}",
+        u"{name}", u"{0} {0,number}", u"{0,number} {0,number,integer}", u"{0", u"{}",
+        u"{0,spellout}"})
     EXPECT_FALSE(isComposed(pattern)) << toUtf8(pattern);
 }
 

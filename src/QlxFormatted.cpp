@@ -1,10 +1,12 @@
 #include "QlxFormatted.h"
 
+#include <array>
 #include <utility>
 
 #include <qlx/class/formatter.h>
 #include <qlx/class/handler.h>
 
+#include "QlxI18Msg.h"
 #include "QlxObject.h"
 #include "util/CxUString.h"
 #include "util/CxUnits.h"
@@ -12,13 +14,24 @@
 // A larger one is not kept for all the events after it.
 static constexpr uint32_t kMaxKeptBytes = 64 * 1024;
 
-// Empty while its text is on its way: an event that is logged meanwhile takes a new one.
-static CxUStringBuff gKept;
+// Those that are not in use: of a record and of the message in it. An event that is logged
+// meanwhile takes new ones.
+static std::array<CxUStringBuff, 2> gKept;
 
 // The built-in formatters' operations, and how each appends instead of making a text of its own.
 static QlxAppendEvent appendOf(const QlxObject *formatter) {
-  const auto format = isKind(formatter, Formatter) ? formatter->objClass->op1.fFormat : nullptr;
-  if (format == QlxBasicUFormatterFFormat) return qlxBasicFormatterAppend;
+  struct Row {
+    UChar *(*format)(QlxObject *, Event *, va_list *);
+    QlxAppendEvent append;
+  };
+  static constexpr Row kRows[] = {
+      {QlxBasicUFormatterFFormat, qlxBasicFormatterAppend},
+      {QlxPDXMLUFormatterFFormat, qlxPDXMLFormatterAppend},
+      {QlxVexTraceUFormatterFFormat, qlxVexTraceFormatterAppend},
+  };
+  if (!isKind(formatter, Formatter)) return nullptr;
+  for (const Row &row : kRows)
+    if (formatter->objClass->op1.fFormat == row.format) return row.append;
   return nullptr;
 }
 
@@ -30,16 +43,28 @@ UChar *qlxFormatNew(QlxAppendEvent append, QlxObject *formatter, Event *event, v
 }
 
 void qlxDropFormatted(void) {
-  CxUStringBuffDiscard(&gKept);
+  for (CxUStringBuff &kept : gKept) CxUStringBuffDiscard(&kept);
 }
 
-KeptBuffer::KeptBuffer() : buffer_(std::exchange(gKept, {})) {
+static CxUStringBuff takeKept() {
+  for (CxUStringBuff &kept : gKept)
+    if (kept.data) return std::exchange(kept, {});
+  return {};
+}
+
+KeptBuffer::KeptBuffer() : buffer_(takeKept()) {
   CxUStringBuffRestart(&buffer_);
 }
 
 KeptBuffer::~KeptBuffer() {
-  if (!gKept.data && buffer_.capacity <= kMaxKeptBytes) std::swap(gKept, buffer_);
+  for (CxUStringBuff &kept : gKept)
+    if (!kept.data && buffer_.data && buffer_.capacity <= kMaxKeptBytes) std::swap(kept, buffer_);
   CxUStringBuffDiscard(&buffer_);
+}
+
+BoundText::BoundText(Event *event, va_list *args) {
+  if (event->locale) qlxSetI18MsgLocale(event->message, event->locale);
+  bound_ = qlxIntlBindI18MsgTo(event->message, args, buffer_.get());
 }
 
 // False where there is no text, or where it has to be made in another way.

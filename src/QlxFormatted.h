@@ -17,6 +17,10 @@ typedef uint8_t (*QlxAppendEvent)(QlxObject *formatter, Event *event, va_list *a
 
 uint8_t qlxBasicFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
                                 CxUStringBuff *text);
+uint8_t qlxPDXMLFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
+                                CxUStringBuff *text);
+uint8_t qlxVexTraceFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
+                                   CxUStringBuff *text);
 
 // The same as bytes, as long as all of them are ASCII.
 bool qlxBasicFormatterAppendAscii(QlxObject *formatter, Event *event, va_list *args,
@@ -25,7 +29,7 @@ bool qlxBasicFormatterAppendAscii(QlxObject *formatter, Event *event, va_list *a
 // The text as a formatter class's fFormat gives it: new, or null.
 UChar *qlxFormatNew(QlxAppendEvent append, QlxObject *formatter, Event *event, va_list *args);
 
-// Frees the kept buffer.
+// Frees the kept buffers.
 void qlxDropFormatted(void);
 
 QLX_END_DECLS
@@ -43,6 +47,18 @@ class KeptBuffer {
 
  private:
   CxUStringBuff buffer_;
+};
+
+// The message's text of an event, as qlxIntlBindUI18Msg() binds it.
+class BoundText {
+ public:
+  BoundText(Event *event, va_list *args);
+
+  const UChar *get() const { return bound_ ? buffer_.get()->data : nullptr; }  // null for none
+
+ private:
+  KeptBuffer buffer_;
+  bool bound_;
 };
 
 // The text that a handler's formatter makes of an event. The API lock is held.

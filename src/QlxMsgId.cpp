@@ -8,7 +8,6 @@
 #include <qlx/memory.h>
 
 #include "QlxFormatted.h"
-#include "QlxI18Msg.h"
 #include "util/CxOwned.h"
 
 static MessageId parse(const char *text) {
@@ -41,8 +40,6 @@ char *qlxPDXMLUGetMessageID(const UChar *text) {
 
 void qlxPDXMLUFormatterCacheMessageID(QlxObject *, Event *event, va_list *args) {
   if (!event || event->messageId) return;
-  if (event->locale) qlxSetI18MsgLocale(event->message, event->locale);
-  KeptBuffer text;
-  qlxIntlBindI18MsgTo(event->message, args, text.get());
-  QlxSetEventMessageId(event, qlxMessageIdOf(text.get()->data).text);
+  const BoundText text{event, args};
+  QlxSetEventMessageId(event, qlxMessageIdOf(text.get()).text);
 }

@@ -11,6 +11,7 @@
 
 #include "QlxClasses.h"
 #include "QlxConfigKeys.h"
+#include "QlxFormatted.h"
 #include "QlxHeldFormats.h"
 #include "QlxMsgId.h"
 #include "QlxObject.h"
@@ -165,27 +166,31 @@ static void emitProperty(CxUStringBuff *record, const Event *event, const char *
   if (value) RecordText(record) << start << value << end;
 }
 
-UChar *QlxPDXMLUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {
+uint8_t qlxPDXMLFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
+                                CxUStringBuff *record) {
   PDXMLVars *vars = varsOf(formatter);
-  if (!vars || !event) return nullptr;
+  if (!vars || !event) return 0;
   const bool asMessage = isMessage(vars, event);
   if (formatter->kind3.locale) qlxSetEventLocale(event, formatter->kind3.locale);
-  const OwnedUStr text{QlxBindEventUMsg(event, qlxIntlBindUI18Msg, args)};
+  const BoundText text{event, args};
 
-  CxUStringBuff record{};
-  if (vars->firstRecord) emitProducts(&record, vars, event, 1);
-  emitStart(&record, event, text.get(), asMessage);
-  emitTime(&record, formatter, event->time);
-  emitProducts(&record, vars, event, 0);
-  RecordText(&record) << u" <LogText><![CDATA[" << text.get() << u"]]></LogText>\n";
-  emitFreeAttributes(&record, event);
-  emitOrigin(&record, event, asMessage, args);
-  emitProperty(&record, event, "correlationId", u" <CorrelationId>", u"</CorrelationId>\n");
-  emitProperty(&record, event, "client", u" <Principal>", u"</Principal>\n");
-  RecordText(&record) << (asMessage ? u"</Message>\n" : u"</Trace>\n");
-  UChar *whole = CxUStringBuffTakeUStr(&record);
-  if (whole) vars->firstRecord = 0;  // a lost record leaves its preamble to the next one
-  return whole;
+  if (vars->firstRecord) emitProducts(record, vars, event, 1);
+  emitStart(record, event, text.get(), asMessage);
+  emitTime(record, formatter, event->time);
+  emitProducts(record, vars, event, 0);
+  RecordText(record) << u" <LogText><![CDATA[" << text.get() << u"]]></LogText>\n";
+  emitFreeAttributes(record, event);
+  emitOrigin(record, event, asMessage, args);
+  emitProperty(record, event, "correlationId", u" <CorrelationId>", u"</CorrelationId>\n");
+  emitProperty(record, event, "client", u" <Principal>", u"</Principal>\n");
+  RecordText(record) << (asMessage ? u"</Message>\n" : u"</Trace>\n");
+  if (!record->data) return 0;  // a lost record leaves its preamble to the next one
+  vars->firstRecord = 0;
+  return 1;
+}
+
+UChar *QlxPDXMLUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {
+  return qlxFormatNew(qlxPDXMLFormatterAppend, formatter, event, args);
 }
 
 const ObjClass qlxPDXMLFormatterClass = {

@@ -12,6 +12,7 @@
 #include <qlx/memory.h>
 
 #include "QlxClasses.h"
+#include "QlxFormatted.h"
 #include "QlxHeldFormats.h"
 #include "QlxMsgId.h"
 #include "QlxObject.h"
@@ -92,13 +93,12 @@ static constexpr void (*kFields[])(RecordText &line, const Record &record) = {
     appendSource, appendMessageId, appendText,
 };
 
-UChar *QlxVexTraceUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {
-  if (!isKind(formatter, Formatter) || !event) return nullptr;
+uint8_t qlxVexTraceFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
+                                   CxUStringBuff *record) {
+  if (!isKind(formatter, Formatter) || !event) return 0;
   if (formatter->kind3.locale) qlxSetEventLocale(event, formatter->kind3.locale);
-  const OwnedUStr text{QlxBindEventUMsg(event, qlxIntlBindUI18Msg, args)};
-
-  CxUStringBuff whole{};
-  RecordText line(&whole);
+  const BoundText text{event, args};
+  RecordText line(record);
   const UChar *before = u"\x1e";  // a record separator (U+001E), then what stands between fields
   for (const auto append : kFields) {
     line << before;
@@ -106,7 +106,11 @@ UChar *QlxVexTraceUFormatterFFormat(QlxObject *formatter, Event *event, va_list 
     before = u" - ";
   }
   line << u"\n";
-  return CxUStringBuffTakeUStr(&whole);
+  return record->data != nullptr;
+}
+
+UChar *QlxVexTraceUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {
+  return qlxFormatNew(qlxVexTraceFormatterAppend, formatter, event, args);
 }
 
 const ObjClass qlxVexTraceFormatterClass = {

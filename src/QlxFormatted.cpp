@@ -98,6 +98,12 @@ FormattedBytes::FormattedBytes(QlxObject *handler, Event *event, va_list *args) 
 }
 
 void FormattedBytes::narrow(const FormattedEvent &text) {
+  line_.clear();
+  if (cxUStringDefaultIsUtf8() && line_.append(text.text(), text.length())) {
+    data_ = line_.data();
+    length_ = line_.length();
+    return;
+  }
   own_.reset(CxUStringDupUCharToStr(text.text()));
   data_ = own_.get();
   length_ = OslStringLen(data_);

@@ -4,6 +4,7 @@
 #include "QlxHeldFormats.h"
 
 #include <algorithm>
+#include <array>
 #include <cstring>
 
 #include <unicode/putil.h>
@@ -25,10 +26,18 @@ struct BundleKey {
 static constexpr const char *BundleKey::*kKeyTexts[] = {&BundleKey::name, &BundleKey::locale,
                                                         &BundleKey::defaultLocale};
 
+// What the scan of a pattern found; patterns stay where they are while their bundle is held.
+struct Scan {
+  const UChar *pattern;
+  bool readable;
+  ArgTypes types;
+};
+
 struct HeldBundle {
   UResourceBundle *bundle;  // null: a free place, all zero
   BundleKey key;            // with copies of the texts, owned
   uint64_t lastUse;         // larger is later
+  std::array<Scan, 16> scans;
 };
 
 static constexpr int kMaxHeldBundles = 16;
@@ -100,7 +109,9 @@ static void hold(const BundleKey &key, icu::LocalUResourceBundlePointer &bundle)
   if (!whole) return freeTexts(copy);
   HeldBundle &place = *std::ranges::min_element(gBundles, {}, &HeldBundle::lastUse);
   drop(place);
-  place = {bundle.orphan(), copy, ++gUses};
+  place.bundle = bundle.orphan();
+  place.key = copy;
+  place.lastUse = ++gUses;
 }
 
 // The text ends at its first zero, where it has one.
@@ -112,26 +123,26 @@ static std::u16string_view lookUp(const UResourceBundle *bundle, const char *key
   return {pattern, cxUnitsLength(pattern)};
 }
 
+// Calls use(held bundle or null, pattern); not at all when the bundle cannot be opened.
 template <typename Use>
 static void withPattern(const MessageName &message, UErrorCode *status, Use use) {
   checkDataDirectory();
   const BundleKey key{message.bundle, message.locale, uloc_getDefault()};
   if (HeldBundle *held = find(key)) {
     held->lastUse = ++gUses;
-    return use(lookUp(held->bundle, message.key, status));
+    return use(held, lookUp(held->bundle, message.key, status));
   }
   icu::LocalUResourceBundlePointer fresh = open(message.bundle, message.locale, status);
   if (U_FAILURE(*status)) return;
-  const UResourceBundle *bundle = fresh.getAlias();
+  use(nullptr, lookUp(fresh.getAlias(), message.key, status));
   hold(key, fresh);
-  use(lookUp(bundle, message.key, status));
 }
 
 uint32_t qlxAppendBundleMessage(CxUStringBuff *text, const MessageName &message, va_list *args,
                                 UErrorCode *status) {
   const HeldFormatsLock lock;
   uint32_t appended = 0;
-  withPattern(message, status, [&](std::u16string_view pattern) {
+  withPattern(message, status, [&](HeldBundle *, std::u16string_view pattern) {
     if (U_SUCCESS(*status)) {
       appended = qlxIntlAppendHeldMessage(text, message.locale, pattern, args, status);
     }
@@ -139,12 +150,22 @@ uint32_t qlxAppendBundleMessage(CxUStringBuff *text, const MessageName &message,
   return appended;
 }
 
+static const Scan &scanOf(HeldBundle *held, const UChar *pattern, Scan *room) {
+  const size_t place = reinterpret_cast<uintptr_t>(pattern) / sizeof(uint64_t);
+  Scan &scan = held ? held->scans[place % held->scans.size()] : *room;
+  if (scan.pattern == pattern) return scan;
+  scan.pattern = pattern;
+  scan.readable = qlxScanPatternTypes(pattern, &scan.types);
+  return scan;
+}
+
 bool qlxScanBundlePattern(const MessageName &message, ArgTypes *types) {
   const HeldFormatsLock lock;
   UErrorCode status = U_ZERO_ERROR;
-  bool scanned = false;
-  withPattern(message, &status, [&](std::u16string_view pattern) {
-    scanned = U_SUCCESS(status) && qlxScanPatternTypes(pattern.data(), types);
+  Scan room{};
+  withPattern(message, &status, [&](HeldBundle *held, std::u16string_view pattern) {
+    if (U_SUCCESS(status)) room = scanOf(held, pattern.data(), &room);
   });
-  return scanned;
+  *types = room.types;
+  return room.readable;
 }

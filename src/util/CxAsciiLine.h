@@ -14,6 +14,8 @@ class CxAsciiLine {
   const char *data() const { return bytes_.data(); }
   uint32_t length() const { return static_cast<uint32_t>(length_); }
 
+  void clear() { length_ = 0; }
+
   bool append(std::string_view text) {
     if (text.size() > room() || !cxCopyAscii(end(), text.data(), text.size())) return false;
     length_ += text.size();

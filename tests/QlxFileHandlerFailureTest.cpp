@@ -84,7 +84,7 @@ TEST_F(FileHandlerTest, SurvivesEveryFailedAllocationOfAnEvent) {
   set("maxFileBytes", "20");
   formatter->header = "head\n";
   formatter->trailer = "tail\n";
-  const std::u16string texts[] = {u"short", std::u16string(3000, u'x')};
+  const std::u16string texts[] = {u"short", std::u16string(5000, u'x')};
   for (const std::u16string &text : texts) {
     for (uint64_t nth = 1, failures = 1; failures > 0; ++nth) {
       FailingMemory memory;
@@ -99,12 +99,12 @@ TEST_F(FileHandlerTest, SurvivesEveryFailedAllocationOfAnEvent) {
 
 TEST_F(FileHandlerTest, TellsOfARecordThatItCouldNotNarrow) {
   FailingMemory memory;
-  log(std::u16string(3000, u'x').c_str());
+  log(std::u16string(5000, u'x').c_str());
   const uint64_t all = memory.attempts();
   std::vector<CxStatus> failed;
   for (uint64_t nth = 1; nth <= all; ++nth) {
     memory.failOnce(nth);
-    if (const CxStatus status = logged(std::u16string(3000, u'x').c_str()); status.kind == 'p') {
+    if (const CxStatus status = logged(std::u16string(5000, u'x').c_str()); status.kind == 'p') {
       failed.push_back(status);
     }
   }

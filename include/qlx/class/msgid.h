@@ -1,7 +1,8 @@
 /**
  * @file
- * Message identifiers of events, for class operations. No lock is taken; a returned string is new
- * and the caller frees it with OslMemoryFree().
+ * Message identifiers of events, for class operations. The API lock is held, except where a
+ * function says that it needs none. A returned string is new; the caller frees it with
+ * OslMemoryFree().
  */
 #ifndef QLX_CLASS_MSGID_H
 #define QLX_CLASS_MSGID_H
@@ -10,10 +11,10 @@
 
 QLX_BEGIN_DECLS
 
-/** @return the identifier that the text starts with, or null; null for null */
+/** @return the identifier that the text starts with, or null; null for null. Needs no lock. */
 QLX_API char *qlxPDXMLGetMessageID(const char *text);
 
-/** @return the identifier that the text starts with, or null; null for null */
+/** @return the identifier that the text starts with, or null; null for null. Needs no lock. */
 QLX_API char *qlxPDXMLUGetMessageID(const UChar *text);
 
 /**

@@ -178,7 +178,8 @@ static uint32_t append(CxUStringBuff *text, const UMessageFormat *format,
 
 bool qlxIsPlainPattern(const UChar *pattern, size_t length) {
   return !cxAnyUnit(pattern, length, [](auto units) {
-    return (units == u'{') | (units == u'}') | (units == u'\'');
+    constexpr uint16_t kOpen = u'{', kClose = u'}', kQuote = u'\'';
+    return (units == kOpen) | (units == kClose) | (units == kQuote);
   });
 }
 

@@ -13,7 +13,8 @@ QLX_BEGIN_DECLS
 typedef struct QlxFileWatch {
   uint8_t watching;     // 1: what follows holds, and a change is told
   uint8_t looks;        // at the path since the file was opened, as far as they are counted
-  int32_t watchNumber;  // of the file itself
+  uint8_t starts;       // of the watch, or tries, in the second of the last look
+  int32_t watchNumber;  // of the file itself; not above 0: none
   uint32_t changesSeen;
   int64_t lastLook;  // seconds
 } QlxFileWatch;

@@ -1,0 +1,762 @@
+#include "QlxFileWatch.h"
+
+#include <atomic>
+#include <cstring>
+#include <fcntl.h>
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <string>
+#include <thread>
+
+#include <linux/capability.h>
+#include <sched.h>
+#include <sys/epoll.h>
+#include <sys/mount.h>
+#include <sys/resource.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include "support/Child.h"
+#include "support/FileHandlerTest.h"
+#include "support/WorkingDir.h"
+
+namespace fs = std::filesystem;
+
+namespace {
+
+constexpr int kUntilWatched = 12;  // events
+
+// The descriptors of this process that have a kind of anonymous file, such as "inotify".
+std::vector<int> descriptorsOf(const std::string &kind) {
+  std::vector<int> found;
+  for (const auto &entry : fs::directory_iterator("/proc/self/fd")) {
+    std::error_code gone;
+    const std::string target = fs::read_symlink(entry.path(), gone).string();
+    if (target.find("anon_inode:" + kind) == 0 || target.find("anon_inode:[" + kind) == 0) {
+      found.push_back(std::stoi(entry.path().filename().string()));
+    }
+  }
+  return found;
+}
+
+size_t openDescriptors() {
+  const fs::directory_iterator all("/proc/self/fd");
+  return static_cast<size_t>(std::distance(begin(all), end(all)));
+}
+
+off_t sizeOf(int file) {
+  struct stat info {};
+  EXPECT_EQ(fstat(file, &info), 0);
+  return info.st_size;
+}
+
+class FileWatchTest : public FileHandlerTest {
+ protected:
+  static constexpr const char *kName = "a/b/c/app.log";
+
+  void logTimes(int count) {
+    for (int i = 0; i < count; ++i) log(u"steady");
+  }
+
+  // Logs to a path until it is watched.
+  void watchPath(const std::string &path) {
+    set("fileName", path);
+    logTimes(kUntilWatched);
+    ASSERT_EQ(vars()->watch.watching, 1);
+  }
+  void watchFile(const std::string &name = kName) { watchPath(dir.path(name)); }
+
+  // The second handler, after the first one, on the same file or another.
+  Handle attachSecond(const std::string &name) {
+    Handle second = attach("second", "qlx_filehandler");
+    format(second);
+    QlxSetObjProp(second.get(), "fileName", dir.path(name).c_str());
+    return second;
+  }
+  static QlxFileWatch &watchOf(const Handle &object) {
+    return static_cast<QlxFileHandlerVars *>(object->vars)->watch;
+  }
+
+  // What the file has after one more event; "-" when there is none.
+  std::string next(const std::string &name = kName) {
+    log(u"next");
+    return fs::is_regular_file(dir.path(name)) ? dir.read(name) : "-";
+  }
+
+  bool finds(const std::string &name = kName) {
+    const ApiLock lock;
+    return qlxFileWatchFindsFile(&vars()->watch, dir.path(name).c_str());
+  }
+};
+
+// ---- Changes of where the name leads
+
+struct Change {
+  const char *name;
+  std::function<void(const TempDir &dir)> make;
+};
+
+void move(const TempDir &dir, const char *from, const char *to) {
+  fs::rename(dir.path(from), dir.path(to));
+}
+
+void exchange(const TempDir &dir, const char *from, const char *to) {
+  EXPECT_EQ(
+      renameat2(AT_FDCWD, dir.path(from).c_str(), AT_FDCWD, dir.path(to).c_str(), RENAME_EXCHANGE),
+      0);
+}
+
+const Change kChanges[] = {
+    {"Unlink", [](const TempDir &dir) { fs::remove(dir.path("a/b/c/app.log")); }},
+    {"RenameOfTheFile", [](const TempDir &dir) { move(dir, "a/b/c/app.log", "a/b/c/old.log"); }},
+    {"MoveToAnotherDirectory", [](const TempDir &dir) { move(dir, "a/b/c/app.log", "old.log"); }},
+    {"RenameOfItsDirectory", [](const TempDir &dir) { move(dir, "a/b/c", "a/b/old"); }},
+    {"RenameOfTheDirectoryAbove", [](const TempDir &dir) { move(dir, "a/b", "a/old"); }},
+    {"RenameOfTheTopDirectory", [](const TempDir &dir) { move(dir, "a", "old"); }},
+    {"RemovalOfTheTree", [](const TempDir &dir) { fs::remove_all(dir.path("a")); }},
+    {"ExchangeOfItsDirectory",
+     [](const TempDir &dir) {
+       fs::create_directory(dir.path("other"));
+       exchange(dir, "a/b/c", "other");
+     }},
+    {"ExchangeOfADirectoryAbove",
+     [](const TempDir &dir) {
+       fs::create_directory(dir.path("other"));
+       exchange(dir, "other", "a");
+     }},
+    {"ALinkInPlaceOfItsDirectory",
+     [](const TempDir &dir) {
+       move(dir, "a/b/c", "old");
+       fs::create_directory(dir.path("other"));
+       fs::create_directory_symlink(dir.path("other"), dir.path("a/b/c"));
+     }},
+    {"UnlinkWhileAnotherNameStays",
+     [](const TempDir &dir) {
+       fs::create_hard_link(dir.path("a/b/c/app.log"), dir.path("other.log"));
+       fs::remove(dir.path("a/b/c/app.log"));
+     }},
+    {"UnlinkInAnotherThread",
+     [](const TempDir &dir) {
+       std::thread([&] { fs::remove(dir.path("a/b/c/app.log")); }).join();
+     }},
+    {"UnlinkInAnotherProcess",
+     [](const TempDir &dir) {
+       Child child([&] { fs::remove(dir.path("a/b/c/app.log")); });
+       EXPECT_EQ(child.end(), 0);
+     }},
+};
+
+class FileWatchChangeTest : public FileWatchTest, public ::testing::WithParamInterface<Change> {};
+
+INSTANTIATE_TEST_SUITE_P(Changes, FileWatchChangeTest, ::testing::ValuesIn(kChanges),
+                         [](const auto &tested) { return tested.param.name; });
+
+TEST_P(FileWatchChangeTest, MakesTheVeryNextEventMakeTheFileAgain) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  GetParam().make(dir);
+  EXPECT_EQ(next(), "next\n");
+}
+
+TEST_P(FileWatchChangeTest, IsNoticedTwiceInARow) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  GetParam().make(dir);
+  log(u"again");
+  logTimes(kUntilWatched);
+  fs::remove(dir.path(kName));
+  EXPECT_EQ(next(), "next\n");
+}
+
+// Things that take the name and are no regular file.
+const Change kReplacements[] = {
+    {"ADirectory",
+     [](const TempDir &dir) {
+       fs::remove(dir.path("a/b/c/app.log"));
+       fs::create_directory(dir.path("a/b/c/app.log"));
+     }},
+    {"AFifo",
+     [](const TempDir &dir) {
+       EXPECT_EQ(mkfifo(dir.path("fifo").c_str(), 0600), 0);
+       move(dir, "fifo", "a/b/c/app.log");
+     }},
+    {"ALinkToNothing",
+     [](const TempDir &dir) {
+       fs::create_symlink(dir.path("nothing"), dir.path("link"));
+       move(dir, "link", "a/b/c/app.log");
+     }},
+    {"AnExchangedDirectory",
+     [](const TempDir &dir) {
+       fs::create_directory(dir.path("other"));
+       exchange(dir, "other", "a/b/c/app.log");
+     }},
+};
+
+class FileWatchReplacedTest : public FileWatchTest, public ::testing::WithParamInterface<Change> {};
+
+INSTANTIATE_TEST_SUITE_P(Replacements, FileWatchReplacedTest, ::testing::ValuesIn(kReplacements),
+                         [](const auto &tested) { return tested.param.name; });
+
+TEST_P(FileWatchReplacedTest, EndsTheWritingToTheOldFileWithTheVeryNextEvent) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  const int old = open(dir.path(kName).c_str(), O_RDONLY | O_CLOEXEC);
+  GetParam().make(dir);
+  const off_t size = sizeOf(old);
+  log(u"next");
+  EXPECT_EQ(sizeOf(old), size);
+  ::close(old);
+}
+
+TEST_F(FileWatchTest, GoesOnInTheOpenFileWhenARegularOneTakesItsNameAndSeesThatOneRemoved) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  dir.write("other", "other\n");
+  move(dir, "other", kName);
+  EXPECT_EQ(next(), "other\n");
+  EXPECT_EQ(vars()->watch.watching, 1);
+  fs::remove(dir.path(kName));
+  EXPECT_EQ(next(), "next\n");
+}
+
+TEST_F(FileWatchTest, NoticesWhatHappensToAReplacementThatWasMadeAgainAndAgain) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  for (int i = 0; i < 40; ++i) {
+    dir.write("other", "other\n");
+    move(dir, "other", kName);
+    EXPECT_EQ(next(), "other\n");
+  }
+  move(dir, kName, "old");
+  EXPECT_EQ(next(), "next\n");
+}
+
+TEST_F(FileWatchTest, NoticesADirectoryThatMayNotBeSearchedAnyMore) {
+  Child child([&] {
+    if (geteuid() == 0 && chown(dir.path().c_str(), 65534, 65534) != 0) _exit(77);
+    if (geteuid() == 0 && setresuid(65534, 65534, 65534) != 0) _exit(77);
+    if (access(dir.path().c_str(), W_OK) != 0) _exit(77);
+    for (const char *directory : {"a", "a/b", "a/b/c"}) {
+      set("dirPermission", "755");
+      ASSERT_NO_FATAL_FAILURE(watchFile());
+      const std::string before = dir.read(kName);
+      ASSERT_EQ(chmod(dir.path(directory).c_str(), 0), 0);
+      EXPECT_EQ(logged(u"lost").code, EACCES) << directory;
+      ASSERT_EQ(chmod(dir.path(directory).c_str(), 0755), 0);
+      EXPECT_EQ(next(), before + "next\n");
+    }
+  });
+  const int status = child.end();
+  if (status == 77) GTEST_SKIP() << "the folder of the tests is not for other users";
+  EXPECT_EQ(status, 0);
+}
+
+// ---- Sizes
+
+TEST_F(FileWatchTest, CountsTheBytesOfOtherWriters) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  Child child([&] { std::ofstream(dir.path(kName), std::ios::app) << "another process\n"; });
+  EXPECT_EQ(child.end(), 0);
+  log(u"next");
+  EXPECT_EQ(vars()->size, dir.read(kName).size());
+  EXPECT_EQ(vars()->watch.watching, 1);
+}
+
+TEST_F(FileWatchTest, RollsAFileThatOthersFilled) {
+  set("maxFileBytes", "1000");
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  std::ofstream(dir.path(kName), std::ios::app) << std::string(1000, 'x');
+  EXPECT_EQ(next(), "next\n");
+  EXPECT_EQ(dir.read("a/b/c/app1.log").size(), kUntilWatched * 7 + 1000U);
+}
+
+TEST_F(FileWatchTest, SeesAFileThatWasEmptied) {
+  set("maxFileBytes", "1000");
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  ASSERT_EQ(truncate(dir.path(kName).c_str(), 0), 0);
+  EXPECT_EQ(next(), "next\n");
+  EXPECT_EQ(vars()->size, 5U);
+  dir.write(kName, "");
+  EXPECT_EQ(next(), "next\n");
+  EXPECT_EQ(vars()->size, 5U);
+}
+
+TEST_F(FileWatchTest, NoticesARemovalAfterEachRollover) {
+  set("maxFileBytes", "200");
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  for (int i = 0; i < 3; ++i) {
+    fs::remove(dir.path("a/b/c/app1.log"));
+    while (!dir.has("a/b/c/app1.log")) log(u"steady");
+    logTimes(kUntilWatched);
+    ASSERT_EQ(vars()->watch.watching, 1);
+    fs::remove(dir.path(kName));
+    EXPECT_EQ(next(), "next\n");
+  }
+}
+
+TEST_F(FileWatchTest, RollsWhatAHandlerInAnotherProcessFilled) {
+  set("maxFileBytes", "200");
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  Child child([&] { logTimes(kUntilWatched + 5); });  // to 203 bytes
+  EXPECT_EQ(child.end(), 0);
+  EXPECT_EQ(next(), "next\n");
+  EXPECT_EQ(dir.read("a/b/c/app1.log").size(), 203U);
+}
+
+// ---- Two handlers
+
+TEST_F(FileWatchTest, TellsEachOfTwoHandlersWhenTheOtherTakesTheNotice) {
+  const Handle second = attachSecond("a/b/second.log");
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  ASSERT_EQ(watchOf(second).watching, 1);
+  fs::remove(dir.path(kName));
+  fs::remove(dir.path("a/b/second.log"));
+  EXPECT_EQ(next(), "next\n");
+  EXPECT_EQ(dir.read("a/b/second.log"), "next\n");
+}
+
+TEST_F(FileWatchTest, StaysWithOneHandlerWhenAnotherOnTheSameFileCloses) {
+  const Handle second = attachSecond(kName);
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  ASSERT_EQ(watchOf(second).watching, 1);
+  QlxRemListener(logger.get(), second.get());
+  QlxSetObjProp(second.get(), "maxFiles", "9");  // closes the file
+  ASSERT_EQ(watchOf(second).watching, 0);
+  logTimes(3);
+  EXPECT_EQ(vars()->watch.watching, 1);
+  fs::remove(dir.path(kName));
+  EXPECT_EQ(next(), "next\n");
+}
+
+TEST_F(FileWatchTest, StaysWithADirectoryThatTakesTheNameOfAnothersFile) {
+  const Handle second = attachSecond("a/name");
+  logTimes(kUntilWatched);
+  ASSERT_EQ(watchOf(second).watching, 1);
+  QlxRemListener(logger.get(), second.get());
+  fs::remove(dir.path("a/name"));
+  ASSERT_NO_FATAL_FAILURE(watchFile("a/name/b/c/app.log"));
+  ASSERT_EQ(qlxFileWatchFindsFile(&watchOf(second), dir.path("a/name").c_str()), false);
+  move(dir, "a/name/b", "old");
+  EXPECT_EQ(next("a/name/b/c/app.log"), "next\n");
+}
+
+TEST_F(FileWatchTest, NoticesWhatWasLostInTooManyNotices) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  std::ifstream limit("/proc/sys/fs/inotify/max_queued_events");
+  int most = 0;
+  limit >> most;
+  if (most == 0 || most > 100000) GTEST_SKIP() << "no small limit of notices";
+  for (const char *name : {"x", "y"}) dir.write(std::string("a/") + name, "");
+  for (int i = 0; i <= most / 2; ++i) {  // a notice for each of two names
+    move(dir, "a/x", "a/z");
+    move(dir, "a/y", "a/x");
+    move(dir, "a/z", "a/y");
+  }
+  fs::remove(dir.path(kName));
+  EXPECT_EQ(next(), "next\n");
+  EXPECT_EQ(vars()->watch.watching, 0);  // a new file
+}
+
+TEST_F(FileWatchTest, GivesBackWatchesThatNobodyNeeds) {
+  QlxFileWatch watch{};
+  for (int i = 0; i < 1200; ++i) {
+    const std::string name = "many/" + std::to_string(i) + "/own/app.log";
+    fs::create_directories(fs::path(dir.path(name)).parent_path());
+    dir.write(name, "");
+    const ApiLock lock;
+    for (int look = 0; look < kUntilWatched; ++look) {
+      ASSERT_TRUE(qlxFileWatchFindsFile(&watch, dir.path(name).c_str()));
+    }
+    ASSERT_EQ(watch.watching, 1);
+    if (i < 1199) qlxFileWatchEnd(&watch);
+  }
+  const std::vector<int> notices = descriptorsOf("inotify");
+  ASSERT_EQ(notices.size(), 1U);
+  std::ifstream info("/proc/self/fdinfo/" + std::to_string(notices[0]));
+  const std::string all{std::istreambuf_iterator<char>(info), {}};
+  size_t watches = 0;
+  for (size_t at = 0; (at = all.find("inotify wd:", at)) != std::string::npos; ++at) ++watches;
+  EXPECT_GT(watches, 2U);
+  EXPECT_LT(watches, 1100U);
+  const ApiLock lock;
+  move(dir, "many/1199", "old");
+  EXPECT_FALSE(qlxFileWatchFindsFile(&watch, dir.path("many/1199/own/app.log").c_str()));
+  qlxFileWatchEnd(&watch);
+}
+
+TEST_F(FileWatchTest, KeepsNoWatchOfFilesThatWereMovedAway) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  const auto watches = [] {
+    std::ifstream info("/proc/self/fdinfo/" + std::to_string(descriptorsOf("inotify").at(0)));
+    const std::string all{std::istreambuf_iterator<char>(info), {}};
+    return std::count(all.begin(), all.end(), '\n');
+  };
+  const auto before = watches();
+  for (int i = 0; i < 5; ++i) {
+    move(dir, kName, ("old" + std::to_string(i)).c_str());
+    logTimes(kUntilWatched);
+    ASSERT_EQ(vars()->watch.watching, 1);
+  }
+  EXPECT_EQ(watches(), before);
+}
+
+// ---- Paths
+
+TEST_F(FileWatchTest, TakesPathsWithDotsAndRepeatedSeparators) {
+  for (const char *name : {"a/b/../b/c/app.log", "a//b///c//app.log", "a/./b/c/./app.log",
+                           "a/b/c/d/../../c/app.log"}) {
+    SCOPED_TRACE(name);
+    fs::create_directories(dir.path("a/b/c/d"));
+    ASSERT_NO_FATAL_FAILURE(watchFile(name));
+    fs::remove(dir.path(kName));
+    EXPECT_EQ(next(), "next\n");
+    logTimes(kUntilWatched);
+    ASSERT_EQ(vars()->watch.watching, 1);
+    move(dir, "a/b", "old");
+    fs::create_directories(dir.path("a/b/c/d"));
+    EXPECT_EQ(next(), "next\n");
+    fs::remove_all(dir.path("old"));
+    fs::remove_all(dir.path("a"));
+  }
+}
+
+TEST_F(FileWatchTest, NoticesWhenADirectoryThatAPathOnlyPassesIsGone) {
+  fs::create_directories(dir.path("x/y"));
+  ASSERT_NO_FATAL_FAILURE(watchFile("x/y/../app.log"));
+  const int old = open(dir.path("x/app.log").c_str(), O_RDONLY | O_CLOEXEC);
+  move(dir, "x/y", "old");
+  EXPECT_FALSE(finds("x/y/../app.log"));
+  ::close(old);
+}
+
+TEST_F(FileWatchTest, LooksAtARelativePathEveryTime) {
+  fs::create_directory(dir.path("one"));
+  fs::create_directory(dir.path("two"));
+  dir.write("one/app.log", "");
+  const WorkingDir back(dir.path("one"));
+  const ApiLock lock;
+  QlxFileWatch watch{};
+  for (int i = 0; i < kUntilWatched; ++i) EXPECT_TRUE(qlxFileWatchFindsFile(&watch, "app.log"));
+  EXPECT_EQ(watch.watching, 0);
+  ASSERT_EQ(chdir(dir.path("two").c_str()), 0);
+  EXPECT_FALSE(qlxFileWatchFindsFile(&watch, "app.log"));
+}
+
+TEST_F(FileWatchTest, KeepsToTheDirectoryInWhichARelativeNameWasSet) {
+  fs::create_directory(dir.path("one"));
+  fs::create_directory(dir.path("two"));
+  const WorkingDir back(dir.path("one"));
+  ASSERT_NO_FATAL_FAILURE(watchPath("app.log"));
+  ASSERT_EQ(chdir(dir.path("two").c_str()), 0);
+  log(u"steady");
+  EXPECT_FALSE(dir.has("two/app.log"));
+  fs::remove(dir.path("one/app.log"));
+  EXPECT_EQ(next("one/app.log"), "next\n");
+}
+
+TEST_F(FileWatchTest, LooksAtAPathWithALinkEveryTime) {
+  fs::create_directories(dir.path("one/sub"));
+  fs::create_directories(dir.path("two/sub"));
+  fs::create_directory_symlink(dir.path("one"), dir.path("link"));
+  set("fileName", dir.path("link/sub/app.log"));
+  logTimes(kUntilWatched);
+  EXPECT_EQ(vars()->watch.watching, 0);
+  fs::create_directory_symlink(dir.path("two"), dir.path("new"));
+  move(dir, "new", "link");
+  EXPECT_EQ(next("two/sub/app.log"), "next\n");
+}
+
+TEST_F(FileWatchTest, LooksAtALinkToAFileEveryTime) {
+  dir.write("one.log", "");
+  fs::create_symlink(dir.path("one.log"), dir.path("app.log"));
+  set("fileName", dir.path("app.log"));
+  logTimes(kUntilWatched);
+  EXPECT_EQ(vars()->watch.watching, 0);
+  fs::create_symlink(dir.path("two.log"), dir.path("new"));
+  move(dir, "new", "app.log");
+  EXPECT_EQ(next("two.log"), "next\n");
+}
+
+TEST_F(FileWatchTest, IsNotWorthTheSetUpForAFewEvents) {
+  logTimes(8);
+  EXPECT_EQ(vars()->watch.watching, 0);
+  EXPECT_TRUE(descriptorsOf("inotify").empty());
+}
+
+// A file system of the child's own; false where the system does not allow that.
+bool mountOwn(const std::string &directory) {
+  const uid_t user = geteuid();
+  const gid_t group = getegid();
+  if (unshare(CLONE_NEWUSER | CLONE_NEWNS) != 0) return false;
+  std::ofstream("/proc/self/setgroups") << "deny";
+  std::ofstream("/proc/self/uid_map") << "0 " << user << " 1";
+  std::ofstream("/proc/self/gid_map") << "0 " << group << " 1";
+  return mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0 &&
+         mount("own", directory.c_str(), "tmpfs", 0, "mode=755") == 0;
+}
+
+TEST_F(FileWatchTest, NoticesChangesOfAFileInTheRootItself) {
+  Child child([&] {
+    if (!mountOwn(dir.path()) || chroot(dir.path().c_str()) != 0) _exit(77);
+    ASSERT_NO_FATAL_FAILURE(watchPath("/app.log"));
+    ASSERT_EQ(unlink("/app.log"), 0);
+    log(u"next");
+    const int file = open("/app.log", O_RDONLY | O_CLOEXEC);
+    ASSERT_NE(file, -1);
+    EXPECT_EQ(sizeOf(file), 5);
+  });
+  const int status = child.end();
+  if (status == 77) GTEST_SKIP() << "no file system of its own";
+  EXPECT_EQ(status, 0);
+}
+
+TEST_F(FileWatchTest, NoticesChangesOfADirectoryThatIsMounted) {
+  Child child([&] {
+    if (!mountOwn(dir.path())) _exit(77);
+    ASSERT_NO_FATAL_FAILURE(watchFile("app.log"));
+    __user_cap_header_struct header{_LINUX_CAPABILITY_VERSION_3, 0};
+    const __user_cap_data_struct none[2] = {};
+    ASSERT_EQ(syscall(SYS_capset, &header, none), 0);  // rights count now
+    ASSERT_EQ(chmod(dir.path().c_str(), 0), 0);
+    EXPECT_EQ(logged(u"lost").code, EACCES);
+  });
+  const int status = child.end();
+  if (status == 77) GTEST_SKIP() << "no file system of its own";
+  EXPECT_EQ(status, 0);
+}
+
+// ---- Time
+
+TEST_F(FileWatchTest, LooksOnceASecondWhereNoNoticeComes) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  fs::remove(dir.path(kName));
+  std::array<char, 4096> stolen;
+  ASSERT_GT(read(descriptorsOf("inotify").at(0), stolen.data(), stolen.size()), 0);
+  vars()->watch.lastLook -= 1;
+  EXPECT_EQ(next(), "next\n");
+}
+
+// ---- Processes
+
+TEST_F(FileWatchTest, TellsAChildAndItsParentAlike) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  Signal removed;
+  Child child([&] {
+    removed.await();
+    EXPECT_FALSE(finds());
+  });
+  fs::remove(dir.path(kName));
+  removed.give();
+  EXPECT_EQ(child.end(), 0);
+  EXPECT_FALSE(finds());
+}
+
+TEST_F(FileWatchTest, WatchesInAChildAsInItsParent) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  Child child([&] {
+    log(u"child");
+    EXPECT_EQ(vars()->watch.watching, 1);
+    fs::remove(dir.path(kName));
+    EXPECT_EQ(next(), "next\n");
+  });
+  EXPECT_EQ(child.end(), 0);
+  fs::remove(dir.path(kName));
+  EXPECT_EQ(next(), "next\n");
+}
+
+// ---- Descriptors
+
+TEST_F(FileWatchTest, GoesOnAfterAHostClosedAllDescriptors) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  Child child([&] {
+    logTimes(1);
+    ASSERT_EQ(vars()->watch.watching, 1);
+    ASSERT_EQ(close_range(3, ~0U, 0), 0);
+    log(u"first");
+    logTimes(kUntilWatched);
+    EXPECT_EQ(vars()->watch.watching, 1);
+    fs::remove(dir.path(kName));
+    log(u"last");
+  });
+  EXPECT_EQ(child.end(), 0);
+  EXPECT_EQ(dir.read(kName), "last\n");
+}
+
+TEST_F(FileWatchTest, LosesNoEventWhenAHostClosedAllDescriptors) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  const std::string before = dir.read(kName);
+  Child child([&] {
+    log(u"watched");
+    ASSERT_EQ(close_range(3, ~0U, 0), 0);
+    log(u"one");
+    log(u"two");
+  });
+  EXPECT_EQ(child.end(), 0);
+  EXPECT_EQ(dir.read(kName), before + "watched\none\ntwo\n");
+}
+
+TEST_F(FileWatchTest, KeepsOutOfTheNumbersThatFilesGet) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  EXPECT_GE(descriptorsOf("inotify").at(0), 500);
+  EXPECT_GE(descriptorsOf("eventpoll").at(0), 500);
+}
+
+// What a host has put in place of the descriptors: one end of a pair with a byte to read.
+class HostsPair {
+ public:
+  HostsPair() {
+    EXPECT_EQ(socketpair(AF_UNIX, SOCK_STREAM, 0, ends_), 0);
+    EXPECT_EQ(write(ends_[1], "x", 1), 1);
+  }
+  int end() const { return ends_[0]; }
+
+  // Nothing was read from it, and the number is still its.
+  void expectUntouched(int number) const {
+    char byte = 0;
+    EXPECT_EQ(recv(number, &byte, 1, MSG_PEEK | MSG_DONTWAIT), 1);
+    struct stat a {
+    }, b{};
+    EXPECT_EQ(fstat(number, &a), 0);
+    EXPECT_EQ(fstat(ends_[0], &b), 0);
+    EXPECT_EQ(a.st_ino, b.st_ino);
+  }
+
+ private:
+  int ends_[2];
+};
+
+TEST_F(FileWatchTest, LeavesAHostsFilesAloneThatHaveItsNumbers) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  Child child([&] {
+    logTimes(1);
+    const int inotify = descriptorsOf("inotify").at(0);
+    const int epoll = descriptorsOf("eventpoll").at(0);
+    const HostsPair pair;
+    dup2(pair.end(), inotify);
+    dup2(pair.end(), epoll);
+    fs::remove(dir.path(kName));
+    EXPECT_EQ(next(), "next\n");
+    logTimes(kUntilWatched);
+    EXPECT_EQ(vars()->watch.watching, 1);
+    set("maxFiles", "5");  // closes the file
+    pair.expectUntouched(inotify);
+    pair.expectUntouched(epoll);
+  });
+  EXPECT_EQ(child.end(), 0);
+}
+
+TEST_F(FileWatchTest, LeavesAHostsFilesAloneWhenItStops) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  Child child([&] {
+    logTimes(1);
+    const int inotify = descriptorsOf("inotify").at(0);
+    const int epoll = descriptorsOf("eventpoll").at(0);
+    const HostsPair pair;
+    dup2(pair.end(), inotify);
+    dup2(pair.end(), epoll);
+    Child forked([&] {
+      pair.expectUntouched(inotify);
+      pair.expectUntouched(epoll);
+    });
+    EXPECT_EQ(forked.end(), 0);
+    set("maxFiles", "5");  // closes the file
+    handler.reset();
+    logger.reset();
+    QlxCloseToolkit();
+    pair.expectUntouched(inotify);
+    pair.expectUntouched(epoll);
+  });
+  EXPECT_EQ(child.end(), 0);
+}
+
+TEST_F(FileWatchTest, ReadsNothingForAHostsOwnQuestion) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  Child child([&] {
+    logTimes(1);
+    const int inotify = descriptorsOf("inotify").at(0);
+    const int epoll = descriptorsOf("eventpoll").at(0);
+    const HostsPair pair;
+    const int own = epoll_create1(EPOLL_CLOEXEC);
+    epoll_event wanted{.events = EPOLLIN, .data = {.u64 = 1}};
+    dup2(pair.end(), inotify);
+    dup2(own, epoll);
+    ASSERT_EQ(epoll_ctl(epoll, EPOLL_CTL_ADD, inotify, &wanted), 0);
+    fs::remove(dir.path(kName));
+    EXPECT_EQ(next(), "next\n");
+    logTimes(kUntilWatched);
+    EXPECT_EQ(vars()->watch.watching, 1);
+    pair.expectUntouched(inotify);
+    epoll_event ready{};
+    EXPECT_EQ(epoll_wait(epoll, &ready, 1, 0), 1);
+    EXPECT_EQ(ready.data.u64, 1U);
+  });
+  EXPECT_EQ(child.end(), 0);
+}
+
+TEST_F(FileWatchTest, LooksWhereThereAreTooFewDescriptors) {
+  Child child([&] {
+    const rlimit few{100, 100};
+    ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &few), 0);
+    set("fileName", dir.path(kName));
+    log(u"steady");
+    const size_t before = openDescriptors();
+    logTimes(kUntilWatched);
+    EXPECT_EQ(vars()->watch.watching, 0);
+    EXPECT_EQ(openDescriptors(), before);
+    fs::remove(dir.path(kName));
+    EXPECT_EQ(next(), "next\n");
+  });
+  EXPECT_EQ(child.end(), 0);
+}
+
+TEST_F(FileWatchTest, GoesOnAfterItWasStopped) {
+  const size_t before = openDescriptors();
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  EXPECT_EQ(openDescriptors(), before + 3);
+  {
+    const ApiLock lock;
+    qlxFileWatchStop();
+  }
+  EXPECT_EQ(openDescriptors(), before + 1);
+  log(u"again");
+  EXPECT_EQ(vars()->watch.watching, 1);
+  fs::remove(dir.path(kName));
+  EXPECT_EQ(next(), "next\n");
+}
+
+TEST(FileWatchLifeTest, LeavesNoDescriptorWhenTheToolkitIsClosed) {
+  const TempDir dir;
+  const size_t before = openDescriptors();
+  for (int round = 0; round < 3; ++round) {
+    ASSERT_EQ(QlxOpenToolkit(nullptr, nullptr), 1);
+    QlxObject *logger = QlxGetObject("log", "qlx_basiclogger");
+    QlxObject *handler = QlxGetObject("file", "qlx_filehandler");
+    QlxSetObjProp(handler, "fileName", dir.path("app.log").c_str());
+    QlxAddListener(logger, handler);
+    for (int i = 0; i < kUntilWatched; ++i) QlxLogUText(logger, u"text");
+    EXPECT_EQ(static_cast<QlxFileHandlerVars *>(handler->vars)->watch.watching, 1);
+    EXPECT_EQ(openDescriptors(), before + 3);
+    QlxReleaseObject(handler);
+    QlxReleaseObject(logger);
+    QlxCloseToolkit();
+    EXPECT_EQ(openDescriptors(), before);
+  }
+}
+
+// ---- Threads
+
+TEST_F(FileWatchTest, NoticesRemovalsWhileAnotherThreadLogs) {
+  ASSERT_NO_FATAL_FAILURE(watchFile());
+  std::atomic<bool> done{false};
+  std::thread other([&] {
+    while (!done) log(u"other");
+  });
+  for (int i = 0; i < 50; ++i) {
+    std::error_code missing;
+    fs::remove(dir.path(kName), missing);
+    log(u"mine");
+    EXPECT_TRUE(dir.has(kName));
+  }
+  done = true;
+  other.join();
+}
+
+}  // namespace

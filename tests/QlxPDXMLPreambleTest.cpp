@@ -91,6 +91,32 @@ TEST_F(PDXMLPreambleTest, AFileHasItAtEachOpening) {
   EXPECT_EQ(dir.read("app.xml"), preamble + narrow);
 }
 
+// Each file has it, since it is opened by the event that is written to it next. Afterwards what one
+// opening makes due is written once.
+TEST_F(PDXMLPreambleTest, OfHandlersThatShareAFormatterTheOneThatWritesNextHasIt) {
+  const TempDir dir;
+  const Handle handlers[] = {get("first", "qlx_filehandler"), get("second", "qlx_filehandler")};
+  for (const Handle &handler : handlers) {
+    QlxHandlerSetFormatter(handler.get(), formatter_.get());
+    ASSERT_EQ(QlxSetObjProp(handler.get(), "fileName", dir.path(handler->name).c_str()), 1);
+  }
+  configureTo("singleProduct", "true");
+  const EventPtr event = makeEvent();
+  QlxSetEventProp(event.get(), "product", "x");
+  for (int i = 0; i < 2; ++i) {
+    for (const Handle &handler : handlers) {
+      const ApiLock lock;
+      QlxFileUHandlerFProcess(handler.get(), event.get(), nullptr);
+    }
+    resetHeader();
+  }
+  const std::u16string wide = trace();
+  const std::string record(wide.begin(), wide.end());
+  const std::string preamble = " <ProductId>x</ProductId>\n";
+  EXPECT_EQ(dir.read("first"), preamble + record + preamble + record);
+  EXPECT_EQ(dir.read("second"), preamble + record + record);
+}
+
 // ---- Configuration
 
 TEST_F(PDXMLPreambleTest, AFlagWhosePropertyIsGoneIsClear) {

@@ -84,12 +84,19 @@ CxStatus qlxSharedLockTake(QlxFileHandlerVars *vars) {
   return kCxSuccess;  // Deliberate: goes on without the semaphore
 }
 
+// Looks and adds in one step: between two steps another unlock could make it 2. A system that takes
+// one operation at a time gets them in two, for a semaphore that is not given back stops everybody.
+static bool giveBackIfHeld(const QlxFileHandlerVars *vars) {
+  sembuf giveBack = {0, 1, SEM_UNDO};
+  sembuf both[] = {{0, 0, IPC_NOWAIT}, giveBack};
+  if (semop(vars->semId, both, std::size(both)) == 0) return true;
+  return errno != EAGAIN && semctl(vars->semId, 0, GETVAL) == 0 &&
+         semop(vars->semId, &giveBack, 1) == 0;
+}
+
 void qlxMultiProcFileHandlerUnlockSem(QlxFileHandlerVars *vars) {
   if (!vars || vars->semReady != 1) return;
-  // Looks and adds in one step: between two steps another unlock could make it 2.
-  sembuf giveBackIfHeld[] = {{0, 0, IPC_NOWAIT}, {0, 1, SEM_UNDO}};
-  const bool given = semop(vars->semId, giveBackIfHeld, std::size(giveBackIfHeld)) == 0;
-  qlxKeepFailure(nullptr, cxStatusOfCall(given));
+  qlxKeepFailure(nullptr, cxStatusOfCall(giveBackIfHeld(vars)));
 }
 
 uint8_t qlxMultiProcFileHandlerInitSem(QlxFileHandlerVars *vars) {

@@ -385,9 +385,33 @@ TEST_F(SharedLockTest, UnlockLooksAndAddsInOneStep) {
   int steps = 0;
   calls.onOperate = [&steps](const sembuf &, size_t) { return ++steps, 0; };
   calls.onControl = [&steps](int) { return ++steps, 0; };
+  for (int unlocks = 1; unlocks <= 2; ++unlocks) {  // the second finds it free
+    unlock();
+    EXPECT_EQ(steps, unlocks);
+    EXPECT_EQ(key.value(), 1);
+  }
+}
+
+TEST_F(SharedLockTest, UnlockGivesBackAlsoWhereTheSystemTakesOneOperationAtATime) {
+  setUp();
+  calls.onOperate = [](const sembuf &, size_t count) { return count > 1 ? E2BIG : 0; };
+  lock();
   unlock();
-  EXPECT_EQ(steps, 1);
   EXPECT_EQ(key.value(), 1);
+  unlock();
+  EXPECT_EQ(key.value(), 1);
+  raise();
+  unlock();
+  EXPECT_EQ(key.value(), 2);
+}
+
+TEST_F(SharedLockTest, UnlockLeavesASemaphoreAloneThatItCannotRead) {
+  setUp();
+  lock();
+  calls.onOperate = [](const sembuf &, size_t count) { return count > 1 ? E2BIG : 0; };
+  calls.onControl = [](int) { return EACCES; };
+  unlock();
+  EXPECT_EQ(key.value(), 0);
 }
 
 // ---- After giving up. These say what follows, for docs/configuration.md.

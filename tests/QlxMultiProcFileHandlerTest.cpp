@@ -2,6 +2,7 @@
 
 #include <fcntl.h>
 #include <sched.h>
+#include <sys/mman.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -434,10 +435,10 @@ TEST_F(MultiProcFileHandlerTest, IsFullAtExactlyItsLimit) {
 
 TEST_F(MultiProcFileHandlerTest, ReplacesGenerationOneWhenThereAreTwoFiles) {
   rollAlways("2");
-  for (const char16_t *text : {u"1", u"2", u"3"}) {
+  for (const char16_t *text : {u"longest", u"long", u"3"}) {  // nothing of it stays behind the next
     EXPECT_EQ(logged(text), kSuccess);
   }
-  EXPECT_EQ(generations(), "3| 2| - -");
+  EXPECT_EQ(generations(), "3| long| - -");
 }
 
 TEST_F(MultiProcFileHandlerTest, KeepsAsManyGenerationsAsItIsTold) {
@@ -671,6 +672,22 @@ TEST_F(MultiProcFileHandlerTest, ClosesTheCopy) {
   log(u"two");
   EXPECT_EQ(generations(), "two| one| - -");
   EXPECT_EQ(descriptors(), before);
+}
+
+TEST_F(MultiProcFileHandlerTest, TellsOfAFileThatCannotBeEmptiedAndWritesOn) {
+  rollAlways("2");
+  open();
+  const int sealed = memfd_create("sealed", MFD_ALLOW_SEALING);
+  ASSERT_EQ(fcntl(sealed, F_SETFL, O_APPEND), 0);
+  ASSERT_EQ(fcntl(sealed, F_ADD_SEALS, F_SEAL_SHRINK), 0);
+  replaceDescriptor(sealed);
+  log(u"one");
+  EXPECT_EQ(logged(u"two"), failure(EPERM));
+  EXPECT_EQ(dir.read("app1.log"), "one\n");
+  char bytes[16] = {};
+  EXPECT_EQ(pread(vars()->file, bytes, sizeof bytes, 0), 8);
+  EXPECT_STREQ(bytes, "one\ntwo\n");
+  EXPECT_TRUE(semaphoreIsFree());
 }
 
 TEST_F(MultiProcFileHandlerTest, TellsOfAFileThatCannotBeMeasuredAndWritesNowhere) {

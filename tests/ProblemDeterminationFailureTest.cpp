@@ -1,6 +1,6 @@
 // Every allocation of the classes for problem determination fails once, alone and with all after
 // it: a logger that stamps, a filter of message identifiers that suppresses repeats, and trace
-// lines in a file. Afterwards the same configuration works as if nothing had been.
+// lines and XML records in files. Afterwards the same configuration works as if nothing had been.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -43,11 +43,18 @@ filter.className = qlx_msgidfilter
 filter.mode = BLOCK
 filter.msgIds = *I XYZ*
 filter.msgIdRepeatTime = 3600000
-filter.listenerNames = file
+filter.listenerNames = lines records
 trace.className = qlx_vextraceformatter
-file.className = qlx_filehandler
-file.formatterName = trace
-file.fileName = )" + dir_.path("logs/app.log"));
+lines.className = qlx_filehandler
+lines.formatterName = trace
+xml.className = qlx_xmlformatter
+xml.singleServer = true
+xml.dateTimeFormat = '-'
+records.className = qlx_filehandler
+records.formatterName = xml
+records.fileName = )" + dir_.path("logs/app.xml") +
+                                     R"(
+lines.fileName = )" + dir_.path("logs/app.log"));
   }
 
   std::string config() const { return dir_.path("app.properties"); }
@@ -67,8 +74,21 @@ file.fileName = )" + dir_.path("logs/app.log"));
            " -  - ABC0001E - ABC0001E 7 files from home\n";
   }
 
+  // The same of the other file, behind the milliseconds.
+  std::string expectedRecordRest() const {
+    return "\">-</Time>\n <ProductId>Quill</ProductId>\n"
+           " <LogText><![CDATA[ABC0001E 7 files from home]]></LogText>\n"
+           " <LogAttribs><Key>organization</Key><Value>Org</Value></LogAttribs>\n"
+           " <TranslationInfo Resource Bundle=\"" +
+           bundles_.path() +
+           "\" MsgKey=\"copied\"><Param><![CDATA[home]]></Param><Param><![CDATA[7]]></Param>"
+           "</TranslationInfo>\n</Message>\n";
+  }
+
   void expectWorking() const {
-    std::filesystem::remove(dir_.path("logs/app.log"));
+    for (const char *file : {"logs/app.log", "logs/app.xml"}) {
+      std::filesystem::remove(dir_.path(file));
+    }
     ASSERT_EQ(QlxOpenToolkit(config().c_str(), nullptr), 1);
     {
       const Handle logger{QlxGetObject("app", nullptr)};
@@ -82,6 +102,12 @@ file.fileName = )" + dir_.path("logs/app.log"));
     const std::string line = dir_.read("logs/app.log");
     ASSERT_EQ(line.substr(0, 2), "\x1e[");
     ASSERT_EQ(line.substr(std::min(line.find("] - ") + 1, line.size())), expectedRest());
+    const std::string record = dir_.read("logs/app.xml");
+    ASSERT_TRUE(
+        record.starts_with(" <Server Format=\"IP\">alpha.example.org</Server>\n"
+                           "<Message Id=\"ABC0001E\" Severity=\"ERROR\">\n"))
+        << record;
+    ASSERT_TRUE(record.ends_with(expectedRecordRest())) << record;
   }
 
   template <typename Scenario>
@@ -96,7 +122,7 @@ file.fileName = )" + dir_.path("logs/app.log"));
   const ResourceBundles bundles_;
 };
 
-TEST_F(ProblemDeterminationFailureTest, StampsFiltersAndTracesWhatItCan) {
+TEST_F(ProblemDeterminationFailureTest, StampsFiltersAndRecordsWhatItCan) {
   withEveryFailureOf([this](Tries &tries) {
     QlxOpenToolkit(config().c_str(), nullptr);
     {
@@ -123,6 +149,11 @@ TEST_F(ProblemDeterminationFailureTest, ChangesEveryKeyWhileItLogs) {
       {"filter", "msgIds", "ABC* XYZ* *W"},
       {"filter", "msgIdRepeatTime", "1"},
       {"trace", "dateTimeFormat", "HH"},
+      {"xml", "singleServer", nullptr},
+      {"xml", "singleProduct", "true"},
+      {"xml", "forceAsMessage", "true"},
+      {"xml", "dateTimeFormat", nullptr},
+      {"xml", "locale", "de"},
   };
   withEveryFailureOf([this](Tries &tries) {
     QlxOpenToolkit(config().c_str(), nullptr);

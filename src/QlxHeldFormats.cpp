@@ -5,10 +5,10 @@
 #include <array>
 #include <cstring>
 
-#include <unicode/ucal.h>
+#include <unicode/localpointer.h>
+#include <unicode/timezone.h>
 #include <unicode/ucnv.h>
 #include <unicode/uloc.h>
-#include <unicode/ustring.h>
 
 static pthread_mutex_t gLock = PTHREAD_MUTEX_INITIALIZER;
 
@@ -16,7 +16,7 @@ static pthread_mutex_t gLock = PTHREAD_MUTEX_INITIALIZER;
 // the same: nothing is then held for longer than a call.
 static std::array<char, 256> gLocale;
 static std::array<char, 64> gCodePage;
-static std::array<UChar, 128> gZone;
+static icu::TimeZone *gZone;  // owned; null: not known
 
 static void dropAll() {
   qlxIntlDropHeldMessages();
@@ -39,21 +39,22 @@ void qlxIntlCheckHeldCodePage(void) {
   check(gCodePage, ucnv_getDefaultName());
 }
 
+// Zones of one name may differ: a host may make them, and one that ICU does not know has the name
+// that the system gives it.
 void qlxIntlCheckHeldZone(void) {
-  std::array<UChar, gZone.size()> zone;
-  UErrorCode status = U_ZERO_ERROR;
-  const int32_t length = ucal_getDefaultTimeZone(zone.data(), zone.size(), &status);
-  const bool whole = U_SUCCESS(status) && length < static_cast<int32_t>(zone.size());
-  if (whole && u_strcmp(zone.data(), gZone.data()) == 0) return;
+  icu::LocalPointer<icu::TimeZone> zone{icu::TimeZone::createDefault()};
+  if (gZone && zone.isValid() && *zone == *gZone) return;
   dropAll();
-  if (!whole) zone[0] = 0;
-  u_strcpy(gZone.data(), zone.data());
+  delete gZone;
+  gZone = zone.orphan();
 }
 
 void qlxDropHeldFormats(void) {
   const HeldFormatsLock lock;
   dropAll();
   qlxIntlDropHeldBundles();
+  delete gZone;
+  gZone = nullptr;
 }
 
 void qlxHeldFormatsLock(void) {

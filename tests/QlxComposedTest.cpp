@@ -240,7 +240,6 @@ const UChar *const kOtherNumbers[] = {u"{%,Number}",
                                       u"{%,plural,=0{none}one{# of {^}}other{# of {^}}}",
                                       u"{%,plural,offset:1 one{'#' #}other{#}}",
                                       u"{%,selectordinal,one{#st}two{#nd}other{#th}}",
-                                      u"{%,ordinal}",
                                       u"{%,number,}"};
 
 // What a pattern cannot have, or what is no argument of ours.

@@ -4,6 +4,10 @@
  * they call only what takes no lock: the twins (qlxIntl...), the helpers (qlx...) and the
  * operations of the built-in classes (Qlx<Class>F<Operation>) declared here, besides the platform
  * layer and the functions whose headers say that they take no lock.
+ *
+ * An operation of a built-in class takes the object's variables for those that the same class's
+ * fAllocVars makes: a host's class with QlxPDLoggerFLog() has QlxPDLoggerFAllocVars() and
+ * QlxPDLoggerFFreeVars() too, or operations that call them, and no variables of its own.
  */
 #ifndef QLX_CLASS_H
 #define QLX_CLASS_H

@@ -2,7 +2,6 @@
 
 #include <cmath>
 #include <limits>
-#include <optional>
 
 #include "support/ChainTest.h"
 #include "support/FailingMemory.h"

@@ -4,14 +4,16 @@
 #include <netdb.h>
 #include <unistd.h>
 
+#include <array>
 #include <cstring>
-#include <optional>
+#include <map>
 
 #include "QlxFormatted.h"
 #include "QlxLoggedEvent.h"
 #include "support/ChainTest.h"
 #include "support/FailingMemory.h"
 #include "support/Status.h"
+#include "support/Together.h"
 
 // ---- A host whose name a test makes up
 
@@ -193,6 +195,31 @@ TEST_F(PDLoggerTest, TwoLoggersStampValuesOfTheirOwn) {
   EXPECT_EQ(logged().all.find("product=two|"), 0u);
   logger = get("pd");
   EXPECT_EQ(logged().all.find("product=one|"), 0u);
+}
+
+TEST_F(PDLoggerTest, EachThreadStampsItsOwnNumberAndWholeValuesWhileTheyChange) {
+  constexpr int kCalls = 200;
+  std::map<int32_t, int> counts;  // by thread
+  recorder->alsoDo = [&counts](Event *event) {
+    ++counts[QlxGetEventPropLong(event, "threadId", nullptr)];
+    const std::string product = take(QlxGetEventProp(event, "product", nullptr));
+    EXPECT_TRUE(product == "<null>" || product == "Quill" || product == "a longer one") << product;
+  };
+  std::array<int32_t, 2> threads{};
+  const auto logAll = [this](int32_t *thread) {
+    *thread = static_cast<int32_t>(CxThreadGetCurrentID());
+    for (int i = 0; i < kCalls; ++i) QlxLogUText(logger.get(), u"text");
+  };
+  const auto changeAll = [this] {
+    for (int i = 0; i < kCalls; ++i) {
+      for (const char *value : {"Quill", static_cast<const char *>(nullptr), "a longer one"}) {
+        set("product", value);
+      }
+    }
+  };
+  together([&] { logAll(&threads[0]); }, [&] { logAll(&threads[1]); }, changeAll);
+  EXPECT_EQ(counts.size(), threads.size());
+  for (const int32_t thread : threads) EXPECT_EQ(counts[thread], kCalls);
 }
 
 // ---- The host's name

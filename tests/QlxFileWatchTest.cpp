@@ -357,7 +357,7 @@ TEST_F(FileWatchTest, NoticesWhatWasLostInTooManyNotices) {
 
 TEST_F(FileWatchTest, GivesBackWatchesThatNobodyNeeds) {
   QlxFileWatch watch{};
-  for (int i = 0; i < 1200; ++i) {
+  for (int i = 0; i < 600; ++i) {
     const std::string name = "many/" + std::to_string(i) + "/own/app.log";
     fs::create_directories(fs::path(dir.path(name)).parent_path());
     dir.write(name, "");
@@ -366,7 +366,7 @@ TEST_F(FileWatchTest, GivesBackWatchesThatNobodyNeeds) {
       ASSERT_TRUE(qlxFileWatchFindsFile(&watch, dir.path(name).c_str()));
     }
     ASSERT_EQ(watch.watching, 1);
-    if (i < 1199) qlxFileWatchEnd(&watch);
+    if (i < 599) qlxFileWatchEnd(&watch);
   }
   const std::vector<int> notices = descriptorsOf("inotify");
   ASSERT_EQ(notices.size(), 1U);
@@ -375,10 +375,10 @@ TEST_F(FileWatchTest, GivesBackWatchesThatNobodyNeeds) {
   size_t watches = 0;
   for (size_t at = 0; (at = all.find("inotify wd:", at)) != std::string::npos; ++at) ++watches;
   EXPECT_GT(watches, 2U);
-  EXPECT_LT(watches, 1100U);
+  EXPECT_LT(watches, 500U);
   const ApiLock lock;
-  move(dir, "many/1199", "old");
-  EXPECT_FALSE(qlxFileWatchFindsFile(&watch, dir.path("many/1199/own/app.log").c_str()));
+  move(dir, "many/599", "old");
+  EXPECT_FALSE(qlxFileWatchFindsFile(&watch, dir.path("many/599/own/app.log").c_str()));
   qlxFileWatchEnd(&watch);
 }
 

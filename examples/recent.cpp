@@ -74,10 +74,10 @@ int main(int argc, char **argv) {
   if (!QlxOpenToolkit(argv[1], nullptr)) return 1;
   QlxObject *logger = QlxGetObject("recent.logger", nullptr);
   for (const int32_t files : {1, 2, 3, 4}) {
-    QlxLogInfo(logger, argv[2], "copied", u"backup", files);
+    QLX_INFO(logger, argv[2], "copied", u"backup", files);
   }
-  QlxLogError(logger, argv[2], "lost", u"db1");
-  QlxLogInfo(logger, argv[2], "copied", u"backup", int32_t{5});
+  QLX_ERROR(logger, argv[2], "lost", u"db1");
+  QLX_INFO(logger, argv[2], "copied", u"backup", int32_t{5});
   QlxReleaseObject(logger);
   QlxCloseToolkit();
   return 0;

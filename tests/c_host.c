@@ -40,6 +40,45 @@ static void logSomething(QlxObject *logger) {
   CHECK(QlxIsLoggable(logger, DEBUG_MAX) == 0);
 }
 
+static int evaluated;
+static const UChar *evaluatedText(void) {
+  ++evaluated;
+  return u"{0}";
+}
+static const char *evaluatedName(void) {
+  ++evaluated;
+  return "name";
+}
+
+/* Each of the macros, with all but the logger counted. */
+static void logInPlace(QlxObject *logger) {
+  QLX_DEBUG_MIN(logger, evaluatedText(), evaluatedText());
+  QLX_DEBUG_MID(logger, evaluatedText(), evaluatedText());
+  QLX_DEBUG_MAX(logger, evaluatedText(), evaluatedText());
+  QLX_INFO(logger, evaluatedName(), evaluatedName());
+  QLX_WARN(logger, evaluatedName(), evaluatedName());
+  QLX_ERROR(logger, evaluatedName(), evaluatedName());
+  QLX_FATAL(logger, evaluatedName(), evaluatedName());
+}
+
+static void checkMacros(void) {
+  QlxObject *silent = QlxGetObject("c.silent", "qlx_basiclogger");
+  QlxSetObjectEnabled(silent, 0);
+  logInPlace(silent);
+  logInPlace(NULL);
+  CHECK(evaluated == 0);
+  QlxSetObjectEnabled(silent, 1);
+  CHECK(QlxSetObjProp(silent, "level", "DEBUG_MAX") == 1);
+  logInPlace(silent);
+  CHECK(evaluated == 7 * 2);
+  if (evaluated == 0)
+    QLX_INFO(silent, "bundle", "key");
+  else
+    evaluated = 0;
+  CHECK(evaluated == 0);
+  QlxReleaseObject(silent);
+}
+
 static void checkFile(const char *path) {
   char text[256] = "";
   FILE *file = fopen(path, "r");
@@ -63,6 +102,7 @@ int main(void) {
   CHECK(QlxAddListener(logger, handler) == 1);
   logSomething(logger);
   checkFile(path);
+  checkMacros();
   QlxCloseToolkit();
 
   /* Both handles are inert now: usable, without effect. */

@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <initializer_list>
 #include <string_view>
 #include <utility>
 
@@ -79,18 +80,26 @@ static HeldMessage *findCurrent(const PatternKey &key) {
   return held->format ? held : nullptr;
 }
 
-// Whether an argument may have the type date or time: where none has, the zone, which is costly to
-// ask for, need not be looked at. Types are words in any mix of case.
-static bool mayUseZone(std::u16string_view pattern) {
-  for (size_t at = 0; at + 4 <= pattern.size(); ++at) {
-    const UChar *word = pattern.data() + at;
-    for (const UChar *type : {u"date", u"time"})
-      if (u_strncasecmp(word, type, 4, U_FOLD_CASE_DEFAULT) == 0) return true;
-  }
+// Whether an argument may have one of the types, which are words in any mix of case.
+static bool mayHaveType(std::u16string_view pattern,
+                        std::initializer_list<std::u16string_view> types) {
+  const auto isAt = [&](size_t at, std::u16string_view type) {
+    return type.size() <= pattern.size() - at &&
+           u_strncasecmp(pattern.data() + at, type.data(), static_cast<int32_t>(type.size()),
+                         U_FOLD_CASE_DEFAULT) == 0;
+  };
+  for (size_t at = 0; at < pattern.size(); ++at)
+    if (std::ranges::any_of(types, [&](auto type) { return isAt(at, type); })) return true;
   return false;
 }
 
-// ICU crashes in a date style of a locale whose name begins with more than a language.
+// Where no argument is a date or time, the zone, which is costly to ask for, need not be looked at.
+static bool mayUseZone(std::u16string_view pattern) {
+  return mayHaveType(pattern, {u"date", u"time"});
+}
+
+// ICU crashes in a date style, and in a choice by plural rules, of a locale whose name begins with
+// more than a language.
 static bool hasLanguage(const char *locale) {
   char language[ULOC_LANG_CAPACITY];
   UErrorCode status = U_ZERO_ERROR;
@@ -100,10 +109,9 @@ static bool hasLanguage(const char *locale) {
 
 static icu::LocalUMessageFormatPointer open(const PatternKey &key, bool usesZone,
                                             UErrorCode *status) {
-  if (usesZone) {
-    qlxIntlCheckHeldZone();
-    if (!hasLanguage(key.locale)) *status = U_ILLEGAL_ARGUMENT_ERROR;
-  }
+  if (usesZone) qlxIntlCheckHeldZone();
+  const bool usesLanguage = usesZone || mayHaveType(key.pattern, {u"plural", u"selectordinal"});
+  if (usesLanguage && !hasLanguage(key.locale)) *status = U_ILLEGAL_ARGUMENT_ERROR;
   return icu::LocalUMessageFormatPointer{umsg_open(
       key.pattern.data(), static_cast<int32_t>(key.pattern.size()), key.locale, nullptr, status)};
 }

@@ -391,9 +391,13 @@ TEST_F(HeldFormatsTest, APatternThatIsRefusedGivesTheSameErrorEachTime) {
   EXPECT_EQ(held(nullptr, u"{0,nonsense}", u"x").error, U_ILLEGAL_ARGUMENT_ERROR);
 }
 
-TEST_F(HeldFormatsTest, ALocaleWithALanguageThatIsTooLongHasNoDates) {
+TEST_F(HeldFormatsTest, ALocaleWithALanguageThatIsTooLongHasNoDatesAndPlurals) {
   for (const char *locale : {"abcdefghijkl", "no locale at all", "abcdefghijkl_DE"}) {
-    EXPECT_EQ(held(locale, u"{0,date}", 0.0).error, U_ILLEGAL_ARGUMENT_ERROR) << locale;
+    for (const UChar *pattern : {u"{0,date}", u"{0,TIME,short}", u"{0,plural,other{#}}",
+                                 u"{0,Plural,one{#}other{#}}", u"{0,selectOrdinal,other{#}}"})
+      EXPECT_EQ(held(locale, pattern, 0.0).error, U_ILLEGAL_ARGUMENT_ERROR)
+          << locale << toUtf8(pattern);
+    compare(locale, u"{0,select,x{#}other{y}}", u"x");
     compare(locale, u"{0,number} {1}", 1.5, u"x");
   }
 }

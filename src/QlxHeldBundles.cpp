@@ -1,13 +1,12 @@
-// Resource bundles, held by name and locale, and by where ICU looks for them: in its data
-// directory, and in the default locale when it has no bundle of the locale. ICU keeps what it has
-// loaded anyway; held is the handle.
+// Resource bundles, held by name and locale, and by the default locale, in which ICU looks for them
+// when it has no bundle of the locale. ICU keeps what it has loaded anyway, also when its data
+// directory is another one by now; held is the handle.
 #include "QlxHeldFormats.h"
 
 #include <algorithm>
 #include <array>
 #include <cstring>
 
-#include <unicode/putil.h>
 #include <unicode/uloc.h>
 #include <unicode/ures.h>
 
@@ -43,7 +42,6 @@ struct HeldBundle {
 static constexpr int kMaxHeldBundles = 16;
 
 static HeldBundle gBundles[kMaxHeldBundles];
-static char *gDataDirectory;  // in which the held ones were searched; owned
 static uint64_t gUses;
 
 static void freeTexts(BundleKey &key) {
@@ -59,16 +57,6 @@ static void drop(HeldBundle &held) {
 void qlxIntlDropHeldBundles(void) {
   for (HeldBundle &held : gBundles)
     if (held.bundle) drop(held);
-  OslMemoryFree(gDataDirectory);
-  gDataDirectory = nullptr;
-}
-
-// ICU takes what is open for what another directory has under the same name.
-static void checkDataDirectory() {
-  const char *directory = u_getDataDirectory();
-  if (gDataDirectory && std::strcmp(gDataDirectory, directory) == 0) return;
-  qlxIntlDropHeldBundles();
-  gDataDirectory = OslStringDup(directory);
 }
 
 static bool isSame(const char *a, const char *b) {
@@ -126,7 +114,6 @@ static std::u16string_view lookUp(const UResourceBundle *bundle, const char *key
 // Calls use(held bundle or null, pattern); not at all when the bundle cannot be opened.
 template <typename Use>
 static void withPattern(const MessageName &message, UErrorCode *status, Use use) {
-  checkDataDirectory();
   const BundleKey key{message.bundle, message.locale, uloc_getDefault()};
   if (HeldBundle *held = find(key)) {
     held->lastUse = ++gUses;

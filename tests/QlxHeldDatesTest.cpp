@@ -167,6 +167,15 @@ TEST_F(HeldDatesTest, TheSameMillisecondFollowsTheZoneOfTheCall) {
   }
 }
 
+TEST_F(HeldDatesTest, ZonesThatDifferInSummerAloneAreToldApart) {
+  for (int round = 0; round < 3; ++round) {
+    ASSERT_TRUE(IcuDefaults::setZone(u"Africa/Lagos"));
+    EXPECT_EQ(bytesOf("HH", kTime), "11");
+    ASSERT_TRUE(IcuDefaults::setZone(u"Europe/Berlin"));
+    EXPECT_EQ(bytesOf("HH", kTime), "12");
+  }
+}
+
 TEST_F(HeldDatesTest, TwoZonesOfOneNameAreToldApart) {
   for (int round = 0; round < 3; ++round)
     for (const int32_t hours : {1, 2}) {

@@ -17,6 +17,7 @@
 #include <unicode/ustring.h>
 
 #include <qlx/buffers.h>
+#include <qlx/toolkit.h>
 
 #include "support/Child.h"
 #include "support/FailingMemory.h"
@@ -242,15 +243,18 @@ TEST_F(HeldBundlesTest, AReopenedToolkitReadsTheBundleAgain) {
 
 TEST_F(HeldBundlesTest, IcuMayCleanUpAfterTheToolkitIsClosed) {
   Child child([&] {
-    for (int round = 0; round < 3; ++round) {
-      {
-        const OpenToolkit toolkit;
-        EXPECT_EQ(of("hello", "de"), (Result{u"deutsch value", 0}));
-        CxUStringBuff text{};
-        CxUStringBuffAppendUDouble(&text, 1.5);
-        qlxAppendHeldDate(&text, nullptr, 0);
-        CxUStringBuffDiscard(&text);
+    for (int round = 0; round < 4; ++round) {
+      if (round % 2 == 0) {
+        EXPECT_EQ(QlxOpenToolkit(nullptr, nullptr), 1);
       }
+      EXPECT_EQ(of("hello", "de"), (Result{u"deutsch value", 0}));
+      CxUStringBuff text{};
+      CxUStringBuffAppendUDouble(&text, 1.5);
+      qlxAppendHeldDate(&text, nullptr, 0);
+      CxUStringBuffDiscard(&text);
+      const FailingMemory memory;
+      QlxCloseToolkit();
+      EXPECT_LT(memory.live(), 0) << "also what was held without an open toolkit is given back";
       u_cleanup();
     }
   });

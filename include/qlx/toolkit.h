@@ -35,7 +35,9 @@ QLX_API uint8_t QlxOpenToolkit(const char *configFileName, CxStatus *status);
  * Handles that the host still holds become inert: every call with one is safe and does nothing,
  * also after the next open; QlxReleaseObject() still gives it back.
  *
- * The toolkit holds ICU objects while it is open: close it before a call of ICU's u_cleanup().
+ * The toolkit holds ICU objects while it is open: close it before a call of ICU's u_cleanup(). What
+ * formats without an open toolkit (messages, dates, numbers) holds some too, and this gives them
+ * back.
  */
 QLX_API void QlxCloseToolkit(void);
 

@@ -90,7 +90,7 @@ class WideLine {
       if (text) CxUStringBuffAppendUStr(text_, text.get());
       return true;
     }
-    if (event->locale) qlxSetI18MsgLocale(event->message, event->locale);
+    qlxUseEventLocale(event);
     qlxIntlBindI18MsgTo(event->message, args, text_);
     return true;
   }
@@ -117,9 +117,9 @@ class AsciiLine {
   }
 
   bool appendMessage(Event *event, fBindMsg bind, va_list *args) {
-    I18Msg *message = event->message;
     if (bind != qlxIntlBindUI18Msg) return false;
-    if (event->locale) qlxSetI18MsgLocale(message, event->locale);
+    I18Msg *message = event->message;
+    qlxUseEventLocale(event);
     if (message && !message->bundle && message->text) {
       const size_t units = cxUnitsLength(message->text);
       if (qlxIsPlainPattern(message->text, units)) return line_->append(message->text, units);

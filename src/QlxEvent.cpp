@@ -8,6 +8,8 @@
 #include <qlx/props.h>
 #include <qlx/system.h>
 
+#include "QlxI18Msg.h"
+
 static void replaceString(char **target, const char *value) {
   char *copy = OslStringDup(value);  // first: the value may be the stored one
   OslMemoryFree(*target);
@@ -70,7 +72,7 @@ void QlxSetEventIsMessage(Event *event, uint8_t flag) {
 
 UChar *QlxBindEventUMsg(Event *event, fBindMsg bind, va_list *args) {
   if (!event || !bind) return nullptr;
-  if (event->locale) qlxSetI18MsgLocale(event->message, event->locale);
+  qlxUseEventLocale(event);
   return bind(event->message, args);
 }
 

@@ -63,7 +63,7 @@ KeptBuffer::~KeptBuffer() {
 }
 
 BoundText::BoundText(Event *event, va_list *args) {
-  if (event->locale) qlxSetI18MsgLocale(event->message, event->locale);
+  qlxUseEventLocale(event);
   bound_ = qlxIntlBindI18MsgTo(event->message, args, buffer_.get());
 }
 

@@ -180,6 +180,7 @@ LoggedEvent::LoggedEvent(int32_t level, const char *bundle, const char *key, con
   }
   event_->time = CxSystemGetTimestamp();
   event_->level = level;
+  event_->isMessage = bundle != nullptr;
   event_->status = {'-', 0};
 }
 

@@ -367,7 +367,9 @@ TEST_F(PDLoggerTest, WithoutVariablesItStampsWhereItRunsAndLogsOn) {
 
 TEST_F(PDLoggerTest, TwoLoggersHoldTheirFormatterAtThree) {
   constexpr const char *kName = "quill.pdMsgIdFormatter";
-  QlxObject *formatter = get(kName).get();  // the logger keeps it
+  Handle held = get(kName);
+  QlxObject *const formatter = held.get();
+  held.reset();  // the logger keeps it
   ASSERT_NE(formatter, nullptr);
   EXPECT_STREQ(formatter->objClass->name, "qlx_xmlformatter");
   EXPECT_EQ(formatter->refCount, 2u);

@@ -9,10 +9,10 @@
 
 #include <qlx/base.h>
 
-#if defined(__SANITIZE_ADDRESS__)
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
 #define QLX_ONE_UNIT_AT_ONCE
 #elif defined(__has_feature)
-#if __has_feature(address_sanitizer)
+#if __has_feature(address_sanitizer) || __has_feature(thread_sanitizer)
 #define QLX_ONE_UNIT_AT_ONCE
 #endif
 #endif
@@ -42,7 +42,7 @@ inline size_t cxUnitsLength(const UChar *text) {
   const UChar *at = text;
 #ifndef QLX_ONE_UNIT_AT_ONCE
   // A block at its own alignment never reaches into another page than its first unit, so what lies
-  // behind the terminator may be loaded; an address sanitizer thinks otherwise.
+  // behind the terminator may be loaded; sanitizers of addresses and threads think otherwise.
   for (; reinterpret_cast<uintptr_t>(at) % sizeof(CxUnitBlock) != 0; ++at)
     if (*at == 0) return static_cast<size_t>(at - text);
   while (!cxAnyLane(cxLoadUnits(at) == 0)) at += kBlockUnits;

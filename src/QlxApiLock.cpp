@@ -13,9 +13,6 @@
 
 namespace {
 
-constexpr int kAttempts = 30;
-constexpr int kPausesBetween = 10;
-
 std::atomic<CxMutex> gMutex;     // set once
 std::atomic<bool> gForkHandled;  // the fork handlers are registered, or about to be
 std::atomic<pthread_t> gHolder;  // who holds gMutex; only the holder itself relies on it
@@ -56,22 +53,6 @@ CxStatus makeMutex() {
   return status;
 }
 
-void pauseProcessor() {
-#if defined(__x86_64__) || defined(__i386__)
-  __builtin_ia32_pause();
-#endif
-}
-
-// Tries for about as long as a record takes: another thread's call ends sooner than a sleep and the
-// waking from it would.
-bool takesSoon(CxMutex mutex) {
-  for (int attempt = 0; attempt < kAttempts; ++attempt) {
-    if (pthread_mutex_trylock(mutex) == 0) return true;
-    for (int i = 0; i < kPausesBetween; ++i) pauseProcessor();
-  }
-  return false;
-}
-
 bool succeeded(CxStatus status) {
   if (status.kind == '-') return true;
   QlxReportPlatformErr(status);
@@ -83,7 +64,7 @@ bool succeeded(CxStatus status) {
 uint8_t qlxAPIMutexLock(void) {
   if (!gMutex.load(std::memory_order_acquire) && !succeeded(makeMutex())) return 0;
   CxMutex mutex = gMutex.load(std::memory_order_acquire);
-  if (!takesSoon(mutex) && !succeeded(CxMutexLock(&mutex))) return 0;
+  if (!succeeded(CxMutexLock(&mutex))) return 0;
   gHolder.store(pthread_self(), std::memory_order_relaxed);
   return 1;
 }

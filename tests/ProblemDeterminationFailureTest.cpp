@@ -12,6 +12,7 @@
 #include "support/CaptureStdout.h"
 #include "support/EveryFailure.h"
 #include "support/FailureResult.h"
+#include "support/HostName.h"
 #include "support/IcuDefaults.h"
 #include "support/ResourceBundles.h"
 #include "support/TempDir.h"
@@ -27,6 +28,7 @@ using Handle = std::unique_ptr<QlxObject, Release>;
 class ProblemDeterminationFailureTest : public ::testing::Test {
  protected:
   void SetUp() override {
+    madeUpName = "alpha";
     ASSERT_TRUE(IcuDefaults::setLocale("en_US"));
     ASSERT_TRUE(bundles_.add("root", R"(
       copied { "ABC0001E {1,number,integer} files from {0}" }
@@ -56,6 +58,8 @@ records.fileName = )" + dir_.path("logs/app.xml") +
                                      R"(
 lines.fileName = )" + dir_.path("logs/app.log"));
   }
+
+  void TearDown() override { madeUpName = nullptr; }
 
   std::string config() const { return dir_.path("app.properties"); }
 

@@ -10,6 +10,7 @@
 
 #include "QlxFormatted.h"
 #include "QlxLoggedEvent.h"
+#include "support/HostName.h"
 #include "support/ChainTest.h"
 #include "support/FailingMemory.h"
 #include "support/Status.h"
@@ -18,7 +19,7 @@
 // ---- A host whose name a test makes up
 
 // Null: the system's own. Empty: the host has no name.
-static const char *madeUpName;
+const char *madeUpName;
 static std::string madeUpOfficialName;
 
 // In place of the system's, for this whole program, which is what other tests get from it.

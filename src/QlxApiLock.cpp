@@ -34,7 +34,7 @@ void afterForkInParent() {
 }
 
 void afterForkInChild() {
-  qlxFileWatchForget();
+  qlxFileWatchStop();
   afterForkInParent();
 }
 

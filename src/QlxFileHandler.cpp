@@ -3,7 +3,6 @@
 // is made again, other writers' bytes count, and a full file is rolled before the event is written.
 #include "QlxFileHandler.h"
 
-#include <algorithm>
 #include <cerrno>
 #include <cstdio>
 #include <fcntl.h>
@@ -13,7 +12,6 @@
 #include <qlx/files.h>
 #include <qlx/memory.h>
 #include <qlx/toolkit.h>
-#include <qlx/ustring.h>
 
 #include "QlxClasses.h"
 #include "QlxConfigKeys.h"
@@ -21,8 +19,6 @@
 #include "QlxObject.h"
 #include "util/CxFile.h"
 #include "util/CxStatus.h"
-#include "util/CxUnits.h"
-#include "util/CxUString.h"
 
 static constexpr const char *kFirstFileName = "default.log";
 static constexpr int32_t kFirstMaxBytes = 1048576;

@@ -232,7 +232,3 @@ void qlxFileWatchEnd(QlxFileWatch *watch) {
 void qlxFileWatchStop(void) {
   closeNotices();
 }
-
-void qlxFileWatchForget(void) {
-  closeNotices();
-}

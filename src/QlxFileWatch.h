@@ -31,11 +31,9 @@ bool qlxFileWatchFindsFile(QlxFileWatch *watch, const char *path);
 /** Ends the watch of a file that is closed; the next question starts anew. */
 void qlxFileWatchEnd(QlxFileWatch *watch);
 
-/** Gives the descriptors back; paths are looked at until the next watch starts. */
+/** Gives the descriptors back; paths are looked at until the next watch starts. Also for the child
+ *  of a fork, which must not take the parent's notices. */
 void qlxFileWatchStop(void);
-
-/** For the child of a fork, which must not take the parent's notices. */
-void qlxFileWatchForget(void);
 
 QLX_END_DECLS
 

@@ -59,12 +59,8 @@ void qlxIntlDropHeldBundles(void) {
     if (held.bundle) drop(held);
 }
 
-static bool isSame(const char *a, const char *b) {
-  return a && b ? std::strcmp(a, b) == 0 : a == b;
-}
-
 static bool isSame(const BundleKey &a, const BundleKey &b) {
-  return std::ranges::all_of(kKeyTexts, [&](auto text) { return isSame(a.*text, b.*text); });
+  return std::ranges::all_of(kKeyTexts, [&](auto text) { return qlxSameText(a.*text, b.*text); });
 }
 
 // A pattern of a held bundle is in use while it is formatted, so nothing here is dropped when a

@@ -57,10 +57,6 @@ void qlxIntlDropHeldDates(void) {
     if (held.format) drop(held);
 }
 
-static bool samePattern(const char *a, const char *b) {
-  return a && b ? std::strcmp(a, b) == 0 : a == b;
-}
-
 static UDateFormat *openDate(const char *pattern) {
   const OwnedUStr own{CxUStringDupStrToUChar(pattern)};
   if (pattern && !own) return nullptr;
@@ -72,7 +68,7 @@ static UDateFormat *openDate(const char *pattern) {
 // Finds or opens the format of a pattern; null when that fails.
 static HeldDate *fetch(const char *pattern) {
   for (HeldDate &held : gDates)
-    if (held.format && samePattern(held.pattern, pattern)) return &held;
+    if (held.format && qlxSameText(held.pattern, pattern)) return &held;
   icu::LocalUDateFormatPointer format{openDate(pattern)};
   OwnedStr copy{OslStringDup(pattern)};
   if (format.isNull() || (pattern && !copy)) return nullptr;

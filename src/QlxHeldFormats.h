@@ -11,6 +11,7 @@
 #define QLX_SRC_QLXHELDFORMATS_H
 
 #include <cstdint>
+#include <cstring>
 #include <string_view>
 
 #include <qlx/types.h>
@@ -82,6 +83,11 @@ void qlxIntlCheckHeldZone(void);
 void qlxIntlCheckHeldCodePage(void);
 
 QLX_END_DECLS
+
+// Whether two texts by which something is held are the same; null is the same as null alone.
+inline bool qlxSameText(const char *a, const char *b) {
+  return a && b ? std::strcmp(a, b) == 0 : a == b;
+}
 
 class HeldFormatsLock {
  public:

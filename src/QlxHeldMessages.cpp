@@ -57,12 +57,8 @@ static uint32_t hashOf(std::u16string_view pattern) {
   return hash;
 }
 
-static bool sameLocale(const char *a, const char *b) {
-  return a && b ? std::strcmp(a, b) == 0 : a == b;
-}
-
 static bool sameKey(const PatternKey &a, const PatternKey &b) {
-  return a.hash == b.hash && a.pattern == b.pattern && sameLocale(a.locale, b.locale);
+  return a.hash == b.hash && a.pattern == b.pattern && qlxSameText(a.locale, b.locale);
 }
 
 static HeldMessage *find(const PatternKey &key) {

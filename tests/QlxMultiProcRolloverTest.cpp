@@ -1,0 +1,398 @@
+// The rollover of a file that several processes share, and what fails in it.
+#include "support/MultiProcFileHandlerTest.h"
+
+namespace {
+
+// ---- Rolling over
+
+TEST_F(MultiProcFileHandlerTest, RollsOverBeforeTheEventThatFindsTheFileFull) {
+  set("maxFileBytes", "5");
+  set("maxFiles", "2");
+  EXPECT_EQ(logged(u"first"), kSuccess);
+  EXPECT_EQ(logged(u"second"), kSuccess);
+  EXPECT_EQ(generations(), "second| first| - -");
+}
+
+TEST_F(MultiProcFileHandlerTest, FillsTheFileToItsLimitAndPastItByOneRecord) {
+  set("maxFileBytes", "10");
+  for (const char16_t *text : {u"1234", u"567", u"90123", u"4"}) log(text);
+  EXPECT_EQ(generations(), "4| 1234|567|90123| - -");
+}
+
+TEST_F(MultiProcFileHandlerTest, IsFullAtExactlyItsLimit) {
+  set("maxFileBytes", "5");
+  for (const char16_t *text : {u"1234", u"5"}) log(text);
+  EXPECT_EQ(generations(), "5| 1234| - -");
+}
+
+TEST_F(MultiProcFileHandlerTest, ReplacesGenerationOneWhenThereAreTwoFiles) {
+  rollAlways("2");
+  for (const char16_t *text : {u"longest", u"long", u"3"}) {  // nothing of it stays behind the next
+    EXPECT_EQ(logged(text), kSuccess);
+  }
+  EXPECT_EQ(generations(), "3| long| - -");
+}
+
+TEST_F(MultiProcFileHandlerTest, KeepsAsManyGenerationsAsItIsTold) {
+  rollAlways("3");
+  for (const char16_t *text : {u"1", u"2", u"3", u"4"}) {
+    EXPECT_EQ(logged(text), kSuccess);
+  }
+  EXPECT_EQ(generations(), "4| 3| 2| -");
+}
+
+TEST_F(MultiProcFileHandlerTest, NeverRollsWithFewerThanTwoFiles) {
+  for (const char *files : {"1", "0", "-1"}) {
+    set("fileName", dir.path("app.log"));
+    rollAlways(files);
+    for (const char16_t *text : {u"1", u"2"}) log(text);
+  }
+  EXPECT_EQ(generations(), "1|2|1|2|1|2| - - -");
+}
+
+TEST_F(MultiProcFileHandlerTest, NeverRollsAtANegativeLimit) {
+  rollAlways("2");
+  set("maxFileBytes", "-1");
+  for (const char16_t *text : {u"1", u"2"}) log(text);
+  EXPECT_EQ(generations(), "1|2| - - -");
+}
+
+TEST_F(MultiProcFileHandlerTest, RollsAtEveryEventWithALimitOfZero) {
+  set("maxFileBytes", "0");
+  for (const char16_t *text : {u"1", u"2"}) log(text);
+  EXPECT_EQ(generations(), "2| 1|  -");  // the empty file was rolled too
+}
+
+TEST_F(MultiProcFileHandlerTest, LeavesTheActiveFileInItsPlace) {
+  rollAlways("2");
+  log(u"1");
+  const ino_t before = activeInode();
+  const CxFile file = vars()->file;
+  log(u"2");
+  EXPECT_EQ(activeInode(), before);
+  EXPECT_EQ(vars()->file, file);
+  EXPECT_EQ(generations(), "2| 1| - -");
+}
+
+TEST_F(MultiProcFileHandlerTest, CopiesFilesOfAnySize) {
+  rollAlways("2");
+  std::string bytes;
+  for (const size_t size : {1, 8191, 8192, 8193, 16384, 100000}) {
+    log(u"before");
+    bytes.assign(size, 'x');
+    bytes.back() = '\n';
+    dir.write("app.log", bytes);
+    log(u"after");
+    EXPECT_EQ(dir.read("app1.log"), bytes) << size;
+    EXPECT_EQ(dir.read("app.log"), "after\n") << size;
+  }
+}
+
+TEST_F(MultiProcFileHandlerTest, CountsWhatOtherProcessesWrite) {
+  set("maxFileBytes", "10");
+  log(u"1");
+  Child other([this] { log(u"from another"); });
+  EXPECT_EQ(other.end(), 0);
+  log(u"2");
+  EXPECT_EQ(generations(), "2| 1|from another| - -");
+}
+
+TEST_F(MultiProcFileHandlerTest, GoesOnInTheActiveFileAfterAnotherProcessRolledIt) {
+  set("maxFileBytes", "6");
+  open();
+  const Signal mine, theirs;
+  Child other([&] {
+    close();  // a descriptor of its own
+    for (const char16_t *text : {u"b1", u"b2", u"b3"}) {
+      theirs.await();
+      EXPECT_EQ(logged(text), kSuccess);
+      mine.give();
+    }
+  });
+  for (const char16_t *text : {u"a1", u"a2", u"a3"}) {
+    EXPECT_EQ(logged(text), kSuccess);
+    theirs.give();
+    mine.await();
+  }
+  EXPECT_EQ(other.end(), 0);
+  EXPECT_EQ(generations(), "a3|b3| a2|b2| a1|b1| -");
+  EXPECT_TRUE(semaphoreIsFree());
+}
+
+TEST_F(MultiProcFileHandlerTest, SharesItsDescriptorWithAForkedProcess) {
+  set("maxFileBytes", "6");
+  log(u"a1");
+  Child other([this] {
+    for (const char16_t *text : {u"b1", u"b2", u"b3"}) log(text);
+  });
+  EXPECT_EQ(other.end(), 0);
+  log(u"a2");
+  EXPECT_EQ(generations(), "a2| b2|b3| a1|b1| -");
+}
+
+TEST_F(MultiProcFileHandlerTest, GoesOnInADeletedActiveFile) {
+  log(u"one");
+  std::filesystem::remove(dir.path("app.log"));
+  EXPECT_EQ(logged(u"two"), kSuccess);
+  EXPECT_FALSE(dir.has("app.log"));
+  set("maxFileBytes", "8");  // closes
+  log(u"three");
+  EXPECT_EQ(dir.read("app.log"), "three\n");
+}
+
+TEST_F(MultiProcFileHandlerTest, RollsADeletedActiveFileOver) {
+  set("maxFileBytes", "8");
+  log(u"one");
+  std::filesystem::remove(dir.path("app.log"));
+  log(u"two");
+  EXPECT_EQ(logged(u"three"), kSuccess);
+  EXPECT_EQ(generations(), "- one|two| - -");
+}
+
+TEST_F(MultiProcFileHandlerTest, WaitsForAStoppedHolderAndGoesOnWhenItIsKilled) {
+  for (const bool killed : {false, true}) {
+    Child holder([this] {
+      calls.onOperate = [](const sembuf &operation, size_t) {
+        if (!isLock(operation)) raise(SIGSTOP);  // written, not yet given back
+        return 0;
+      };
+      log(u"holder");
+    });
+    holder.awaitStop();
+    Child other([this] { EXPECT_EQ(logged(u"other"), kSuccess); });
+    ASSERT_TRUE(key.awaitWaiting(1));
+    EXPECT_EQ(dir.read("app.log"), "holder\n");
+    holder.send(killed ? SIGKILL : SIGCONT);
+    EXPECT_EQ(other.end(), 0);
+    EXPECT_EQ(holder.end(), killed ? -SIGKILL : 0);
+    EXPECT_EQ(dir.read("app.log"), "holder\nother\n");
+    EXPECT_TRUE(semaphoreIsFree());
+    std::filesystem::remove(dir.path("app.log"));
+  }
+}
+
+// ---- Failures of a rollover: the active file is emptied all the same, and the event tells of them
+
+TEST_F(MultiProcFileHandlerTest, SaysThatGenerationOneCannotBeOpenedAndEmptiesTheFileAllTheSame) {
+  forward();
+  rollAlways("2");
+  log(u"lost");
+  obstruct("app1.log");
+  CaptureStdout output;
+  EXPECT_EQ(logged(u"two"), failure(EISDIR));
+  EXPECT_EQ(output.bytes(), "ERR opening " + dir.path() + "//app1.log pre rollover\n");
+  EXPECT_EQ(dir.read("app.log"), "two\n");
+  EXPECT_RECORDED(u"lost|two|");
+  EXPECT_TRUE(semaphoreIsFree());
+}
+
+TEST_F(MultiProcFileHandlerTest, PrintsNothingElse) {
+  rollAlways("3");
+  log(u"one");
+  obstruct("app2.log");
+  FailingMemory memory;
+  CaptureStdout output;
+  log(u"two");
+  calls.onOperate = [](const sembuf &, size_t) { return EIDRM; };
+  log(u"three");
+  close();
+  std::filesystem::remove(dir.path("app.log"));
+  std::filesystem::create_directory(dir.path("app.log"));
+  log(u"four");
+  EXPECT_EQ(output.bytes(), "");
+}
+
+TEST_F(MultiProcFileHandlerTest, WritesOverAGenerationOneThatCouldNotBeMovedWithoutTruncatingIt) {
+  rollAlways("3");
+  log(u"new");
+  dir.write("app1.log", "longer\n");
+  obstruct("app2.log");
+  EXPECT_EQ(logged(u"last"), failure(EISDIR));
+  EXPECT_EQ(dir.read("app1.log"), "new\ner\n");
+  EXPECT_EQ(dir.read("app.log"), "last\n");
+}
+
+TEST_F(MultiProcFileHandlerTest, EmptiesTheFileAlsoWhenItCannotBeRead) {
+  rollAlways("2");
+  log(u"lost");
+  replaceDescriptor(::open(dir.path("app.log").c_str(), O_WRONLY | O_APPEND));
+  EXPECT_EQ(logged(u"two"), failure(EBADF));
+  EXPECT_EQ(generations(), "two|  - -");
+}
+
+TEST_F(MultiProcFileHandlerTest, DoesNotOpenGenerationOneWhenTheFileHasNoBeginning) {
+  set("maxFileBytes", "0");
+  open();
+  int ends[2];
+  ASSERT_EQ(pipe(ends), 0);
+  replaceDescriptor(ends[1]);
+  EXPECT_EQ(logged(u"two"), failure(ESPIPE));
+  EXPECT_EQ(generations(), " - - -");
+  char bytes[8] = {};
+  EXPECT_EQ(read(ends[0], bytes, sizeof bytes), 4);
+  EXPECT_STREQ(bytes, "two\n");
+  ::close(ends[0]);
+}
+
+TEST_F(MultiProcFileHandlerTest, EmptiesTheFileAlsoWhenTheCopyCannotBeWritten) {
+  set("maxFileBytes", "8");
+  log(u"12345678");
+  const FileSizeLimit limit{5};
+  EXPECT_EQ(logged(u"two"), failure(EFBIG));
+  EXPECT_EQ(dir.read("app1.log"), "12345");
+  EXPECT_EQ(dir.read("app.log"), "two\n");
+  EXPECT_TRUE(semaphoreIsFree());
+}
+
+TEST_F(MultiProcFileHandlerTest, TellsOfACopyThatMayNotHaveReachedTheDisk) {
+  rollAlways("3");
+  log(u"one");
+  obstruct("app2.log");  // generation 1 stays in its place
+  std::filesystem::create_symlink("/dev/null", dir.path("app1.log"));
+  EXPECT_EQ(logged(u"two"), failure(EINVAL));  // what the null device answers a flush
+  EXPECT_EQ(dir.read("app.log"), "two\n");
+}
+
+TEST_F(MultiProcFileHandlerTest, ClosesTheCopy) {
+  const auto descriptors = [] {
+    const std::filesystem::directory_iterator all("/proc/self/fd");
+    return std::distance(begin(all), end(all));
+  };
+  rollAlways("3");
+  log(u"one");
+  const auto before = descriptors();
+  log(u"two");
+  EXPECT_EQ(generations(), "two| one| - -");
+  EXPECT_EQ(descriptors(), before);
+}
+
+TEST_F(MultiProcFileHandlerTest, TellsOfAFileThatCannotBeEmptiedAndWritesOn) {
+  rollAlways("2");
+  open();
+  const int sealed = memfd_create("sealed", MFD_ALLOW_SEALING);
+  ASSERT_EQ(fcntl(sealed, F_SETFL, O_APPEND), 0);
+  ASSERT_EQ(fcntl(sealed, F_ADD_SEALS, F_SEAL_SHRINK), 0);
+  replaceDescriptor(sealed);
+  log(u"one");
+  EXPECT_EQ(logged(u"two"), failure(EPERM));
+  EXPECT_EQ(dir.read("app1.log"), "one\n");
+  char bytes[16] = {};
+  EXPECT_EQ(pread(vars()->file, bytes, sizeof bytes, 0), 8);
+  EXPECT_STREQ(bytes, "one\ntwo\n");
+  EXPECT_TRUE(semaphoreIsFree());
+}
+
+TEST_F(MultiProcFileHandlerTest, TellsOfAFileThatCannotBeMeasuredAndWritesNowhere) {
+  forward();
+  log(u"one");
+  ::close(vars()->file);
+  EXPECT_EQ(logged(u"two"), failure(EBADF));
+  EXPECT_RECORDED(u"one|two|");
+  EXPECT_TRUE(semaphoreIsFree());
+}
+
+TEST_F(MultiProcFileHandlerTest, DoesNotMindGenerationsThatAreMissing) {
+  rollAlways("9");
+  log(u"one");
+  EXPECT_EQ(logged(u"two"), kSuccess);
+  dir.write("app5.log", "five\n");
+  EXPECT_EQ(logged(u"three"), kSuccess);
+  EXPECT_EQ(generations(), "three| two| one| -");
+  EXPECT_EQ(dir.read("app6.log"), "five\n");
+}
+
+TEST_F(MultiProcFileHandlerTest, RollsStepByStepForItsCallers) {
+  rollAlways("3");
+  log(u"one");
+  dir.write("app1.log", "older\n");
+  qlxMultiProcFileHandlerDoRollover(vars());
+  EXPECT_EQ(generations(), " one| older| -");
+  log(u"two");
+  qlxMultiProcFileHandlerRollActiveLog(vars());
+  EXPECT_EQ(generations(), " two| older| -");
+  qlxMultiProcFileHandlerDoRollover(nullptr);
+  qlxMultiProcFileHandlerRollActiveLog(nullptr);
+}
+
+// ---- A full disk, and no memory
+
+TEST_F(MultiProcFileHandlerTest, TellsOfARecordThatCannotBeWrittenAndForwardsIt) {
+  forward();
+  log(u"12345");
+  const FileSizeLimit limit{8};
+  EXPECT_EQ(logged(u"67890"), failure(EFBIG));
+  EXPECT_EQ(dir.read("app.log"), "12345\n67");
+  EXPECT_RECORDED(u"12345|67890|");
+  EXPECT_TRUE(semaphoreIsFree());
+}
+
+constexpr size_t kDiskBytes = 32768;
+
+// A small disk of this process alone, in the test's own folder.
+bool mountSmallDisk(const std::string &place) {
+  const std::string size = "size=" + std::to_string(kDiskBytes);
+  return unshare(CLONE_NEWNS) == 0 &&
+         mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0 &&
+         mount("none", place.c_str(), "tmpfs", 0, size.c_str()) == 0;
+}
+
+TEST_F(MultiProcFileHandlerTest, EmptiesTheFileAlsoWhenTheDiskIsTooFullForTheCopy) {
+  constexpr int kNoDisk = 77;
+  std::filesystem::create_directory(dir.path("disk"));
+  set("fileName", dir.path("disk/app.log"));
+  Child other([this] {
+    if (!mountSmallDisk(dir.path("disk"))) _exit(kNoDisk);
+    set("maxFileBytes", std::to_string(kDiskBytes * 2));
+    const std::u16string line(999, u'x');
+    size_t whole = 0;
+    while (logged(line.c_str()) == kSuccess) ++whole;
+    EXPECT_EQ(whole, kDiskBytes / 1000);
+    EXPECT_EQ(logged(u"1234567"), failure(ENOSPC));
+    EXPECT_EQ(dir.read("disk/app.log").size(), kDiskBytes);
+    EXPECT_TRUE(semaphoreIsFree());
+
+    rollAlways("2");
+    EXPECT_EQ(logged(u"next"), failure(ENOSPC));
+    EXPECT_EQ(dir.read("disk/app1.log"), "");
+    EXPECT_EQ(dir.read("disk/app.log"), "next\n");
+    EXPECT_EQ(logged(u"last"), kSuccess);
+    EXPECT_EQ(dir.read("disk/app1.log"), "next\n");
+  });
+  const int end = other.end();
+  if (end == kNoDisk) GTEST_SKIP() << "this process may not mount a disk of its own";
+  EXPECT_EQ(end, 0);
+}
+
+TEST_F(MultiProcFileHandlerTest, SurvivesEveryFailedAllocationOfAnEvent) {
+  rollAlways("3");
+  log(u"first");
+  const std::u16string texts[] = {u"short", std::u16string(3000, u'x')};
+  for (const std::u16string &text : texts) {
+    for (uint64_t nth = 1, failures = 1; failures > 0; ++nth) {
+      const CaptureStdout silence;
+      FailingMemory memory;
+      memory.failOnce(nth);
+      log(text.c_str());
+      failures = memory.failures();
+      EXPECT_TRUE(semaphoreIsFree());
+    }
+    EXPECT_EQ(logged(text.c_str()), kSuccess);
+    EXPECT_EQ(dir.read("app.log"), std::string(text.begin(), text.end()) + "\n");
+  }
+}
+
+TEST_F(MultiProcFileHandlerTest, TellsOfARolloverWithoutMemoryForAName) {
+  rollAlways("3");
+  const CaptureStdout silence;
+  int told = 0;
+  for (uint64_t nth = 1, failures = 1; failures > 0; ++nth) {
+    for (const UChar *text : {u"1", u"2", u"3"}) log(text);  // what one without memory left empty
+    FailingMemory memory;
+    memory.failOnce(nth);
+    told += logged(u"more") == failure(ENOMEM);
+    failures = memory.failures();
+  }
+  EXPECT_GE(told, 2);  // the names of two generations
+}
+
+}  // namespace

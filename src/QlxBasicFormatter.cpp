@@ -4,6 +4,7 @@
 
 #include <array>
 #include <cstring>
+#include <optional>
 #include <string_view>
 
 #include <qlx/class/containers.h>
@@ -18,6 +19,7 @@
 #include "QlxFormatted.h"
 #include "QlxHeldFormats.h"
 #include "QlxI18Msg.h"
+#include "QlxLoggedEvent.h"
 #include "QlxObject.h"
 #include "QlxProps.h"
 #include "util/CxDecimal.h"
@@ -133,7 +135,11 @@ class AsciiLine {
   CxAsciiLine *line_;
 };
 
-using LineValues = std::array<const char *, std::size(kLineKeys)>;
+// Of the line's keys.
+struct LineValues {
+  std::array<const char *, std::size(kLineKeys)> texts;  // null for one that is absent
+  std::optional<int32_t> line;                           // of the source
+};
 
 }  // namespace
 
@@ -144,31 +150,41 @@ static uint32_t lastFour(std::string_view key) {
   return bytes;
 }
 
-// The values of the line's keys; null for a key that is absent.
-static LineValues findLineValues(const Event *event) {
+// Of the properties of an event.
+static LineValues findProperties(const StringToStringMapNode *node) {
   LineValues values{};
-  for (const auto *node = event->props ? event->props->head : nullptr; node; node = node->next) {
+  for (; node; node = node->next) {
     const std::string_view key{node->key};
-    for (size_t i = 0; i < values.size(); ++i) {
+    for (size_t i = 0; i < values.texts.size(); ++i) {
       if (key.size() != kLineKeys[i].size() || lastFour(key) != lastFour(kLineKeys[i])) continue;
-      if (key == kLineKeys[i]) values[i] = node->value;
+      if (key == kLineKeys[i]) values.texts[i] = node->value;
       break;
     }
   }
+  uint8_t isNumber = 0;
+  const int32_t line = qlxPropStrToInt32(values.texts[kSourceLine], &isNumber);
+  if (isNumber) values.line = line;
   return values;
+}
+
+static LineValues findLineValues(const Event *event) {
+  if (const EventSource *source = qlxNotedEventSource(event)) {
+    LineValues values{{source->file, source->function}, {}};
+    if (source->file) values.line = source->line;
+    return values;
+  }
+  return findProperties(event->props ? event->props->head : nullptr);
 }
 
 template <typename Line>
 static bool appendProperties(Line &line, const Event *event, std::string_view separator) {
   const LineValues values = findLineValues(event);
-  for (size_t i = 0; i < values.size(); ++i) {
-    uint8_t usable = values[i] != nullptr;
-    const int32_t number = i == kSourceLine ? qlxPropStrToInt32(values[i], &usable) : 0;
-    if (!usable) continue;
+  for (size_t i = 0; i < values.texts.size(); ++i) {
+    if (i == kSourceLine ? !values.line : !values.texts[i]) continue;
     // Deliberate: a negative number has its unsigned 64-bit form.
     const bool appended = i == kSourceLine
-                              ? line.appendNumber(static_cast<uint64_t>(int64_t{number}))
-                              : line.append(values[i]);
+                              ? line.appendNumber(static_cast<uint64_t>(int64_t{*values.line}))
+                              : line.append(values.texts[i]);
     if (!appended || !line.append(separator)) return false;
   }
   return true;

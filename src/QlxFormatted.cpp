@@ -7,6 +7,7 @@
 #include <qlx/class/handler.h>
 
 #include "QlxI18Msg.h"
+#include "QlxLoggedEvent.h"
 #include "QlxObject.h"
 #include "util/CxUString.h"
 #include "util/CxUnits.h"
@@ -75,6 +76,7 @@ static bool formatAscii(QlxObject *handler, Event *event, va_list *args, CxAscii
 }
 
 FormattedEvent::FormattedEvent(QlxObject *handler, Event *event, va_list *args) {
+  qlxSettleEvent(event);
   QlxObject *formatter = isKind(handler, Handler) ? handler->kind2.formatter : nullptr;
   if (const QlxAppendEvent append = appendOf(formatter)) {
     has_ = append(formatter, event, args, buffer_.get());

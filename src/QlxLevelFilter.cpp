@@ -9,6 +9,7 @@
 
 #include "QlxClasses.h"
 #include "QlxConfigKeys.h"
+#include "QlxLoggedEvent.h"
 #include "QlxObject.h"
 #include "QlxProps.h"
 
@@ -16,6 +17,9 @@ void QlxBasicFilterFProcess(QlxObject *filter, Event *event, va_list *args) {
   if (!isKind(filter, Filter) || !loadEnabled(filter)) return;
   const ObjClass *objClass = filter->objClass;
   if (!objClass->op2.fIsLoggable || !objClass->op3.fLog) return;
+  const bool isHosts = objClass->op2.fIsLoggable != QlxLevelFilterFIsLoggable ||
+                       objClass->op3.fLog != QlxBasicObjectFLog;
+  if (isHosts) qlxSettleEvent(event);
   if (objClass->op2.fIsLoggable(filter, event, args) == 1) objClass->op3.fLog(filter, event, args);
 }
 

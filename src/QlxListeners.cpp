@@ -5,6 +5,8 @@
 #include <array>
 
 #include <qlx/class/containers.h>
+#include <qlx/class/filter.h>
+#include <qlx/class/handler.h>
 #include <qlx/class/props.h>
 #include <qlx/memory.h>
 #include <qlx/object.h>
@@ -12,6 +14,7 @@
 
 #include "QlxConfigKeys.h"
 #include "QlxLocked.h"
+#include "QlxLoggedEvent.h"
 #include "QlxProps.h"
 
 static ListenerGroup **groupField(QlxObject *object) {
@@ -112,10 +115,17 @@ static QlxObject *listenerAfter(const Snapshot &listeners, QlxObject *object) {
   return nullptr;
 }
 
+// The operations that take an event whose source is only noted, and settle it where they have to.
+static bool asksForNotedSource(fProcess process) {
+  return process == QlxFileUHandlerFProcess || process == QlxMultiProcFileUHandlerFProcess ||
+         process == QlxBasicFilterFProcess;
+}
+
 static void passTo(QlxObject *listener, Event *event, va_list *args) {
   const ObjClass *objClass = listener->objClass;
   const bool processes = isKind(listener, Filter) || isKind(listener, Handler);
   if (!processes || !objClass->op1.fProcess || (listener->marks & kMarkPassing)) return;
+  if (!asksForNotedSource(objClass->op1.fProcess)) qlxSettleEvent(event);
   objClass->op1.fProcess(listener, event, args);
 }
 
@@ -129,6 +139,13 @@ static ObjectRef passToSome(const ListenerGroupNode *node, size_t &left, QlxObje
   return ObjectRef{left > 0 ? qlxIntlAcquireObject(listenerAfter(listeners, object)) : nullptr};
 }
 
+static void passToAll(const ListenerGroupNode *head, QlxObject *object, Event *event,
+                      va_list *args) {
+  size_t left = countFrom(head);
+  ObjectRef next = passToSome(head, left, object, event, args);
+  while (next) next = passToSome(nodeOf(next.get(), object), left, object, event, args);
+}
+
 void QlxBasicObjectFLog(QlxObject *object, Event *event, va_list *args) {
   if (!object || !loadEnabled(object)) return;
   ListenerGroupNode *head = qlxIntlGetListeners(object);
@@ -137,9 +154,10 @@ void QlxBasicObjectFLog(QlxObject *object, Event *event, va_list *args) {
   if (!head || (object->marks & kMarkPassing)) return;
   object->marks |= kMarkPassing;
   const ObjectRef held{qlxIntlAcquireObject(object)};
-  size_t left = countFrom(head);
-  ObjectRef next = passToSome(head, left, object, event, args);
-  while (next) next = passToSome(nodeOf(next.get(), object), left, object, event, args);
+  if (head->next)
+    passToAll(head, object, event, args);
+  else
+    passTo(ObjectRef{qlxIntlAcquireObject(head->value)}.get(), event, args);
   object->marks &= static_cast<uint8_t>(~kMarkPassing);
 }
 

@@ -40,6 +40,12 @@ static struct {
   StringToStringMapNode *nodes;  // linked by next, in the order in which they were set
 } gKept;
 
+// Of the event that was made last; before another one is made, it is settled.
+static struct {
+  Event *event;  // null: nothing is noted
+  EventSource source;
+} gNoted;
+
 // ---- Blocks
 
 static size_t capacityOf(void *block) {
@@ -113,6 +119,28 @@ void qlxStampEventInt(Event *event, const char *key, int32_t value) {
   qlxStampEvent(event, key, {first, static_cast<size_t>(end - first)});
 }
 
+// ---- Where an event comes from
+
+const EventSource *qlxNotedEventSource(const Event *event) {
+  return event && gNoted.event == event ? &gNoted.source : nullptr;
+}
+
+static void stampSource(Event *event, const EventSource &source) {
+  if (source.file) {
+    qlxStampEvent(event, "qlx_prop_srcfile", source.file);
+    qlxStampEventInt(event, "qlx_prop_srcline", source.line);
+  }
+  if (source.function) qlxStampEvent(event, "qlx_prop_srcfunction", source.function);
+}
+
+void qlxSettleEvent(Event *event) {
+  if (!qlxNotedEventSource(event)) return;
+  gNoted.event = nullptr;
+  stampSource(event, gNoted.source);
+}
+
+// ---- Properties taken back
+
 static void freeNodes(StringToStringMapNode *node) {
   while (node) {
     StringToStringMapNode *next = node->next;
@@ -173,7 +201,9 @@ static Event *refillEvent(const char *bundle, const char *key, const UChar *text
 }
 
 LoggedEvent::LoggedEvent(int32_t level, const char *bundle, const char *key, const UChar *text)
-    : event_(gKept.event ? refillEvent(bundle, key, text) : nullptr) {
+    : event_(nullptr) {
+  qlxSettleEvent(gNoted.event);
+  if (gKept.event) event_ = refillEvent(bundle, key, text);
   if (!event_) {
     event_ = QlxVaAllocUEvent(level, bundle, key, text);
     return;
@@ -182,6 +212,10 @@ LoggedEvent::LoggedEvent(int32_t level, const char *bundle, const char *key, con
   event_->level = level;
   event_->isMessage = bundle != nullptr;
   event_->status = {'-', 0};
+}
+
+void LoggedEvent::noteSource(const EventSource &source) const {
+  gNoted = {event_, source};
 }
 
 static void takeBackMessage(I18Msg *message) {
@@ -195,6 +229,7 @@ static void takeBackMessage(I18Msg *message) {
 
 LoggedEvent::~LoggedEvent() {
   if (!event_) return;
+  gNoted.event = nullptr;
   I18Msg *message = event_->message;
   if (gKept.event || !message) {
     QlxFreeEvent(event_);

@@ -1,5 +1,8 @@
 // The event of a log call. It lives for the one call under the API lock, so its blocks are kept and
 // serve the next call: a call of a kind that was made before allocates nothing.
+//
+// Where in the host's code the event comes from is only noted at first. Most lines are written
+// without anybody looking at the event's properties; before somebody may, the event is settled.
 #ifndef QLX_SRC_QLXLOGGEDEVENT_H
 #define QLX_SRC_QLXLOGGEDEVENT_H
 
@@ -7,9 +10,23 @@
 
 #include <qlx/event.h>
 
+// Texts of the caller's; each may be null. The line goes with the file.
+struct EventSource {
+  const char *file, *function;
+  int32_t line;
+};
+
 QLX_BEGIN_DECLS
 
+// What is noted for an event and not among its properties yet, or null.
+const EventSource *qlxNotedEventSource(const Event *event);
+
+// Makes what is noted for an event its properties. To be called before anything but the library's
+// own code that asks for the note gets the event.
+void qlxSettleEvent(Event *event);
+
 // Sets a property as QlxSetEventProp() does, in a kept block where there is one.
+// The event is settled.
 void qlxStampEvent(Event *event, const char *key, std::string_view value);
 void qlxStampEventInt(Event *event, const char *key, int32_t value);
 
@@ -28,6 +45,9 @@ class LoggedEvent {
 
   Event *get() const { return event_; }  // null when memory ran out
   Event *operator->() const { return event_; }
+
+  // To be called once, right after the event was made.
+  void noteSource(const EventSource &source) const;
 
  private:
   Event *event_;

@@ -45,6 +45,7 @@ static void report(QlxLogResult *result, const QlxLogResult &what) {
 
 static void passToLogger(QlxLogResult *result, QlxObject *logger, fLog log, Event *event,
                          va_list *args) {
+  if (log != QlxBasicObjectFLog) qlxSettleEvent(event);
   log(logger, event, args);
   const int32_t bindError = event->message ? event->message->error : 0;
   report(result, {event->status.kind, event->status.code, bindError});
@@ -61,14 +62,6 @@ void qlxLogUMessageEntry(QlxLogResult *result, QlxObject *logger, int32_t level,
   passToLogger(result, logger, log, event.get(), args);
 }
 
-static void setSource(Event *event, const char *file, const char *function, int32_t line) {
-  if (file) {
-    qlxStampEvent(event, "qlx_prop_srcfile", file);
-    qlxStampEventInt(event, "qlx_prop_srcline", line);
-  }
-  if (function) qlxStampEvent(event, "qlx_prop_srcfunction", function);
-}
-
 void qlxLogUDebugEntry(QlxLogResult *result, QlxObject *logger, int32_t level, const char *file,
                        const char *function, int32_t line, const UChar *text, va_list *args) {
   report(result, kNothingLogged);
@@ -77,7 +70,7 @@ void qlxLogUDebugEntry(QlxLogResult *result, QlxObject *logger, int32_t level, c
   const LoggedEvent event{level, nullptr, nullptr, text};
   if (!event.get()) return;
   event->isMessage = 0;
-  setSource(event.get(), file, function, line);
+  event.noteSource({file, function, line});
   passToLogger(result, logger, log, event.get(), args);
 }
 

@@ -3,6 +3,7 @@
 #ifndef QLX_SRC_CXUNITS_H
 #define QLX_SRC_CXUNITS_H
 
+#include <bit>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
@@ -37,15 +38,44 @@ bool cxAnyLane(Block block) {
   return (words[0] | words[1]) != 0;
 }
 
+// Calls step(offset) for blocks of `size` that cover all of a length of at least one of them: the
+// last one begins within the one before it, which costs less than a loop over single units.
+template <size_t size, typename Step>
+inline void cxForBlocks(size_t length, Step step) {
+  size_t at = 0;
+  for (; at + size <= length; at += size) step(at);
+  if (at < length) step(length - size);
+}
+
+#ifndef QLX_ONE_UNIT_AT_ONCE
+
+// The place of the first lane that is not zero, of a comparison's result; kBlockUnits for none.
+inline size_t cxFirstLane(CxUnitBlock block) {
+  static_assert(std::endian::native == std::endian::little);
+  CxWordBlock words;
+  std::memcpy(&words, &block, sizeof words);
+  if (words[0] != 0) return static_cast<size_t>(std::countr_zero(words[0])) / 16;
+  if (words[1] != 0) return static_cast<size_t>(std::countr_zero(words[1])) / 16 + kBlockUnits / 2;
+  return kBlockUnits;
+}
+
+#endif
+
 // The length of a terminated text.
 inline size_t cxUnitsLength(const UChar *text) {
   const UChar *at = text;
 #ifndef QLX_ONE_UNIT_AT_ONCE
-  // A block at its own alignment never reaches into another page than its first unit, so what lies
-  // behind the terminator may be loaded; sanitizers of addresses and threads think otherwise.
-  for (; reinterpret_cast<uintptr_t>(at) % sizeof(CxUnitBlock) != 0; ++at)
-    if (*at == 0) return static_cast<size_t>(at - text);
-  while (!cxAnyLane(cxLoadUnits(at) == 0)) at += kBlockUnits;
+  // What lies behind the terminator may be loaded as long as it is in the same page, and a block at
+  // its own alignment always is; sanitizers of addresses and threads think otherwise.
+  constexpr uintptr_t kSmallestPage = 4096;
+  constexpr uintptr_t kBlockBytes = sizeof(CxUnitBlock);
+  const auto address = reinterpret_cast<uintptr_t>(text);
+  if (address % 2 == 0 && address % kSmallestPage <= kSmallestPage - kBlockBytes) {
+    if (const size_t first = cxFirstLane(cxLoadUnits(text) == 0); first < kBlockUnits) return first;
+    at += kBlockUnits - address % kBlockBytes / sizeof(UChar);
+    while (!cxAnyLane(cxLoadUnits(at) == 0)) at += kBlockUnits;
+    return static_cast<size_t>(at - text) + cxFirstLane(cxLoadUnits(at) == 0);
+  }
 #endif
   while (*at != 0) ++at;
   return static_cast<size_t>(at - text);
@@ -54,64 +84,75 @@ inline size_t cxUnitsLength(const UChar *text) {
 // Whether any of the units, or of the lanes of a block, has the property that `test` tells.
 template <typename Test>
 bool cxAnyUnit(const UChar *text, size_t length, Test test) {
-  for (; length >= kBlockUnits; text += kBlockUnits, length -= kBlockUnits)
-    if (cxAnyLane(test(cxLoadUnits(text)))) return true;
+  if (length >= kBlockUnits) {
+    decltype(test(CxUnitBlock{})) found = {};
+    cxForBlocks<kBlockUnits>(length, [&](size_t at) { found |= test(cxLoadUnits(text + at)); });
+    return cxAnyLane(found);
+  }
   for (; length > 0; --length, ++text)
     if (test(static_cast<uint16_t>(*text))) return true;
   return false;
 }
 
-// Narrows ASCII. False, with `out` in any state, when not all of it is.
+// Narrows ASCII; the two do not overlap. False, with `out` in any state, when not all of it is.
 inline bool cxNarrowAscii(char *out, const UChar *text, size_t length) {
-  CxUnitBlock seen = {};
-  for (; length >= kBlockUnits; length -= kBlockUnits, text += kBlockUnits, out += kBlockUnits) {
-    const CxUnitBlock units = cxLoadUnits(text);
-    seen |= units;
-    const CxByteBlock bytes = __builtin_convertvector(units, CxByteBlock);
-    std::memcpy(out, &bytes, sizeof bytes);
+  if (length >= kBlockUnits) {
+    CxUnitBlock seen = {};
+    cxForBlocks<kBlockUnits>(length, [&](size_t at) {
+      const CxUnitBlock units = cxLoadUnits(text + at);
+      seen |= units;
+      const CxByteBlock bytes = __builtin_convertvector(units, CxByteBlock);
+      std::memcpy(out + at, &bytes, sizeof bytes);
+    });
+    return !cxAnyLane(seen & 0xFF80);
   }
-  uint16_t rest = 0;
+  uint16_t seen = 0;
   for (; length > 0; --length) {
-    rest |= *text;
+    seen |= *text;
     *out++ = static_cast<char>(*text++);
   }
-  return rest < 0x80 && !cxAnyLane(seen & 0xFF80);
+  return seen < 0x80;
 }
 
-// Copies ASCII. False, with `out` in any state, when not all of it is.
+// Copies ASCII; the two do not overlap. False, with `out` in any state, when not all of it is.
 inline bool cxCopyAscii(char *out, const char *text, size_t length) {
+  constexpr uint64_t kHighBits = 0x8080808080808080U;
   uint64_t seen = 0;
-  for (; length >= sizeof seen; length -= sizeof seen, text += sizeof seen, out += sizeof seen) {
-    uint64_t bytes;
-    std::memcpy(&bytes, text, sizeof bytes);
-    seen |= bytes;
-    std::memcpy(out, &bytes, sizeof bytes);
+  const auto copy = [&]<typename Word>(Word word, size_t at) {
+    std::memcpy(&word, text + at, sizeof word);
+    seen |= word;
+    std::memcpy(out + at, &word, sizeof word);
+  };
+  if (length >= sizeof(uint64_t)) {
+    cxForBlocks<sizeof(uint64_t)>(length, [&](size_t at) { copy(uint64_t{}, at); });
+  } else if (length >= sizeof(uint32_t)) {
+    cxForBlocks<sizeof(uint32_t)>(length, [&](size_t at) { copy(uint32_t{}, at); });
+  } else {
+    for (size_t at = 0; at < length; ++at) copy(uint8_t{}, at);
   }
-  uint8_t rest = 0;
-  for (; length > 0; --length) {
-    rest |= static_cast<uint8_t>(*text);
-    *out++ = *text++;
-  }
-  return ((seen | rest) & 0x8080808080808080U) == 0;
+  return (seen & kHighBits) == 0;
 }
 
-// Widens ASCII. False, with `out` in any state, when not all of it is.
+// Widens ASCII; the two do not overlap. False, with `out` in any state, when not all of it is.
 inline bool cxWidenAscii(UChar *out, const char *text, size_t length) {
-  CxUnitBlock seen = {};
-  for (; length >= kBlockUnits; length -= kBlockUnits, text += kBlockUnits, out += kBlockUnits) {
-    CxByteBlock bytes;
-    std::memcpy(&bytes, text, sizeof bytes);
-    const CxUnitBlock units = __builtin_convertvector(bytes, CxUnitBlock);
-    seen |= units;
-    std::memcpy(out, &units, sizeof units);
+  if (length >= kBlockUnits) {
+    CxUnitBlock seen = {};
+    cxForBlocks<kBlockUnits>(length, [&](size_t at) {
+      CxByteBlock bytes;
+      std::memcpy(&bytes, text + at, sizeof bytes);
+      const CxUnitBlock units = __builtin_convertvector(bytes, CxUnitBlock);
+      seen |= units;
+      std::memcpy(out + at, &units, sizeof units);
+    });
+    return !cxAnyLane(seen & 0xFF80);
   }
-  uint8_t rest = 0;
+  uint8_t seen = 0;
   for (; length > 0; --length) {
     const auto byte = static_cast<uint8_t>(*text++);
-    rest |= byte;
+    seen |= byte;
     *out++ = byte;
   }
-  return rest < 0x80 && !cxAnyLane(seen & 0xFF80);
+  return seen < 0x80;
 }
 
 #endif

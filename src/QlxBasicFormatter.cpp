@@ -124,7 +124,8 @@ class AsciiLine {
     qlxUseEventLocale(event);
     if (message && !message->bundle && message->text) {
       const size_t units = cxUnitsLength(message->text);
-      if (qlxIsPlainPattern(message->text, units)) return line_->append(message->text, units);
+      if (line_->append(message->text, units, QlxPatternSyntax{})) return true;
+      if (qlxIsPlainPattern(message->text, units)) return false;
     }
     KeptBuffer text;
     qlxIntlBindI18MsgTo(message, args, text.get());

@@ -19,6 +19,7 @@
 #include "QlxPatternTypes.h"
 #include "util/CxAsciiLine.h"
 #include "util/CxUStringBuff.h"
+#include "util/CxUnits.h"
 
 inline constexpr int kMaxHeldMessages = 64;
 inline constexpr int kMaxHeldDates = 16;
@@ -59,9 +60,6 @@ bool qlxAppendHeldDateAscii(CxAsciiLine *line, const char *pattern, double time)
 typedef enum QlxHeldNumber { kHeldWhole, kHeldFraction } QlxHeldNumber;
 uint8_t qlxAppendHeldNumber(CxUStringBuff *text, QlxHeldNumber which, double value);
 
-// Whether a pattern is its own text, in every locale.
-bool qlxIsPlainPattern(const UChar *pattern, size_t units);
-
 // Drops everything; formatting afterwards holds anew.
 void qlxDropHeldFormats(void);
 
@@ -87,6 +85,20 @@ QLX_END_DECLS
 // Whether two texts by which something is held are the same; null is the same as null alone.
 inline bool qlxSameText(const char *a, const char *b) {
   return a && b ? std::strcmp(a, b) == 0 : a == b;
+}
+
+// For cxAnyUnit(): what makes a pattern another text than its own.
+struct QlxPatternSyntax {
+  template <typename Units>
+  auto operator()(Units units) const {
+    constexpr uint16_t kOpen = u'{', kClose = u'}', kQuote = u'\'';
+    return (units == kOpen) | (units == kClose) | (units == kQuote);
+  }
+};
+
+// Whether a pattern is its own text, in every locale.
+inline bool qlxIsPlainPattern(const UChar *pattern, size_t units) {
+  return !cxAnyUnit(pattern, units, QlxPatternSyntax{});
 }
 
 class HeldFormatsLock {

@@ -180,13 +180,6 @@ static uint32_t append(CxUStringBuff *text, const UMessageFormat *format,
   });
 }
 
-bool qlxIsPlainPattern(const UChar *pattern, size_t length) {
-  return !cxAnyUnit(pattern, length, [](auto units) {
-    constexpr uint16_t kOpen = u'{', kClose = u'}', kQuote = u'\'';
-    return (units == kOpen) | (units == kClose) | (units == kQuote);
-  });
-}
-
 // A pattern without syntax is its own text, in every locale.
 static uint32_t appendPlain(CxUStringBuff *text, std::u16string_view pattern, UErrorCode *status) {
   const auto units = static_cast<uint32_t>(pattern.size());

@@ -1,5 +1,5 @@
 // A line of bytes that holds as long as all of it is ASCII and fits: nearly every line of a log.
-// Its appending functions answer whether it still holds; after a false the line is of no use.
+// Its appending functions answer whether it still holds; after a false nothing was appended.
 // Header only; nothing is allocated.
 #ifndef QLX_SRC_CXASCIILINE_H
 #define QLX_SRC_CXASCIILINE_H
@@ -22,8 +22,11 @@ class CxAsciiLine {
     return true;
   }
 
-  bool append(const UChar *text, size_t units) {
-    if (units > room() || !cxNarrowAscii(end(), text, units)) return false;
+  // Nothing is appended either, and the line still holds, when a unit has the property that
+  // `isUnwanted` tells, see cxAnyUnit().
+  template <typename Test = CxNoUnit>
+  bool append(const UChar *text, size_t units, Test isUnwanted = {}) {
+    if (units > room() || !cxNarrowAscii(end(), text, units, isUnwanted)) return false;
     length_ += units;
     return true;
   }

@@ -24,10 +24,7 @@ static constexpr uint32_t kMaxBytesPerUnit = cxUStringNarrowRoom(0);
 // ICU on this platform is built for UTF-8 as the default code page and then never changes it; built
 // otherwise, all text takes the way over its converter.
 bool cxUStringDefaultIsUtf8(void) {
-  const char *name = ucnv_getDefaultName();
-  for (const char *expected = "UTF-8"; *name == *expected; ++name, ++expected)
-    if (*name == '\0') return true;
-  return false;
+  return std::strcmp(ucnv_getDefaultName(), "UTF-8") == 0;
 }
 
 bool cxUStringIsPlainAscii(const char *text, uint32_t length) {

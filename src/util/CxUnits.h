@@ -8,6 +8,10 @@
 #include <cstdint>
 #include <cstring>
 
+#ifdef __SSE2__
+#include <emmintrin.h>
+#endif
+
 #include <qlx/base.h>
 
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
@@ -36,6 +40,19 @@ bool cxAnyLane(Block block) {
   static_assert(sizeof words == sizeof block);
   std::memcpy(&words, &block, sizeof words);
   return (words[0] | words[1]) != 0;
+}
+
+// The same for the result of a comparison, whose lanes have all bits alike.
+template <typename Block>
+bool cxAnyMatch(Block block) {
+#ifdef __SSE2__
+  __m128i lanes;
+  static_assert(sizeof lanes == sizeof block);
+  std::memcpy(&lanes, &block, sizeof lanes);
+  return _mm_movemask_epi8(lanes) != 0;
+#else
+  return cxAnyLane(block);
+#endif
 }
 
 // Calls step(offset) for blocks of `size` that cover all of a length of at least one of them: the
@@ -73,7 +90,7 @@ inline size_t cxUnitsLength(const UChar *text) {
   if (address % 2 == 0 && address % kSmallestPage <= kSmallestPage - kBlockBytes) {
     if (const size_t first = cxFirstLane(cxLoadUnits(text) == 0); first < kBlockUnits) return first;
     at += kBlockUnits - address % kBlockBytes / sizeof(UChar);
-    while (!cxAnyLane(cxLoadUnits(at) == 0)) at += kBlockUnits;
+    while (!cxAnyMatch(cxLoadUnits(at) == 0)) at += kBlockUnits;
     return static_cast<size_t>(at - text) + cxFirstLane(cxLoadUnits(at) == 0);
   }
 #endif
@@ -87,31 +104,45 @@ bool cxAnyUnit(const UChar *text, size_t length, Test test) {
   if (length >= kBlockUnits) {
     decltype(test(CxUnitBlock{})) found = {};
     cxForBlocks<kBlockUnits>(length, [&](size_t at) { found |= test(cxLoadUnits(text + at)); });
-    return cxAnyLane(found);
+    return cxAnyMatch(found);
   }
   for (; length > 0; --length, ++text)
     if (test(static_cast<uint16_t>(*text))) return true;
   return false;
 }
 
-// Narrows ASCII; the two do not overlap. False, with `out` in any state, when not all of it is.
-inline bool cxNarrowAscii(char *out, const UChar *text, size_t length) {
+// What no unit is.
+struct CxNoUnit {
+  template <typename Units>
+  auto operator()(Units units) const {
+    return units != units;
+  }
+};
+
+// Narrows ASCII; the two do not overlap. False, with `out` in any state, when not all of it is, or
+// when a unit has the property that `isUnwanted` tells, see cxAnyUnit().
+template <typename Test = CxNoUnit>
+bool cxNarrowAscii(char *out, const UChar *text, size_t length, Test isUnwanted = {}) {
   if (length >= kBlockUnits) {
     CxUnitBlock seen = {};
+    decltype(isUnwanted(seen)) unwanted = {};
     cxForBlocks<kBlockUnits>(length, [&](size_t at) {
       const CxUnitBlock units = cxLoadUnits(text + at);
       seen |= units;
+      unwanted |= isUnwanted(units);
       const CxByteBlock bytes = __builtin_convertvector(units, CxByteBlock);
       std::memcpy(out + at, &bytes, sizeof bytes);
     });
-    return !cxAnyLane(seen & 0xFF80);
+    return !cxAnyLane(seen & 0xFF80) && !cxAnyMatch(unwanted);
   }
   uint16_t seen = 0;
-  for (; length > 0; --length) {
+  bool unwanted = false;
+  for (; length > 0; --length, ++text) {
     seen |= *text;
-    *out++ = static_cast<char>(*text++);
+    unwanted |= static_cast<bool>(isUnwanted(static_cast<uint16_t>(*text)));
+    *out++ = static_cast<char>(*text);
   }
-  return seen < 0x80;
+  return seen < 0x80 && !unwanted;
 }
 
 // Copies ASCII; the two do not overlap. False, with `out` in any state, when not all of it is.

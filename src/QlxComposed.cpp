@@ -2,18 +2,24 @@
 
 #include <array>
 #include <cstring>
+#include <span>
+#include <utility>
 
 #include <unicode/messagepattern.h>
 #include <unicode/msgfmt.h>
 
 #include "util/CxUStringBuff.h"
+#include "util/CxUnits.h"
 
 namespace {
 
-union Argument {
-  const UChar *text;
-  int32_t integer;
-  double number;
+struct Argument {
+  union {
+    const UChar *text;
+    int32_t integer;
+    double number;
+  };
+  uint32_t maxUnits;  // a text's length
 };
 using Arguments = std::array<Argument, kMaxComposedArguments>;
 
@@ -137,11 +143,29 @@ bool takeFormats(QlxComposed *composed, const UMessageFormat *message) {
   return next == count;
 }
 
+ShapedNumber shapedType(ComposedType type) {
+  return type == ComposedType::kInteger ? ShapedNumber::kInteger : ShapedNumber::kDouble;
+}
+
+void takeShapes(QlxComposed *composed) {
+  bool isTried[2] = {};
+  for (int32_t i = 0; i < composed->pieceCount; ++i) {
+    const ComposedPiece &piece = composed->pieces[i];
+    if (!piece.format) continue;
+    const ShapedNumber type = shapedType(composed->types[piece.length]);
+    const auto place = static_cast<size_t>(type);
+    if (std::exchange(isTried[place], true)) continue;
+    composed->isShaped[place] = qlxTakeNumberShape(&composed->shapes[place], piece.format, type);
+  }
+}
+
 }  // namespace
 
 bool qlxCompose(QlxComposed *composed, std::u16string_view pattern, const UMessageFormat *message) {
   *composed = {};
-  return Parser(pattern, composed).parse() && takeFormats(composed, message);
+  if (!Parser(pattern, composed).parse() || !takeFormats(composed, message)) return false;
+  takeShapes(composed);
+  return true;
 }
 
 // ---- Putting together
@@ -152,9 +176,11 @@ static bool readArguments(const QlxComposed *composed, va_list *args, Arguments 
   bool whole = true;
   for (int32_t i = 0; i < composed->argumentCount; ++i) {
     Argument &value = (*values)[static_cast<size_t>(i)];
+    value.maxUnits = kMaxShapedUnits;
     if (composed->types[i] == ComposedType::kText) {
       value.text = va_arg(copy, const UChar *);
       whole = whole && value.text;
+      value.maxUnits = value.text ? static_cast<uint32_t>(cxUnitsLength(value.text)) : 0;
     } else if (composed->types[i] == ComposedType::kInteger) {
       value.integer = va_arg(copy, int32_t);
     } else {
@@ -165,36 +191,92 @@ static bool readArguments(const QlxComposed *composed, va_list *args, Arguments 
   return whole;
 }
 
-static bool appendNumber(CxUStringBuff *text, const ComposedPiece &piece, ComposedType type,
-                         const Argument &value) {
-  icu::UnicodeString number;
-  if (type == ComposedType::kInteger)
-    piece.format->format(value.integer, number);
-  else
-    piece.format->format(value.number, number);
-  return cxUStringBuffAppendUnits(text, number.getBuffer(), static_cast<uint32_t>(number.length()));
-}
+namespace {
 
-static bool appendPiece(CxUStringBuff *text, const QlxComposed *composed,
-                        const ComposedPiece &piece, const Arguments &values) {
-  if (piece.text) {
-    return cxUStringBuffAppendUnits(text, piece.text, static_cast<uint32_t>(piece.length));
+// Puts a text together behind a buffer's own, for whose rest there is always room.
+class Composer {
+ public:
+  Composer(CxUStringBuff *text, const QlxComposed *composed, const Arguments &values)
+      : text_(text), composed_(*composed), values_(values) {
+    for (const ComposedPiece &piece : pieces()) rest_ += maxUnitsOf(piece);
   }
-  const Argument &value = values[static_cast<size_t>(piece.length)];
-  const ComposedType type = composed->types[piece.length];
-  if (type == ComposedType::kText) return CxUStringBuffAppendUStr(text, value.text);
-  return appendNumber(text, piece, type, value);
-}
+
+  bool compose() {
+    if (!reserve(0)) return false;
+    const uint32_t before = text_->length;
+    for (const ComposedPiece &piece : pieces()) {
+      rest_ -= maxUnitsOf(piece);
+      if (append(piece)) continue;
+      text_->length = before;
+      end()[0] = 0;
+      return false;
+    }
+    end()[0] = 0;
+    return true;
+  }
+
+ private:
+  std::span<const ComposedPiece> pieces() const {
+    return {composed_.pieces, static_cast<size_t>(composed_.pieceCount)};
+  }
+  const Argument &valueOf(const ComposedPiece &piece) const {
+    return values_[static_cast<size_t>(piece.length)];
+  }
+  uint32_t maxUnitsOf(const ComposedPiece &piece) const {
+    return piece.text ? static_cast<uint32_t>(piece.length) : valueOf(piece).maxUnits;
+  }
+
+  UChar *end() { return text_->data + text_->length; }
+
+  bool reserve(uint64_t units) {
+    units += rest_;
+    return units < UINT32_MAX && cxUStringBuffHasCapacity(text_, static_cast<uint32_t>(units));
+  }
+
+  bool appendUnits(const UChar *units, uint32_t length) {
+    std::memcpy(end(), units, length * sizeof(UChar));
+    text_->length += length;
+    return true;
+  }
+
+  bool append(const ComposedPiece &piece) {
+    if (piece.text) return appendUnits(piece.text, maxUnitsOf(piece));
+    const Argument &value = valueOf(piece);
+    const ComposedType type = composed_.types[piece.length];
+    if (type == ComposedType::kText) return appendUnits(value.text, value.maxUnits);
+    return appendShaped(type, value) || appendFormatted(type, value, *piece.format);
+  }
+
+  bool appendShaped(ComposedType type, const Argument &value) {
+    const auto place = static_cast<size_t>(shapedType(type));
+    if (!composed_.isShaped[place]) return false;
+    const NumberShape &shape = composed_.shapes[place];
+    const UChar *behind = type == ComposedType::kInteger
+                              ? qlxWriteShapedInteger(shape, value.integer, end())
+                              : qlxWriteShapedDouble(shape, value.number, end());
+    if (behind) text_->length = static_cast<uint32_t>(behind - text_->data);
+    return behind;
+  }
+
+  bool appendFormatted(ComposedType type, const Argument &value, const icu::NumberFormat &format) {
+    icu::UnicodeString number;
+    if (type == ComposedType::kInteger)
+      format.format(value.integer, number);
+    else
+      format.format(value.number, number);
+    const auto length = static_cast<uint32_t>(number.length());
+    return reserve(length) && appendUnits(number.getBuffer(), length);
+  }
+
+  CxUStringBuff *text_;
+  const QlxComposed &composed_;
+  const Arguments &values_;
+  uint64_t rest_ = 0;  // at most, of the pieces that are not appended yet
+};
+
+}  // namespace
 
 bool qlxAppendComposed(CxUStringBuff *text, const QlxComposed *composed, va_list *args) {
   Arguments values;
-  if (!readArguments(composed, args, &values)) return false;
-  const uint32_t before = text->length;
-  for (int32_t i = 0; i < composed->pieceCount; ++i) {
-    if (appendPiece(text, composed, composed->pieces[i], values)) continue;
-    text->length = before;
-    if (text->data) text->data[before] = 0;
-    return false;
-  }
-  return true;
+  return readArguments(composed, args, &values) && Composer(text, composed, values).compose();
 }

@@ -1,6 +1,6 @@
 // A message pattern taken apart into literal text and arguments of three plain types, so that a
-// text is put together without the machinery for all the other patterns. The numbers are written by
-// the formatters of the parsed message itself.
+// text is put together without the machinery for all the other patterns. The numbers are written in
+// the shapes of the parsed message's own formatters, or by these.
 #ifndef QLX_SRC_QLXCOMPOSED_H
 #define QLX_SRC_QLXCOMPOSED_H
 
@@ -11,6 +11,8 @@
 #include <unicode/umsg.h>
 
 #include <qlx/buffers.h>
+
+#include "QlxNumberShape.h"
 
 inline constexpr int32_t kMaxComposedPieces = 24;
 inline constexpr int32_t kMaxComposedArguments = 10;
@@ -28,6 +30,8 @@ struct QlxComposed {
   int32_t argumentCount;
   ComposedPiece pieces[kMaxComposedPieces];
   ComposedType types[kMaxComposedArguments];
+  bool isShaped[2];       // by ShapedNumber; false: the formatters write the numbers
+  NumberShape shapes[2];  // by ShapedNumber; formatters of one type are all made alike
 };
 
 // Takes a pattern apart that `message` was made of; both outlive the result. False when the pattern

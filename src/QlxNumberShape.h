@@ -1,0 +1,42 @@
+// What a plain decimal format does to a number, as data, so that common numbers are written without
+// ICU. A shape is used only after it wrote a set of numbers just as its format does; numbers whose
+// rounding is not plain are left to the format.
+#ifndef QLX_SRC_QLXNUMBERSHAPE_H
+#define QLX_SRC_QLXNUMBERSHAPE_H
+
+#include <array>
+#include <cstdint>
+
+#include <unicode/numfmt.h>
+
+#include <qlx/base.h>
+
+struct NumberAffix {
+  uint8_t length;
+  std::array<UChar, 7> units;
+};
+
+struct NumberShape {
+  std::array<UChar, 10> digits;
+  UChar decimalSeparator, groupSeparator;
+  int32_t groupSize;                          // of the group before the decimal separator
+  int32_t otherGroupSize;                     // of the groups before that one
+  uint64_t groupsFrom;                        // the least whole number that has groups
+  int32_t fractionDigits;                     // at most; trailing zeros are left out
+  std::array<NumberAffix, 2> prefix, suffix;  // of numbers that are not negative, and of negative
+};
+
+// More than any number that a shape writes has.
+inline constexpr uint32_t kMaxShapedUnits = 64;
+
+enum class ShapedNumber : uint8_t { kInteger, kDouble };
+
+// Takes the shape of a format for one type of numbers; false when it has none.
+bool qlxTakeNumberShape(NumberShape *shape, const icu::NumberFormat *format, ShapedNumber type);
+
+// Write a number at `out`, which has room for kMaxShapedUnits, and return its end; null when it is
+// left to the format. Every integer is written.
+UChar *qlxWriteShapedInteger(const NumberShape &shape, int32_t value, UChar *out);
+UChar *qlxWriteShapedDouble(const NumberShape &shape, double value, UChar *out);
+
+#endif

@@ -1,5 +1,6 @@
 #include "QlxComposed.h"
 
+#include <algorithm>
 #include <array>
 #include <cstring>
 #include <span>
@@ -19,7 +20,7 @@ struct Argument {
     int32_t integer;
     double number;
   };
-  uint32_t maxUnits;  // a text's length
+  uint32_t length;  // of a text
 };
 using Arguments = std::array<Argument, kMaxComposedArguments>;
 
@@ -176,11 +177,10 @@ static bool readArguments(const QlxComposed *composed, va_list *args, Arguments 
   bool whole = true;
   for (int32_t i = 0; i < composed->argumentCount; ++i) {
     Argument &value = (*values)[static_cast<size_t>(i)];
-    value.maxUnits = kMaxShapedUnits;
     if (composed->types[i] == ComposedType::kText) {
       value.text = va_arg(copy, const UChar *);
       whole = whole && value.text;
-      value.maxUnits = value.text ? static_cast<uint32_t>(cxUnitsLength(value.text)) : 0;
+      value.length = value.text ? static_cast<uint32_t>(cxUnitsLength(value.text)) : 0;
     } else if (composed->types[i] == ComposedType::kInteger) {
       value.integer = va_arg(copy, int32_t);
     } else {
@@ -193,63 +193,47 @@ static bool readArguments(const QlxComposed *composed, va_list *args, Arguments 
 
 namespace {
 
-// Puts a text together behind a buffer's own, for whose rest there is always room.
+// Puts a text together behind a buffer's own, which ends with its terminator only at the end.
 class Composer {
  public:
   Composer(CxUStringBuff *text, const QlxComposed *composed, const Arguments &values)
-      : text_(text), composed_(*composed), values_(values) {
-    for (const ComposedPiece &piece : pieces()) rest_ += maxUnitsOf(piece);
-  }
+      : text_(text), composed_(*composed), values_(values) {}
 
   bool compose() {
-    if (!reserve(0)) return false;
     const uint32_t before = text_->length;
-    for (const ComposedPiece &piece : pieces()) {
-      rest_ -= maxUnitsOf(piece);
-      if (append(piece)) continue;
-      text_->length = before;
-      end()[0] = 0;
-      return false;
-    }
-    end()[0] = 0;
-    return true;
+    const std::span pieces{composed_.pieces, static_cast<size_t>(composed_.pieceCount)};
+    const bool whole =
+        std::ranges::all_of(pieces, [this](const ComposedPiece &piece) { return append(piece); });
+    if (!whole) text_->length = before;
+    if (text_->data) *end() = 0;
+    return whole;
   }
 
  private:
-  std::span<const ComposedPiece> pieces() const {
-    return {composed_.pieces, static_cast<size_t>(composed_.pieceCount)};
-  }
-  const Argument &valueOf(const ComposedPiece &piece) const {
-    return values_[static_cast<size_t>(piece.length)];
-  }
-  uint32_t maxUnitsOf(const ComposedPiece &piece) const {
-    return piece.text ? static_cast<uint32_t>(piece.length) : valueOf(piece).maxUnits;
-  }
-
   UChar *end() { return text_->data + text_->length; }
 
-  bool reserve(uint64_t units) {
-    units += rest_;
-    return units < UINT32_MAX && cxUStringBuffHasCapacity(text_, static_cast<uint32_t>(units));
+  bool reserve(uint32_t units) {
+    return cxUStringBuffFits(text_, units) || cxUStringBuffHasCapacity(text_, units);
   }
 
   bool appendUnits(const UChar *units, uint32_t length) {
+    if (!reserve(length)) return false;
     std::memcpy(end(), units, length * sizeof(UChar));
     text_->length += length;
     return true;
   }
 
   bool append(const ComposedPiece &piece) {
-    if (piece.text) return appendUnits(piece.text, maxUnitsOf(piece));
-    const Argument &value = valueOf(piece);
+    if (piece.text) return appendUnits(piece.text, static_cast<uint32_t>(piece.length));
+    const Argument &value = values_[static_cast<size_t>(piece.length)];
     const ComposedType type = composed_.types[piece.length];
-    if (type == ComposedType::kText) return appendUnits(value.text, value.maxUnits);
+    if (type == ComposedType::kText) return appendUnits(value.text, value.length);
     return appendShaped(type, value) || appendFormatted(type, value, *piece.format);
   }
 
   bool appendShaped(ComposedType type, const Argument &value) {
     const auto place = static_cast<size_t>(shapedType(type));
-    if (!composed_.isShaped[place]) return false;
+    if (!composed_.isShaped[place] || !reserve(kMaxShapedUnits)) return false;
     const NumberShape &shape = composed_.shapes[place];
     const UChar *behind = type == ComposedType::kInteger
                               ? qlxWriteShapedInteger(shape, value.integer, end())
@@ -264,14 +248,12 @@ class Composer {
       format.format(value.integer, number);
     else
       format.format(value.number, number);
-    const auto length = static_cast<uint32_t>(number.length());
-    return reserve(length) && appendUnits(number.getBuffer(), length);
+    return appendUnits(number.getBuffer(), static_cast<uint32_t>(number.length()));
   }
 
   CxUStringBuff *text_;
   const QlxComposed &composed_;
   const Arguments &values_;
-  uint64_t rest_ = 0;  // at most, of the pieces that are not appended yet
 };
 
 }  // namespace

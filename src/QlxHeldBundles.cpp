@@ -25,10 +25,12 @@ struct BundleKey {
 static constexpr const char *BundleKey::*kKeyTexts[] = {&BundleKey::name, &BundleKey::locale,
                                                         &BundleKey::defaultLocale};
 
-// What the scan of a pattern found; patterns stay where they are while their bundle is held.
-struct Scan {
-  const UChar *pattern;
-  bool readable;
+// What is known of a key of a bundle. A text stays where it is while its bundle is held.
+struct BundlePattern {
+  std::array<char, 48> key;
+  std::u16string_view text;  // its data is null: nothing is known, all zero
+  KnownMessage message;
+  bool isScanned, isReadable;
   ArgTypes types;
 };
 
@@ -36,7 +38,7 @@ struct HeldBundle {
   UResourceBundle *bundle;  // null: a free place, all zero
   BundleKey key;            // with copies of the texts, owned
   uint64_t lastUse;         // larger is later
-  std::array<Scan, 16> scans;
+  std::array<BundlePattern, 64> patterns;
 };
 
 static constexpr int kMaxHeldBundles = 16;
@@ -98,26 +100,52 @@ static void hold(const BundleKey &key, icu::LocalUResourceBundlePointer &bundle)
   place.lastUse = ++gUses;
 }
 
-// The text ends at its first zero, where it has one.
-static std::u16string_view lookUp(const UResourceBundle *bundle, const char *key,
-                                  UErrorCode *status) {
-  *status = U_ZERO_ERROR;
-  const UChar *pattern = ures_getStringByKey(bundle, key, nullptr, status);
-  if (U_FAILURE(*status)) return {};
-  return {pattern, cxUnitsLength(pattern)};
+// The place of a key's pattern; null: the key is too long for one.
+static BundlePattern *placeOf(HeldBundle *held, const char *key) {
+  uint32_t hash = 2166136261U;  // FNV-1a
+  size_t length = 0;
+  for (; key[length] != 0; ++length) {
+    if (length + 1 == sizeof BundlePattern::key) return nullptr;
+    hash = (hash ^ static_cast<uint8_t>(key[length])) * 16777619U;
+  }
+  return &held->patterns[hash % held->patterns.size()];
 }
 
-// Calls use(held bundle or null, pattern); not at all when the bundle cannot be opened.
+// The text ends at its first zero, where it has one.
+static void lookUp(BundlePattern *pattern, const UResourceBundle *bundle, const char *key,
+                   UErrorCode *status) {
+  *status = U_ZERO_ERROR;
+  const UChar *text = ures_getStringByKey(bundle, key, nullptr, status);
+  if (U_SUCCESS(*status)) *pattern = {{}, {text, cxUnitsLength(text)}, {}, false, false, {}};
+}
+
+// Null when there is no pattern. `room` takes one that has no place.
+static BundlePattern *patternOf(HeldBundle *held, const char *key, BundlePattern *room,
+                                UErrorCode *status) {
+  BundlePattern *const place = key ? placeOf(held, key) : nullptr;
+  if (place && place->text.data() && std::strcmp(place->key.data(), key) == 0) return place;
+  lookUp(room, held->bundle, key, status);
+  if (U_FAILURE(*status)) return nullptr;
+  if (!place) return room;
+  std::strcpy(room->key.data(), key);
+  *place = *room;
+  return place;
+}
+
+// Calls use(pattern) when there is one.
 template <typename Use>
 static void withPattern(const MessageName &message, UErrorCode *status, Use use) {
-  const BundleKey key{message.bundle, message.locale, uloc_getDefault()};
+  const BundleKey key{message.bundle, message.locale, qlxIntlCheckHeldLocale()};
+  BundlePattern room{};
   if (HeldBundle *held = find(key)) {
     held->lastUse = ++gUses;
-    return use(held, lookUp(held->bundle, message.key, status));
+    if (BundlePattern *pattern = patternOf(held, message.key, &room, status)) use(*pattern);
+    return;
   }
   icu::LocalUResourceBundlePointer fresh = open(message.bundle, message.locale, status);
   if (U_FAILURE(*status)) return;
-  use(nullptr, lookUp(fresh.getAlias(), message.key, status));
+  lookUp(&room, fresh.getAlias(), message.key, status);
+  if (U_SUCCESS(*status)) use(room);
   hold(key, fresh);
 }
 
@@ -125,30 +153,25 @@ uint32_t qlxAppendBundleMessage(CxUStringBuff *text, const MessageName &message,
                                 UErrorCode *status) {
   const HeldFormatsLock lock;
   uint32_t appended = 0;
-  withPattern(message, status, [&](HeldBundle *, std::u16string_view pattern) {
-    if (U_SUCCESS(*status)) {
-      appended = qlxIntlAppendHeldMessage(text, message.locale, pattern, args, status);
-    }
+  withPattern(message, status, [&](BundlePattern &pattern) {
+    appended = qlxIntlAppendHeldMessage(text, &pattern.message, message.locale, pattern.text, args,
+                                        status);
   });
   return appended;
-}
-
-static const Scan &scanOf(HeldBundle *held, const UChar *pattern, Scan *room) {
-  const size_t place = reinterpret_cast<uintptr_t>(pattern) / sizeof(uint64_t);
-  Scan &scan = held ? held->scans[place % held->scans.size()] : *room;
-  if (scan.pattern == pattern) return scan;
-  scan.pattern = pattern;
-  scan.readable = qlxScanPatternTypes(pattern, &scan.types);
-  return scan;
 }
 
 bool qlxScanBundlePattern(const MessageName &message, ArgTypes *types) {
   const HeldFormatsLock lock;
   UErrorCode status = U_ZERO_ERROR;
-  Scan room{};
-  withPattern(message, &status, [&](HeldBundle *held, std::u16string_view pattern) {
-    if (U_SUCCESS(status)) room = scanOf(held, pattern.data(), &room);
+  bool isReadable = false;
+  *types = {};
+  withPattern(message, &status, [&](BundlePattern &pattern) {
+    if (!pattern.isScanned) {
+      pattern.isReadable = qlxScanPatternTypes(pattern.text.data(), &pattern.types);
+    }
+    pattern.isScanned = true;
+    isReadable = pattern.isReadable;
+    *types = pattern.types;
   });
-  *types = room.types;
-  return room.readable;
+  return isReadable;
 }

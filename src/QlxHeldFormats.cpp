@@ -31,8 +31,10 @@ static void check(std::array<char, size> &known, const char *name) {
   std::strncpy(known.data(), name, size - 1);
 }
 
-void qlxIntlCheckHeldLocale(void) {
-  check(gLocale, uloc_getDefault());
+const char *qlxIntlCheckHeldLocale(void) {
+  const char *name = uloc_getDefault();
+  check(gLocale, name);
+  return name;
 }
 
 void qlxIntlCheckHeldCodePage(void) {

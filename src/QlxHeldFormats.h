@@ -67,8 +67,13 @@ void qlxDropHeldFormats(void);
 void qlxHeldFormatsLock(void);
 void qlxHeldFormatsUnlock(void);
 
-// For the modules that hold, which have the lock.
-uint32_t qlxIntlAppendHeldMessage(CxUStringBuff *text, const char *locale,
+// For the modules that hold, which have the lock. `known` is where the message of this pattern and
+// locale was held the last time, all zero at first; the default locale was checked before.
+struct KnownMessage {
+  struct HeldMessage *held;
+  uint64_t serial;  // of what the place held then
+};
+uint32_t qlxIntlAppendHeldMessage(CxUStringBuff *text, KnownMessage *known, const char *locale,
                                   std::u16string_view pattern, va_list *args, UErrorCode *status);
 void qlxIntlDropHeldBundles(void);
 void qlxIntlDropHeldMessages(void);
@@ -76,7 +81,7 @@ void qlxIntlDropHeldDates(void);
 void qlxIntlDropHeldNumbers(void);
 
 // Each drops everything when that default is not the one of its last call.
-void qlxIntlCheckHeldLocale(void);
+const char *qlxIntlCheckHeldLocale(void);  // the default locale's name
 void qlxIntlCheckHeldZone(void);
 void qlxIntlCheckHeldCodePage(void);
 

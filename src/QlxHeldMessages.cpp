@@ -21,19 +21,23 @@
 struct PatternKey {
   const char *locale;  // null is the default locale, and not the same as ""
   std::u16string_view pattern;
-  uint32_t hash;  // of the pattern
+  uint32_t tag;  // of the pattern
 };
+
+enum class Composing : uint8_t { kUntried, kLeftToIcu, kDone };
 
 struct HeldMessage {
   UMessageFormat *format;  // null: a free place, all zero
-  bool isComposed;         // false: the pattern is left to ICU
+  Composing composing;     // untried until the message is found again
   QlxComposed composed;
   PatternKey key;  // with copies of the two texts, owned
   bool usesZone;
+  uint64_t serial;   // another one for whatever is held
   uint64_t lastUse;  // larger is later
 };
 
 static HeldMessage gMessages[kMaxHeldMessages];
+static HeldMessage *gLatest[kMaxHeldMessages];  // by tag: the place looked for last, null: none
 static uint64_t gUses;
 
 // Missing arguments read as zeros up to this many.
@@ -51,29 +55,48 @@ void qlxIntlDropHeldMessages(void) {
     if (held.format) drop(held);
 }
 
-static uint32_t hashOf(std::u16string_view pattern) {
-  uint32_t hash = 2166136261U;  // FNV-1a
-  for (const char16_t unit : pattern) hash = (hash ^ unit) * 16777619U;
-  return hash;
+// Tells most patterns apart without reading all of them: from the length and the units at both ends
+// and in the middle.
+static uint32_t tagOf(std::u16string_view pattern) {
+  constexpr uint64_t kSpread = 0x9E3779B97F4A7C15;
+  constexpr size_t kUnits = sizeof(uint64_t) / sizeof(UChar);
+  uint64_t tag = pattern.size() * kSpread;
+  const auto add = [&](uint64_t units) { tag = (tag ^ units) * kSpread; };
+  if (pattern.size() < kUnits) {
+    for (const char16_t unit : pattern) add(unit);
+  } else {
+    const size_t last = pattern.size() - kUnits;
+    for (const size_t at : {size_t{0}, last / 2, last}) {
+      uint64_t units;
+      std::memcpy(&units, pattern.data() + at, sizeof units);
+      add(units);
+    }
+  }
+  return static_cast<uint32_t>(tag >> 32);
 }
 
-static bool sameKey(const PatternKey &a, const PatternKey &b) {
-  return a.hash == b.hash && a.pattern == b.pattern && qlxSameText(a.locale, b.locale);
+static bool samePattern(std::u16string_view a, std::u16string_view b) {
+  return a.size() == b.size() && std::memcmp(a.data(), b.data(), a.size() * sizeof(UChar)) == 0;
+}
+
+static bool isAt(const HeldMessage &held, const PatternKey &key) {
+  return held.format && held.key.tag == key.tag && samePattern(held.key.pattern, key.pattern) &&
+         qlxSameText(held.key.locale, key.locale);
 }
 
 static HeldMessage *find(const PatternKey &key) {
+  HeldMessage *&latest = gLatest[key.tag % std::size(gLatest)];
+  if (latest && isAt(*latest, key)) return latest;
   for (HeldMessage &held : gMessages)
-    if (held.format && sameKey(held.key, key)) return &held;
+    if (isAt(held, key)) return latest = &held;
   return nullptr;
 }
 
-// The held format that the defaults of this moment would give too.
-static HeldMessage *findCurrent(const PatternKey &key) {
-  qlxIntlCheckHeldLocale();
-  HeldMessage *held = find(key);
-  if (!held || !held->usesZone) return held;
+// Whether the defaults of this moment would give the same format.
+static bool isCurrent(const HeldMessage &held) {
+  if (!held.usesZone) return true;
   qlxIntlCheckHeldZone();
-  return held->format ? held : nullptr;
+  return held.format;
 }
 
 // Whether an argument may have one of the types, which are words in any mix of case.
@@ -120,10 +143,9 @@ static void hold(const PatternKey &key, bool usesZone, icu::LocalUMessageFormatP
   HeldMessage &place = *std::ranges::min_element(gMessages, {}, &HeldMessage::lastUse);
   drop(place);
   place.format = format.orphan();
-  place.key = {locale.release(), {pattern.release(), key.pattern.size()}, key.hash};
+  place.key = {locale.release(), {pattern.release(), key.pattern.size()}, key.tag};
   place.usesZone = usesZone;
-  place.lastUse = ++gUses;
-  place.isComposed = qlxCompose(&place.composed, place.key.pattern, place.format);
+  place.serial = place.lastUse = ++gUses;
 }
 
 // The highest number that an argument of the pattern may have, or -1. What only looks like an
@@ -192,35 +214,62 @@ static uint32_t appendPlain(CxUStringBuff *text, std::u16string_view pattern, UE
   return units;
 }
 
-static uint32_t appendHeld(CxUStringBuff *text, const HeldMessage &held, va_list *args,
+static bool isComposed(HeldMessage &held) {
+  if (held.composing == Composing::kUntried) {
+    const bool done = qlxCompose(&held.composed, held.key.pattern, held.format);
+    held.composing = done ? Composing::kDone : Composing::kLeftToIcu;
+  }
+  return held.composing == Composing::kDone;
+}
+
+static uint32_t appendHeld(CxUStringBuff *text, HeldMessage &held, va_list *args,
                            UErrorCode *status) {
+  held.lastUse = ++gUses;
   const uint32_t before = text->length;
   *status = U_ZERO_ERROR;
-  if (args && held.isComposed && qlxAppendComposed(text, &held.composed, args)) {
+  if (args && isComposed(held) && qlxAppendComposed(text, &held.composed, args)) {
     return text->length - before;
   }
   return append(text, held.format, held.key.pattern, args, status);
 }
 
-uint32_t qlxIntlAppendHeldMessage(CxUStringBuff *text, const char *locale,
-                                  std::u16string_view pattern, va_list *args, UErrorCode *status) {
-  if (qlxIsPlainPattern(pattern.data(), pattern.size())) return appendPlain(text, pattern, status);
-  const PatternKey key{locale, pattern, hashOf(pattern)};
-  if (HeldMessage *held = findCurrent(key)) {
-    held->lastUse = ++gUses;
+// The pattern is not a plain one.
+static uint32_t appendParsed(CxUStringBuff *text, KnownMessage *known, const char *locale,
+                             std::u16string_view pattern, va_list *args, UErrorCode *status) {
+  HeldMessage *held = known->held;
+  PatternKey key{locale, pattern, 0};
+  if (!held || held->serial != known->serial) {
+    key.tag = tagOf(pattern);
+    held = find(key);
+  }
+  if (held && isCurrent(*held)) {
+    *known = {held, held->serial};
     return appendHeld(text, *held, args, status);
   }
-  const bool usesZone = mayUseZone(key.pattern);
+  key.tag = tagOf(pattern);
+  const bool usesZone = mayUseZone(pattern);
   *status = U_ZERO_ERROR;
   icu::LocalUMessageFormatPointer fresh = open(key, usesZone, status);
   if (U_FAILURE(*status)) return 0;
   const UMessageFormat *format = fresh.getAlias();
   hold(key, usesZone, fresh);
-  return append(text, format, key.pattern, args, status);
+  return append(text, format, pattern, args, status);
+}
+
+uint32_t qlxIntlAppendHeldMessage(CxUStringBuff *text, KnownMessage *known, const char *locale,
+                                  std::u16string_view pattern, va_list *args, UErrorCode *status) {
+  if (!known->held && qlxIsPlainPattern(pattern.data(), pattern.size())) {
+    return appendPlain(text, pattern, status);
+  }
+  return appendParsed(text, known, locale, pattern, args, status);
 }
 
 uint32_t qlxAppendHeldMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
                               va_list *args, UErrorCode *status) {
   const HeldFormatsLock lock;
-  return qlxIntlAppendHeldMessage(text, locale, {pattern, cxUnitsLength(pattern)}, args, status);
+  const std::u16string_view whole{pattern, cxUnitsLength(pattern)};
+  if (qlxIsPlainPattern(pattern, whole.size())) return appendPlain(text, whole, status);
+  qlxIntlCheckHeldLocale();
+  KnownMessage none{};
+  return appendParsed(text, &none, locale, whole, args, status);
 }

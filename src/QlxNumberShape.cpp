@@ -36,18 +36,18 @@ static UChar *wholeBefore(const NumberShape &shape, uint64_t value, UChar *end) 
   return end;
 }
 
-// Writes so many digits, without the zeros at their end, and the separator before them.
-static UChar *writeFraction(const NumberShape &shape, uint64_t value, UChar *out) {
+// Writes the separator and the fraction's digits, without the zeros at their end.
+static UChar *writeFraction(const NumberShape &shape, uint32_t value, UChar *out) {
   if (value == 0) return out;
   int32_t count = shape.fractionDigits;
   for (; value % 10 == 0; value /= 10) --count;
   *out = shape.decimalSeparator;
-  for (int32_t i = count; i > 0; value /= 10) out[i--] = shape.digits[value % 10];
+  for (UChar *digit = out + count; digit != out; value /= 10) *digit-- = shape.digits[value % 10];
   return out + count + 1;
 }
 
 static UChar *writeNumber(const NumberShape &shape, bool negative, uint64_t whole,
-                          uint64_t fraction, UChar *out) {
+                          uint32_t fraction, UChar *out) {
   std::array<UChar, kMaxShapedUnits> room;
   UChar *const end = room.data() + room.size();
   const UChar *const first = wholeBefore(shape, whole, end);
@@ -76,7 +76,7 @@ UChar *qlxWriteShapedDouble(const NumberShape &shape, double value, UChar *out) 
   const bool negative = std::signbit(value);
   if (nearest == 0 && negative) return nullptr;
   const auto units = static_cast<uint64_t>(unit);
-  return writeNumber(shape, negative, nearest / units, nearest % units, out);
+  return writeNumber(shape, negative, nearest / units, static_cast<uint32_t>(nearest % units), out);
 }
 
 // ---- Taking
@@ -142,11 +142,7 @@ bool takeGroups(const DecimalFormat &format, NumberShape *shape) {
   return true;
 }
 
-using TakeText = UnicodeString &(DecimalFormat::*)(UnicodeString &) const;
-
-bool takeAffix(const DecimalFormat &format, TakeText take, NumberAffix *affix) {
-  UnicodeString text;
-  (format.*take)(text);
+bool takeAffix(const UnicodeString &text, NumberAffix *affix) {
   const int32_t length = text.length();
   if (length > static_cast<int32_t>(affix->units.size())) return false;
   affix->length = static_cast<uint8_t>(length);
@@ -154,18 +150,20 @@ bool takeAffix(const DecimalFormat &format, TakeText take, NumberAffix *affix) {
   return true;
 }
 
-bool takeAffixes(const DecimalFormat &format, NumberShape *shape) {
-  return takeAffix(format, &DecimalFormat::getPositivePrefix, &shape->prefix[0]) &&
-         takeAffix(format, &DecimalFormat::getNegativePrefix, &shape->prefix[1]) &&
-         takeAffix(format, &DecimalFormat::getPositiveSuffix, &shape->suffix[0]) &&
-         takeAffix(format, &DecimalFormat::getNegativeSuffix, &shape->suffix[1]);
+// What stands around the one digit of a number; ICU's getters for it cost far more.
+bool takeAffixes(const DecimalFormat &format, NumberShape *shape, bool negative) {
+  UnicodeString text;
+  format.format(int32_t{negative ? -7 : 7}, text);
+  const int32_t digit = text.indexOf(shape->digits[7]);
+  return digit >= 0 && takeAffix(text.tempSubString(0, digit), &shape->prefix[negative]) &&
+         takeAffix(text.tempSubString(digit + 1), &shape->suffix[negative]);
 }
 
 bool take(const DecimalFormat &format, NumberShape *shape) {
   shape->fractionDigits = format.getMaximumFractionDigits();
   return isPlain(format) && hasPlainDigits(format) &&
          takeSymbols(format.getDecimalFormatSymbols(), shape) && takeGroups(format, shape) &&
-         takeAffixes(format, shape);
+         takeAffixes(format, shape, false) && takeAffixes(format, shape, true);
 }
 
 // ---- Proving

@@ -59,18 +59,13 @@ uint8_t cxUStringBuffAppendUnits(CxUStringBuff *buffer, const UChar *text, uint3
   return extend(buffer, units);
 }
 
-// Whether as many units as there are bytes, the most they can become, fit without growing.
-static bool fits(const CxUStringBuff *buffer, uint32_t bytes) {
-  return (uint64_t{buffer->length} + bytes + 1) * sizeof(UChar) <= buffer->capacity;
-}
-
 // Appends bytes of the default code page, none of them zero. The buffer grows by what they become,
 // so what might become shorter and does not fit as it is takes the way over a copy.
 static uint8_t appendBytes(CxUStringBuff *buffer, const char *text, uint32_t bytes) {
-  const bool plainAndLong =
-      buffer && buffer->data && !fits(buffer, bytes) && cxUStringIsPlainAscii(text, bytes);
+  const bool plainAndLong = buffer && buffer->data && !cxUStringBuffFits(buffer, bytes) &&
+                            cxUStringIsPlainAscii(text, bytes);
   if (!cxUStringBuffHasCapacity(buffer, plainAndLong ? bytes : 0)) return 0;
-  if (fits(buffer, bytes)) {
+  if (cxUStringBuffFits(buffer, bytes)) {  // no byte becomes more than a unit
     if (cxUStringWiden(endOf(buffer), text, bytes)) return extend(buffer, bytes);
     return extend(buffer, cxUStringConvert(endOf(buffer), text, bytes));
   }

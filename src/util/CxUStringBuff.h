@@ -1,4 +1,4 @@
-// The room check of the UTF-16 buffer.
+// Appending to the UTF-16 buffer by lengths that are known.
 #ifndef QLX_SRC_CXUSTRINGBUFF_H
 #define QLX_SRC_CXUSTRINGBUFF_H
 
@@ -7,6 +7,11 @@
 #include <qlx/buffers.h>
 
 QLX_BEGIN_DECLS
+
+// Whether so many units and the terminator fit behind the text without growing.
+inline bool cxUStringBuffFits(const CxUStringBuff *buffer, uint32_t units) {
+  return (uint64_t{buffer->length} + units + 1) * sizeof(UChar) <= buffer->capacity;
+}
 
 // Makes room for `extra` code units and the terminator behind the text; makes the first block.
 // Returns 1, or 0 with the text unchanged.

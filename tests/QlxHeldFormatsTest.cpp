@@ -9,7 +9,6 @@
 #include <cmath>
 #include <string>
 #include <thread>
-#include <unordered_map>
 #include <vector>
 
 #include <unicode/udat.h>
@@ -353,28 +352,38 @@ TEST_F(HeldFormatsTest, AMessageParsedInAnotherZoneIsNotForTheFirstOne) {
   EXPECT_EQ(inZone(u"UTC", u"at {0,time,HH:mm}"), u"at 10:48");
 }
 
-// As the held messages are told apart first.
-uint32_t hashOf(const std::u16string &pattern) {
-  uint32_t hash = 2166136261U;
-  for (const char16_t unit : pattern) hash = (hash ^ unit) * 16777619U;
-  return hash;
+TEST_F(HeldFormatsTest, PatternsThatDifferInOneUnitAreToldApart) {
+  const std::u16string whole = u"{0} and a text that is long enough to have a middle: {0}";
+  for (int round = 0; round < 2; ++round)
+    for (size_t at = 3; at < whole.size() - 3; ++at) {
+      std::u16string other = whole;
+      other[at] = u'\x3b1';
+      compare("en", other.c_str(), u"x");
+      compare("en", whole.c_str(), u"x");
+    }
 }
 
-TEST_F(HeldFormatsTest, PatternsOfTheSameLengthAndHashAreToldApart) {
-  std::unordered_map<uint32_t, std::u16string> seen;
-  std::u16string first, second;
-  for (uint32_t number = 0; number < 1'000'000 && second.empty(); ++number) {
-    std::u16string pattern = u"{0}";
-    for (uint32_t rest = number * 2654435761U; pattern.size() < 9; rest /= 40)
-      pattern += static_cast<char16_t>(0x4E00 + rest % 40);
-    const auto [place, isNew] = seen.try_emplace(hashOf(pattern), pattern);
-    if (isNew) continue;
-    first = place->second;
-    second = pattern;
+TEST_F(HeldFormatsTest, PatternsOfEveryLengthAreToldApart) {
+  for (int round = 0; round < 2; ++round) {
+    for (const UChar *pattern : {u"'", u"''", u"'a", u"'b", u"''a", u"'{'", u"{0}", u"a{0}", u"{"})
+      compare("en", pattern, u"x");
+    std::u16string longer = u"{0}";
+    for (int length = 0; length < 40; ++length) compare("en", (longer += u'a').c_str(), u"x");
   }
-  ASSERT_FALSE(second.empty());
-  compare(nullptr, first.c_str(), u"x");
-  compare(nullptr, second.c_str(), u"x");
+}
+
+TEST_F(HeldFormatsTest, OnePatternInSeveralLocalesIsToldApart) {
+  for (int round = 0; round < 3; ++round)
+    for (const char *locale : {"en", "de", static_cast<const char *>(nullptr), "", "de_CH", "hi"})
+      compare(locale, u"{0,number}", 1234567.5);
+}
+
+TEST_F(HeldFormatsTest, NumbersFollowTheDefaultLocaleFromCallToCall) {
+  for (const char *locale : {"en", "de", "ar_EG", "en", "hi@numbers=deva"}) {
+    ASSERT_TRUE(IcuDefaults::setLocale(locale));
+    compare(nullptr, u"{0,number} {1,number,integer}", -1234.5, 7654321);
+    compare("fr", u"{0,number} {1,number,integer}", -1234.5, 7654321);
+  }
 }
 
 TEST_F(HeldFormatsTest, NoLocaleIsTheDefaultOneAndAnEmptyLocaleIsNot) {

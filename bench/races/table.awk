@@ -86,7 +86,7 @@ function cell(logger, name, middle, text) {
 function fastest(name, i, best, least, middle) {
   best = ""
   for (i = 1; i <= columns; i++) {
-    if (column[i] == "bare" || column[i] == "qlx") continue
+    if (column[i] == "bare" || column[i] == "qlx" || column[i] == "profiled") continue
     if (!((column[i], name) in written) || !isRight(column[i], name)) continue
     middle = times(column[i], name)
     if (best == "" || middle < least) { best = column[i]; least = middle }

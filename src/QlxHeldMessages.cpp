@@ -2,6 +2,7 @@
 #include "QlxHeldFormats.h"
 
 #include <algorithm>
+#include <array>
 #include <cstring>
 #include <initializer_list>
 #include <string_view>
@@ -37,7 +38,7 @@ struct HeldMessage {
 };
 
 static HeldMessage gMessages[kMaxHeldMessages];
-static HeldMessage *gLatest[kMaxHeldMessages];  // by tag: the place looked for last, null: none
+static std::array<KnownMessage, kMaxHeldMessages> gLatest;  // by tag: the callers' patterns
 static uint64_t gUses;
 
 // Missing arguments read as zeros up to this many.
@@ -85,10 +86,8 @@ static bool isAt(const HeldMessage &held, const PatternKey &key) {
 }
 
 static HeldMessage *find(const PatternKey &key) {
-  HeldMessage *&latest = gLatest[key.tag % std::size(gLatest)];
-  if (latest && isAt(*latest, key)) return latest;
   for (HeldMessage &held : gMessages)
-    if (isAt(held, key)) return latest = &held;
+    if (isAt(held, key)) return &held;
   return nullptr;
 }
 
@@ -143,7 +142,7 @@ static void hold(const PatternKey &key, bool usesZone, icu::LocalUMessageFormatP
   HeldMessage &place = *std::ranges::min_element(gMessages, {}, &HeldMessage::lastUse);
   drop(place);
   place.format = format.orphan();
-  place.key = {locale.release(), {pattern.release(), key.pattern.size()}, key.tag};
+  place.key = {locale.release(), {pattern.release(), key.pattern.size()}, tagOf(key.pattern)};
   place.usesZone = usesZone;
   place.serial = place.lastUse = ++gUses;
 }
@@ -234,42 +233,47 @@ static uint32_t appendHeld(CxUStringBuff *text, HeldMessage &held, va_list *args
 }
 
 // The pattern is not a plain one.
-static uint32_t appendParsed(CxUStringBuff *text, KnownMessage *known, const char *locale,
-                             std::u16string_view pattern, va_list *args, UErrorCode *status) {
+static uint32_t appendParsed(CxUStringBuff *text, KnownMessage *known, PatternKey key,
+                             va_list *args, UErrorCode *status) {
   HeldMessage *held = known->held;
-  PatternKey key{locale, pattern, 0};
   if (!held || held->serial != known->serial) {
-    key.tag = tagOf(pattern);
+    key.tag = tagOf(key.pattern);
     held = find(key);
   }
   if (held && isCurrent(*held)) {
     *known = {held, held->serial};
     return appendHeld(text, *held, args, status);
   }
-  key.tag = tagOf(pattern);
-  const bool usesZone = mayUseZone(pattern);
+  const bool usesZone = mayUseZone(key.pattern);
   *status = U_ZERO_ERROR;
   icu::LocalUMessageFormatPointer fresh = open(key, usesZone, status);
   if (U_FAILURE(*status)) return 0;
   const UMessageFormat *format = fresh.getAlias();
   hold(key, usesZone, fresh);
-  return append(text, format, pattern, args, status);
+  return append(text, format, key.pattern, args, status);
+}
+
+// A message that is known has no plain pattern.
+static bool isPlain(const KnownMessage &known, std::u16string_view pattern) {
+  return !known.held && qlxIsPlainPattern(pattern.data(), pattern.size());
 }
 
 uint32_t qlxIntlAppendHeldMessage(CxUStringBuff *text, KnownMessage *known, const char *locale,
                                   std::u16string_view pattern, va_list *args, UErrorCode *status) {
-  if (!known->held && qlxIsPlainPattern(pattern.data(), pattern.size())) {
-    return appendPlain(text, pattern, status);
-  }
-  return appendParsed(text, known, locale, pattern, args, status);
+  if (isPlain(*known, pattern)) return appendPlain(text, pattern, status);
+  return appendParsed(text, known, {locale, pattern, 0}, args, status);
 }
 
 uint32_t qlxAppendHeldMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
                               va_list *args, UErrorCode *status) {
   const HeldFormatsLock lock;
   const std::u16string_view whole{pattern, cxUnitsLength(pattern)};
-  if (qlxIsPlainPattern(pattern, whole.size())) return appendPlain(text, whole, status);
+  const PatternKey key{locale, whole, tagOf(whole)};
+  KnownMessage &latest = gLatest[key.tag % gLatest.size()];
+  KnownMessage known = latest.held && isAt(*latest.held, key) ? latest : KnownMessage{};
+  if (isPlain(known, whole)) return appendPlain(text, whole, status);
   qlxIntlCheckHeldLocale();
-  KnownMessage none{};
-  return appendParsed(text, &none, locale, whole, args, status);
+  const uint32_t appended = appendParsed(text, &known, key, args, status);
+  latest = known;
+  return appended;
 }

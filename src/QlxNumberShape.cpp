@@ -172,11 +172,10 @@ constexpr int32_t kIntegers[] = {0,     7,      -7,      12,         999,       
                                  -1000, 12345,  -99999,  1234567890, INT32_MAX, INT32_MIN,
                                  98765, 654321, 7654321, -10000000};
 
-constexpr double kDoubles[] = {0,     7,      -12,          0.5,       -2.5,         1.75,
-                               0.125, 0.0625, 0.0005,       0.0009,    999.999,      -999.9996,
-                               1000,  12345,  -98765.4321,  0.000001,  1234567.0625, 1e9 + .25,
-                               1e9,   -1e8,   40302010.605, 1.0 / 3.0, -200.0 / 3.0, 9999.9,
-                               1e12};
+// Few of them have a fraction: these cost ICU ten times what whole numbers do.
+constexpr double kDoubles[] = {0,         7,           -12,       1000,         12345,
+                               9999,      1e9,         1e12,      0.5,          0.0009,
+                               -999.9996, -98765.4321, 1e9 + .25, 40302010.605, 200.0 / 3.0};
 
 bool isWritten(const UnicodeString &expected, const UChar *text, const UChar *end) {
   return expected == UnicodeString(false, text, static_cast<int32_t>(end - text));

@@ -214,8 +214,10 @@ TEST(QlxNumberShapeTest, FormatsOfOtherClassesHaveNoShape) {
 
 TEST(QlxNumberShapeTest, UnusualPatternsHaveNoShape) {
   EXPECT_TRUE(hasShape(*withPattern("#,##0.###")));
-  for (const char *pattern : {"0.###E0", "@@#", "0.00", "#,#00.##", ".00", "0.5", "*x#,##0.##",
-                              "0.##%", "0.##\u2030", "0.#######", "0.", "'more than seven '0"})
+  EXPECT_TRUE(hasShape(*withPattern("'six   '0'seven  '")));
+  for (const char *pattern :
+       {"0.###E0", "@@#", "0.00", "#,#00.##", ".00", "0.5", "*x#,##0.##", "0.##%", "0.##\u2030",
+        "0.#######", "0.", "'seven  '0", "0'eight   '"})
     EXPECT_FALSE(hasShape(*withPattern(pattern))) << pattern;
 }
 

@@ -39,8 +39,8 @@ struct QlxComposed {
 // out, or is too long.
 bool qlxCompose(QlxComposed *composed, std::u16string_view pattern, const UMessageFormat *message);
 
-// Appends the text. False, with the buffer's text unchanged, when an argument is a null string or
-// memory ran out.
+// Appends the text; no argument lies in the buffer's own block. False, with the buffer's text
+// unchanged, when an argument is a null string or memory ran out.
 bool qlxAppendComposed(CxUStringBuff *text, const QlxComposed *composed, va_list *args);
 
 #endif

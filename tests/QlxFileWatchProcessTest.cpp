@@ -33,11 +33,54 @@ TEST_F(FileWatchTest, WatchesInAChildAsInItsParent) {
 
 // ---- Descriptors
 
-TEST_F(FileWatchTest, GoesOnAfterAHostClosedAllDescriptors) {
-  ASSERT_NO_FATAL_FAILURE(watchFile());
-  Child child([&] {
+enum class Way { Asked, Flagged };  // how it is known whether there are notices
+
+class FileWatchDescriptorTest : public FileWatchTest, public ::testing::WithParamInterface<Way> {
+ protected:
+  void SetUp() override {
+    FileWatchTest::SetUp();
+    if (GetParam() == Way::Flagged && !systemHasFlags()) {
+      GTEST_SKIP() << "no poll requests on this machine";
+    }
+    ASSERT_NO_FATAL_FAILURE(watchFile());
+  }
+
+  // The child of a fork watches anew.
+  void watchInChild() {
     logTimes(1);
     ASSERT_EQ(vars()->watch.watching, 1);
+    if (GetParam() == Way::Flagged) awaitFlag();
+  }
+};
+
+INSTANTIATE_TEST_SUITE_P(Ways, FileWatchDescriptorTest, ::testing::Values(Way::Asked, Way::Flagged),
+                         [](const auto &tested) {
+                           return tested.param == Way::Asked ? "Asked" : "Flagged";
+                         });
+
+TEST_P(FileWatchDescriptorTest, SeesARemovalAfterAHostClosedAllDescriptors) {
+  Child child([&] {
+    ASSERT_NO_FATAL_FAILURE(watchInChild());
+    ASSERT_EQ(close_range(3, ~0U, 0), 0);
+    fs::remove(dir.path(kName));
+    EXPECT_FALSE(finds());
+  });
+  EXPECT_EQ(child.end(), 0);
+}
+
+TEST_P(FileWatchDescriptorTest, SeesARemovalAfterAHostClosedItsDescriptorsOnly) {
+  Child child([&] {
+    ASSERT_NO_FATAL_FAILURE(watchInChild());
+    ASSERT_EQ(close_range(500, ~0U, 0), 0);
+    fs::remove(dir.path(kName));
+    EXPECT_EQ(next(), "next\n");
+  });
+  EXPECT_EQ(child.end(), 0);
+}
+
+TEST_P(FileWatchDescriptorTest, GoesOnAfterAHostClosedAllDescriptors) {
+  Child child([&] {
+    ASSERT_NO_FATAL_FAILURE(watchInChild());
     ASSERT_EQ(close_range(3, ~0U, 0), 0);
     log(u"first");
     logTimes(kUntilWatched);
@@ -49,17 +92,16 @@ TEST_F(FileWatchTest, GoesOnAfterAHostClosedAllDescriptors) {
   EXPECT_EQ(dir.read(kName), "last\n");
 }
 
-TEST_F(FileWatchTest, LosesNoEventWhenAHostClosedAllDescriptors) {
-  ASSERT_NO_FATAL_FAILURE(watchFile());
+TEST_P(FileWatchDescriptorTest, LosesNoEventWhenAHostClosedAllDescriptors) {
   const std::string before = dir.read(kName);
   Child child([&] {
-    log(u"watched");
+    ASSERT_NO_FATAL_FAILURE(watchInChild());
     ASSERT_EQ(close_range(3, ~0U, 0), 0);
     log(u"one");
     log(u"two");
   });
   EXPECT_EQ(child.end(), 0);
-  EXPECT_EQ(dir.read(kName), before + "watched\none\ntwo\n");
+  EXPECT_EQ(dir.read(kName), before + "steady\none\ntwo\n");
 }
 
 TEST_F(FileWatchTest, KeepsOutOfTheNumbersThatFilesGet) {
@@ -92,10 +134,9 @@ class HostsPair {
   int ends_[2];
 };
 
-TEST_F(FileWatchTest, LeavesAHostsFilesAloneThatHaveItsNumbers) {
-  ASSERT_NO_FATAL_FAILURE(watchFile());
+TEST_P(FileWatchDescriptorTest, LeavesAHostsFilesAloneThatHaveItsNumbers) {
   Child child([&] {
-    logTimes(1);
+    ASSERT_NO_FATAL_FAILURE(watchInChild());
     const int inotify = descriptorsOf("inotify").at(0);
     const int epoll = descriptorsOf("eventpoll").at(0);
     const HostsPair pair;
@@ -112,10 +153,9 @@ TEST_F(FileWatchTest, LeavesAHostsFilesAloneThatHaveItsNumbers) {
   EXPECT_EQ(child.end(), 0);
 }
 
-TEST_F(FileWatchTest, LeavesAHostsFilesAloneWhenItStops) {
-  ASSERT_NO_FATAL_FAILURE(watchFile());
+TEST_P(FileWatchDescriptorTest, LeavesAHostsFilesAloneWhenItStops) {
   Child child([&] {
-    logTimes(1);
+    ASSERT_NO_FATAL_FAILURE(watchInChild());
     const int inotify = descriptorsOf("inotify").at(0);
     const int epoll = descriptorsOf("eventpoll").at(0);
     const HostsPair pair;
@@ -136,10 +176,9 @@ TEST_F(FileWatchTest, LeavesAHostsFilesAloneWhenItStops) {
   EXPECT_EQ(child.end(), 0);
 }
 
-TEST_F(FileWatchTest, ReadsNothingForAHostsOwnQuestion) {
-  ASSERT_NO_FATAL_FAILURE(watchFile());
+TEST_P(FileWatchDescriptorTest, ReadsNothingForAHostsOwnQuestion) {
   Child child([&] {
-    logTimes(1);
+    ASSERT_NO_FATAL_FAILURE(watchInChild());
     const int inotify = descriptorsOf("inotify").at(0);
     const int epoll = descriptorsOf("eventpoll").at(0);
     const HostsPair pair;
@@ -212,8 +251,8 @@ TEST(FileWatchLifeTest, LeavesNoDescriptorWhenTheToolkitIsClosed) {
 
 // ---- Threads
 
-TEST_F(FileWatchTest, NoticesRemovalsWhileAnotherThreadLogs) {
-  ASSERT_NO_FATAL_FAILURE(watchFile());
+TEST_P(FileWatchDescriptorTest, NoticesRemovalsWhileAnotherThreadLogs) {
+  if (GetParam() == Way::Flagged) awaitFlag();
   std::atomic<bool> done{false};
   std::thread other([&] {
     while (!done) log(u"other");

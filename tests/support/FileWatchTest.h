@@ -25,6 +25,7 @@
 
 #include "support/Child.h"
 #include "support/FileHandlerTest.h"
+#include "support/NoticesFlag.h"
 #include "support/WorkingDir.h"
 
 namespace fs = std::filesystem;
@@ -86,6 +87,11 @@ class FileWatchTest : public FileHandlerTest {
   std::string next(const std::string &name = kName) {
     log(u"next");
     return fs::is_regular_file(dir.path(name)) ? dir.read(name) : "-";
+  }
+
+  // Asks until the answer comes from memory.
+  void awaitFlag(const std::string &name = kName) {
+    askUntilFlagged([&] { EXPECT_TRUE(finds(name)); });
   }
 
   bool finds(const std::string &name = kName) {

@@ -199,6 +199,29 @@ TEST_P(FileWatchDescriptorTest, ReadsNothingForAHostsOwnQuestion) {
   EXPECT_EQ(child.end(), 0);
 }
 
+TEST_P(FileWatchDescriptorTest, LeavesAHostsQuietSetOfDescriptorsAlone) {
+  Child child([&] {
+    ASSERT_NO_FATAL_FAILURE(watchInChild());
+    const int epoll = descriptorsOf("eventpoll").at(0);
+    const int own = epoll_create1(EPOLL_CLOEXEC);
+    dup2(own, epoll);
+    fs::remove(dir.path(kName));
+    if (GetParam() == Way::Flagged) {
+      EXPECT_FALSE(finds());
+    }
+    for (int i = 0; i < 100; ++i) {  // the system is asked about the host's own
+      const ApiLock lock;
+      qlxNoticesChanges();
+    }
+    EXPECT_FALSE(isFlagged());
+    vars()->watch.lastLook -= 1;
+    EXPECT_EQ(next(), "next\n");
+    epoll_event none;
+    EXPECT_EQ(epoll_wait(epoll, &none, 1, 0), 0);
+  });
+  EXPECT_EQ(child.end(), 0);
+}
+
 TEST_F(FileWatchTest, LooksWhereThereAreTooFewDescriptors) {
   Child child([&] {
     const rlimit few{100, 100};

@@ -139,10 +139,9 @@ TEST_F(NoticesTest, DoNotAskTheSystemWhileTheFlagIsQuiet) {
     prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0);
     if (prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &program) != 0) _exit(77);
     const uint32_t before = qlxNoticesChanges();
-    for (int i = 0; i < 1000; ++i) {
-      if (qlxNoticesChanges() != before) _exit(1);
-    }
-    _exit(0);
+    int seen = 0;
+    for (int i = 0; i < 1000; ++i) seen += qlxNoticesChanges() != before;
+    syscall(SYS_exit_group, seen);  // alone, where _exit() does more
   });
   const int status = child.end();
   if (status == 77) GTEST_SKIP() << "no filters of system calls";

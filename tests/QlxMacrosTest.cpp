@@ -110,6 +110,23 @@ TEST_F(MacrosTest, LogEverythingWithoutAThresholdAndNothingWhenDisabled) {
   EXPECT_EQ(arguments, 0);
 }
 
+TEST_F(MacrosTest, DecideInPlaceAsTheFunctionDoes) {
+  constexpr int32_t kLevels[] = {
+      INT32_MIN, UNSPECIFIED - 1, UNSPECIFIED, UNSPECIFIED + 1, -1,    ALL,
+      DEBUG_MAX, INFO - 1,        INFO,        INFO + 1,        FATAL, INT32_MAX};
+  for (const uint8_t enabled : {1, 0}) {
+    QlxSetObjectEnabled(logger.get(), enabled);
+    for (const int32_t threshold : kLevels) {
+      storeLevel(logger.get(), threshold);
+      for (const int32_t level : kLevels) {
+        EXPECT_EQ(qlxIsLoggableInPlace(logger.get(), level), QlxIsLoggable(logger.get(), level))
+            << level << " against " << threshold;
+      }
+    }
+  }
+  EXPECT_EQ(qlxIsLoggableInPlace(nullptr, FATAL), 0);
+}
+
 TEST_F(MacrosTest, LogNothingToANullLogger) {
   QLX_INFO(nullptr, name(), name());
   QLX_DEBUG_MIN(static_cast<QlxObject *>(nullptr), text());

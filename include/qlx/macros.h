@@ -1,7 +1,7 @@
 /**
  * @file
- * Log calls as macros. Each tests the logger in place, so a suppressed call costs two loads, a
- * compare and a branch, and evaluates none of its arguments but the logger, which is evaluated
+ * Log calls as macros. Each tests the logger in place, so a call below the threshold costs a load,
+ * a compare and a branch, and evaluates none of its arguments but the logger, which is evaluated
  * once.
  *
  * A macro is a statement and drops the call's result; call the function where the result matters.
@@ -22,12 +22,18 @@ QLX_BEGIN_DECLS
  * QlxIsLoggable() without the call. Takes no lock; the logger is not released meanwhile.
  *
  * @param logger  a logger, or null, which logs nothing
+ * @param level   best a constant: what the comparison alone decides is then left out
  */
 static inline int qlxIsLoggableInPlace(const QlxObject *logger, int32_t level) {
   int32_t threshold;
-  if (!logger || !__atomic_load_n(&logger->enabled, __ATOMIC_RELAXED)) return 0;
+  if (!logger) return 0;
   threshold = __atomic_load_n(&logger->kind1.level, __ATOMIC_RELAXED);
-  return level >= threshold || threshold == UNSPECIFIED;
+  /* A threshold of UNSPECIFIED passes all, which for levels above it the comparison says. */
+  if (level < threshold && level != UNSPECIFIED &&
+      (level > UNSPECIFIED || threshold != UNSPECIFIED)) {
+    return 0;
+  }
+  return __atomic_load_n(&logger->enabled, __ATOMIC_RELAXED) != 0;
 }
 
 QLX_END_DECLS

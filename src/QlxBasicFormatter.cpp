@@ -125,7 +125,6 @@ class AsciiLine {
     if (message && !message->bundle && message->text) {
       const size_t units = cxUnitsLength(message->text);
       if (line_->append(message->text, units, QlxPatternSyntax{})) return true;
-      if (qlxIsPlainPattern(message->text, units)) return false;
     }
     KeptBuffer text;
     qlxIntlBindI18MsgTo(message, args, text.get());

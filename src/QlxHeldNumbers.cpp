@@ -3,6 +3,7 @@
 
 #include <string_view>
 
+#include <unicode/decimfmt.h>
 #include <unicode/unum.h>
 
 #include "util/CxDecimal.h"
@@ -26,8 +27,11 @@ void qlxIntlDropHeldNumbers(void) {
   }
 }
 
-// Any digit may be another one in the locale, and any locale may put signs around them.
+// Any digit may be another one in the locale, and any locale may put signs around them. A format of
+// another class may have a word for any one number.
 static bool writesPlainDigits(const UNumberFormat *format) {
+  const auto *plain = reinterpret_cast<const icu::NumberFormat *>(format);
+  if (plain->getDynamicClassID() != icu::DecimalFormat::getStaticClassID()) return false;
   constexpr std::u16string_view kDigits = u"1234567890";
   UChar text[32];
   UErrorCode status = U_ZERO_ERROR;
@@ -37,9 +41,9 @@ static bool writesPlainDigits(const UNumberFormat *format) {
 
 // As a message format makes it: the locale's own, which then gets the pattern. One that takes no
 // pattern, as that of a locale with worded numbers, stays as it is.
-static void open(HeldNumber &held) {
+static void open(HeldNumber &held, const char *locale) {
   UErrorCode status = U_ZERO_ERROR;
-  held.format = unum_open(UNUM_DECIMAL, nullptr, 0, nullptr, nullptr, &status);
+  held.format = unum_open(UNUM_DECIMAL, nullptr, 0, locale, nullptr, &status);
   if (U_FAILURE(status)) held.format = nullptr;
   if (!held.format) return;
   unum_applyPattern(held.format, 0, held.pattern.data(), static_cast<int32_t>(held.pattern.size()),
@@ -49,9 +53,9 @@ static void open(HeldNumber &held) {
 
 uint8_t qlxAppendHeldNumber(CxUStringBuff *text, QlxHeldNumber which, double value) {
   const HeldFormatsLock lock;
-  qlxIntlCheckHeldLocale();
+  const char *locale = qlxIntlCheckHeldLocale();
   HeldNumber &held = gNumbers[which];
-  if (!held.format) open(held);
+  if (!held.format) open(held, locale);
   if (!held.format) return cxUStringBuffHasCapacity(text, 0);
   if (held.plainDigits && value >= 0 && value < kMaxWhole) {
     const auto whole = static_cast<uint64_t>(value);

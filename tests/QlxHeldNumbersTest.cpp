@@ -27,6 +27,7 @@
 #include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"
 #include "support/OpenToolkit.h"
+#include "support/WhileLocaleChanges.h"
 
 namespace {
 
@@ -127,8 +128,9 @@ class HeldNumbersTest : public ::testing::Test {
 }  // namespace
 
 TEST_F(HeldNumbersTest, EveryValueIsWrittenAsAParsedPatternWritesIt) {
-  for (const char *locale : {"en_US_POSIX", "de", "ar_EG", "en@numbers=arab", "zh@numbers=hans",
-                             "hi@numbers=native", "sv", "he", "fa", "en@numbers=roman", "ccp"}) {
+  for (const char *locale :
+       {"en_US_POSIX", "de", "ar_EG", "en@numbers=arab", "zh@numbers=hans", "hi@numbers=native",
+        "sv", "he", "fa", "en@numbers=roman", "ccp", "ja@numbers=jpanyear"}) {
     setLocale(locale);
     for (const double value : kValues) compare(value);
   }
@@ -239,6 +241,14 @@ TEST_F(HeldNumbersTest, AChildForkedDuringAWriteWritesToo) {
   }
   stop = true;
   busy.join();
+}
+
+TEST_F(HeldNumbersTest, AFormatOpenedWhileAThreadChangesTheLocaleIsNotKeptForAnotherOne) {
+  for (int round = 0; round < 100; ++round) {
+    qlxDropHeldFormats();
+    whileLocaleChanges("en", "de", [] { appended(CxUStringBuffAppendUDouble, 1.5); });
+    ASSERT_EQ(appended(CxUStringBuffAppendUDouble, 1.5), u"1.5") << round;
+  }
 }
 
 TEST_F(HeldNumbersTest, ThreadsWriteInOneOfTheLocalesThatAnotherThreadSets) {

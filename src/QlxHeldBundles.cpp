@@ -83,9 +83,11 @@ static icu::LocalUResourceBundlePointer open(const char *name, const char *local
   return icu::LocalUResourceBundlePointer{ures_open(separator + 1, locale, status)};
 }
 
-// Takes the bundle over when there is memory to hold it. One that cannot be opened is not held: it
+// Takes the bundle over when there is memory to hold it, unless the default locale, in which ICU
+// may have looked for it, became another one meanwhile. One that cannot be opened is not held: it
 // may be there the next time.
 static void hold(const BundleKey &key, icu::LocalUResourceBundlePointer &bundle) {
+  if (!qlxSameText(uloc_getDefault(), key.defaultLocale)) return;
   BundleKey copy = key;
   bool whole = true;
   for (auto text : kKeyTexts) {
@@ -142,7 +144,8 @@ static void withPattern(const MessageName &message, UErrorCode *status, Use use)
     if (BundlePattern *pattern = patternOf(held, message.key, &room, status)) use(*pattern);
     return;
   }
-  icu::LocalUResourceBundlePointer fresh = open(message.bundle, message.locale, status);
+  const char *locale = key.locale ? key.locale : key.defaultLocale;
+  icu::LocalUResourceBundlePointer fresh = open(key.name, locale, status);
   if (U_FAILURE(*status)) return;
   lookUp(&room, fresh.getAlias(), message.key, status);
   if (U_SUCCESS(*status)) use(room);

@@ -57,19 +57,19 @@ void qlxIntlDropHeldDates(void) {
     if (held.format) drop(held);
 }
 
-static UDateFormat *openDate(const char *pattern) {
+static UDateFormat *openDate(const char *pattern, const char *locale) {
   const OwnedUStr own{CxUStringDupStrToUChar(pattern)};
   if (pattern && !own) return nullptr;
   UErrorCode status = U_ZERO_ERROR;
-  return udat_open(UDAT_PATTERN, UDAT_PATTERN, nullptr, nullptr, -1,
+  return udat_open(UDAT_PATTERN, UDAT_PATTERN, locale, nullptr, -1,
                    pattern ? own.get() : kDefaultPattern, -1, &status);
 }
 
 // Finds or opens the format of a pattern; null when that fails.
-static HeldDate *fetch(const char *pattern) {
+static HeldDate *fetch(const char *pattern, const char *locale) {
   for (HeldDate &held : gDates)
     if (held.format && qlxSameText(held.pattern, pattern)) return &held;
-  icu::LocalUDateFormatPointer format{openDate(pattern)};
+  icu::LocalUDateFormatPointer format{openDate(pattern, locale)};
   OwnedStr copy{OslStringDup(pattern)};
   if (format.isNull() || (pattern && !copy)) return nullptr;
   HeldDate &place = *std::ranges::min_element(gDates, {}, &HeldDate::lastUse);
@@ -192,10 +192,10 @@ static uint8_t appendBy(HeldDate &held, CxUStringBuff *text, double time) {
 
 // The place of a pattern under the defaults of this moment; null when memory ran out.
 static HeldDate *fetchCurrent(const char *pattern) {
-  qlxIntlCheckHeldLocale();
+  const char *locale = qlxIntlCheckHeldLocale();
   qlxIntlCheckHeldZone();
   if (pattern) qlxIntlCheckHeldCodePage();
-  HeldDate *held = fetch(pattern);
+  HeldDate *held = fetch(pattern, locale);
   if (held) held->lastUse = ++gUses;
   return held;
 }

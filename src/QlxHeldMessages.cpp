@@ -125,13 +125,16 @@ static bool hasLanguage(const char *locale) {
   return U_SUCCESS(status) && status != U_STRING_NOT_TERMINATED_WARNING;
 }
 
+// The default locale is the one that was checked: ICU, asked for no locale, would take the one of a
+// moment later.
 static icu::LocalUMessageFormatPointer open(const PatternKey &key, bool usesZone,
                                             UErrorCode *status) {
+  const char *locale = key.locale ? key.locale : qlxIntlCheckHeldLocale();
   if (usesZone) qlxIntlCheckHeldZone();
   const bool usesLanguage = usesZone || mayHaveType(key.pattern, {u"plural", u"selectordinal"});
-  if (usesLanguage && !hasLanguage(key.locale)) *status = U_ILLEGAL_ARGUMENT_ERROR;
+  if (usesLanguage && !hasLanguage(locale)) *status = U_ILLEGAL_ARGUMENT_ERROR;
   return icu::LocalUMessageFormatPointer{umsg_open(
-      key.pattern.data(), static_cast<int32_t>(key.pattern.size()), key.locale, nullptr, status)};
+      key.pattern.data(), static_cast<int32_t>(key.pattern.size()), locale, nullptr, status)};
 }
 
 // Takes the format over when there is memory to hold it.

@@ -1,12 +1,15 @@
 // Patterns of held bundles against the reference: opening the bundle anew for every call.
 #include "QlxHeldFormats.h"
 
+#include <dlfcn.h>
 #include <gtest/gtest.h>
 
 #include <atomic>
 #include <cstring>
+#include <functional>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include <unicode/putil.h>
@@ -24,6 +27,7 @@
 #include "support/IcuDefaults.h"
 #include "support/OpenToolkit.h"
 #include "support/ResourceBundles.h"
+#include "support/WhileLocaleChanges.h"
 
 namespace {
 
@@ -74,6 +78,9 @@ Result anew(const MessageName &message) {
   if (U_FAILURE(status)) return {u"", status};
   return {text.data(), 0};
 }
+
+// Called once, by the next opening of a bundle.
+std::function<void()> beforeOpening;
 
 // ICU looks for a bundle's bare name here.
 class DataDirectory {
@@ -149,6 +156,15 @@ const char *const kKeys[] = {"hello",    "bare",      "plain",   "empty", "zero"
 
 }  // namespace
 
+// In place of ICU's own, for the whole program of the tests.
+extern "C" UResourceBundle *ures_open(const char *name, const char *locale, UErrorCode *status) {
+#define QLX_NAME_OF(function) QLX_NAME_OF_RENAMED(function)
+#define QLX_NAME_OF_RENAMED(function) #function
+  static void *const open = dlsym(RTLD_NEXT, QLX_NAME_OF(ures_open));
+  if (beforeOpening) std::exchange(beforeOpening, nullptr)();
+  return reinterpret_cast<decltype(&ures_open)>(open)(name, locale, status);
+}
+
 TEST_F(HeldBundlesTest, EveryKeyIsInEveryLocaleWhatOpeningAnewGives) {
   for (const char *defaultLocale : {"en_US", "de_DE", "fr"}) {
     ASSERT_TRUE(IcuDefaults::setLocale(defaultLocale));
@@ -193,6 +209,14 @@ TEST_F(HeldBundlesTest, ALocaleThatIsMissingFallsBackToTheDefaultOneOfTheMoment)
     }
     EXPECT_EQ(of("hello", "root"), (Result{u"root value", 0}));
   }
+}
+
+TEST_F(HeldBundlesTest, ABundleFoundInADefaultLocaleThatChangedMeanwhileIsNotHeld) {
+  IcuDefaults::setLocale("de");
+  beforeOpening = [] { IcuDefaults::setLocale("en_US"); };
+  EXPECT_EQ(of("hello", "fr").text, u"root value");
+  IcuDefaults::setLocale("de");
+  EXPECT_EQ(of("hello", "fr").text, u"deutsch value");
 }
 
 TEST_F(HeldBundlesTest, TheSameBundleInSeveralLocalesIsToldApart) {
@@ -337,6 +361,14 @@ TEST_F(HeldBundlesTest, ThreadsUseBundlesWhileAnotherOneChangesTheDefaultLocale)
   stop = true;
   for (std::thread &reader : readers) reader.join();
   EXPECT_EQ(wrong, 0);
+}
+
+TEST_F(HeldBundlesTest, ABundleOpenedWhileAThreadChangesTheLocaleIsNotKeptForAnotherOne) {
+  for (int round = 0; round < 100; ++round) {
+    qlxDropHeldFormats();
+    whileLocaleChanges("de", "de_AT", [&] { of("bare"); });
+    ASSERT_EQ(of("bare").text, u"bare deutsch") << round;
+  }
 }
 
 TEST_F(HeldBundlesTest, AChildReadsInTheLocaleThatItSets) {

@@ -22,6 +22,7 @@
 #include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"
 #include "support/OpenToolkit.h"
+#include "support/WhileLocaleChanges.h"
 
 namespace {
 
@@ -258,6 +259,14 @@ TEST_F(HeldDatesTest, WithoutMemoryThereAreTheWholeBytesOrNone) {
       EXPECT_EQ(memory.live(), 0);
       if (failures == 0) break;
     }
+}
+
+TEST_F(HeldDatesTest, AFormatOpenedWhileAThreadChangesTheLocaleIsNotKeptForAnotherOne) {
+  for (int round = 0; round < 100; ++round) {
+    qlxDropHeldFormats();
+    whileLocaleChanges("en", "de", [] { bytesOf("EEEE", kTime); });
+    ASSERT_EQ(bytesOf("EEEE", kTime), "Wednesday") << round;
+  }
 }
 
 TEST_F(HeldDatesTest, ThreadsWriteInOneOfTheZonesThatAnotherThreadSets) {

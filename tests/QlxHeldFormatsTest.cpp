@@ -24,6 +24,7 @@
 
 #include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"
+#include "support/WhileLocaleChanges.h"
 
 namespace {
 
@@ -647,6 +648,14 @@ TEST_F(HeldFormatsTest, ThreadsShareTheHeldFormats) {
     });
   for (std::thread &thread : threads) thread.join();
   EXPECT_EQ(wrong, 0);
+}
+
+TEST_F(HeldFormatsTest, AMessageParsedWhileAThreadChangesTheLocaleIsNotKeptForAnotherOne) {
+  for (int round = 0; round < 100; ++round) {
+    qlxDropHeldFormats();
+    whileLocaleChanges("en", "de", [] { held(nullptr, u"{0,number}", 1234.5); });
+    ASSERT_EQ(held(nullptr, u"{0,number}", 1234.5).text, u"1,234.5") << round;
+  }
 }
 
 TEST_F(HeldFormatsTest, AChildForkedUnderTheLockFormats) {

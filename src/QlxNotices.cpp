@@ -114,7 +114,9 @@ void ask() {
   if (gNotices.flags && gNotices.flags->told.context != 0) gNotices.quiet = 0;
   if (count == 0) {
     ++gNotices.changes;  // the flag alone is reason enough to look
-  } else if (count > 0 && ready.data.ptr == &gNotices && areOurs()) {
+  } else if (count < 0) {
+    qlxNoticesClose();  // closed by a host, or a filter refuses the question
+  } else if (ready.data.ptr == &gNotices && areOurs()) {
     readAll();
   } else {
     forget();

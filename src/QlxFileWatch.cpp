@@ -27,8 +27,11 @@ constexpr uint8_t kLooksBeforeWatch = 8;
 constexpr uint8_t kMaxStartsASecond = 16;
 
 // Numbers are not used again. Beyond this one all watches are given up, so that those of
-// directories and moved files that nobody needs any more do not pile up.
+// directories and moved files that nobody needs any more do not pile up. Not often, since the
+// system takes some 10 ms to end them, and a process may need more than these.
 constexpr int32_t kMaxWatchNumber = 1024;
+constexpr int64_t kSecondsBetweenGivingUp = 10;
+int64_t gMayGiveUp;  // from this second on
 
 // On these all changes are made by this system's own calls, which tell of them.
 constexpr uint32_t kLocalFileSystems[] = {EXT4_SUPER_MAGIC,     XFS_SUPER_MAGIC, BTRFS_SUPER_MAGIC,
@@ -52,13 +55,19 @@ bool isLocal(const char *path) {
   return false;
 }
 
+// Systems before 5.8 do not say.
+bool mayBeMounted(const struct statx &info) {
+  return !(info.stx_attributes_mask & STATX_ATTR_MOUNT_ROOT) ||
+         (info.stx_attributes & STATX_ATTR_MOUNT_ROOT);
+}
+
 // Of a file's own directory the one above it tells, and a watched directory makes each write to its
 // files slower. Nothing is above the root, and nothing above a mounted one tells of it.
 bool watchDirectory(const char *path, bool isOwn) {
   struct statx info;
   if (statx(AT_FDCWD, path, AT_SYMLINK_NOFOLLOW, STATX_TYPE, &info) != 0) return false;
   if (!S_ISDIR(info.stx_mode) || !isLocal(path)) return false;
-  const bool isToldOf = isOwn && !(info.stx_attributes & STATX_ATTR_MOUNT_ROOT);
+  const bool isToldOf = isOwn && !mayBeMounted(info);
   return isToldOf || qlxNoticesWatch(path, kDirectoryChanges) != -1;
 }
 
@@ -78,6 +87,13 @@ bool watchDirectories(char *path) {
   return true;
 }
 
+bool giveUp(int64_t now) {
+  if (now < gMayGiveUp) return false;
+  gMayGiveUp = now + kSecondsBetweenGivingUp;
+  qlxNoticesClose();
+  return true;
+}
+
 bool watchPath(QlxFileWatch *watch, const char *path) {
   std::array<char, kMaxPathBytes> copy;
   const size_t bytes = std::strlen(path) + 1;
@@ -87,8 +103,7 @@ bool watchPath(QlxFileWatch *watch, const char *path) {
   const int32_t number = qlxNoticesWatch(path, kChanges);
   if (number != watch->watchNumber) qlxNoticesUnwatch(watch->watchNumber);
   watch->watchNumber = number;
-  if (number > kMaxWatchNumber) qlxNoticesClose();
-  return number != -1 && number <= kMaxWatchNumber;
+  return number != -1 && !(number > kMaxWatchNumber && giveUp(watch->lastLook));
 }
 
 // Does not ask for the times: after a look at them the next write has to store them anew, which
@@ -140,5 +155,6 @@ void qlxFileWatchEnd(QlxFileWatch *watch) {
 }
 
 void qlxFileWatchStop(void) {
+  gMayGiveUp = 0;
   qlxNoticesClose();
 }

@@ -6,6 +6,7 @@
 #include <qlx/class/formatter.h>
 #include <qlx/class/handler.h>
 
+#include "QlxHeldFormats.h"
 #include "QlxI18Msg.h"
 #include "QlxLoggedEvent.h"
 #include "QlxObject.h"
@@ -19,20 +20,32 @@ static constexpr uint32_t kMaxKeptBytes = 64 * 1024;
 // meanwhile takes new ones.
 static std::array<CxUStringBuff, 2> gKept;
 
-// The built-in formatters' operations, and how each appends instead of making a text of its own.
-static QlxAppendEvent appendOf(const QlxObject *formatter) {
-  struct Row {
-    UChar *(*format)(QlxObject *, Event *, va_list *);
-    QlxAppendEvent append;
-  };
-  static constexpr Row kRows[] = {
-      {QlxBasicUFormatterFFormat, qlxBasicFormatterAppend},
-      {QlxPDXMLUFormatterFFormat, qlxPDXMLFormatterAppend},
-      {QlxVexTraceUFormatterFFormat, qlxVexTraceFormatterAppend},
-  };
+namespace {
+
+// A built-in formatter's operation, and how it appends instead of making a text of its own.
+struct Row {
+  UChar *(*format)(QlxObject *, Event *, va_list *);
+  QlxAppendEvent append;
+  QlxAppendEventAscii appendAscii;
+};
+
+constexpr Row kRows[] = {
+    {QlxBasicUFormatterFFormat, qlxBasicFormatterAppend, qlxBasicFormatterAppendAscii},
+    {QlxPDXMLUFormatterFFormat, qlxPDXMLFormatterAppend, qlxPDXMLFormatterAppendAscii},
+    {QlxVexTraceUFormatterFFormat, qlxVexTraceFormatterAppend, qlxVexTraceFormatterAppendAscii},
+};
+
+}  // namespace
+
+static QlxObject *formatterOf(const QlxObject *handler) {
+  return isKind(handler, Handler) ? handler->kind2.formatter : nullptr;
+}
+
+// Null for a host's.
+static const Row *rowOf(const QlxObject *formatter) {
   if (!isKind(formatter, Formatter)) return nullptr;
   for (const Row &row : kRows)
-    if (formatter->objClass->op1.fFormat == row.format) return row.append;
+    if (formatter->objClass->op1.fFormat == row.format) return &row;
   return nullptr;
 }
 
@@ -63,26 +76,35 @@ KeptBuffer::~KeptBuffer() {
   CxUStringBuffDiscard(&buffer_);
 }
 
-BoundText::BoundText(Event *event, va_list *args) {
+BoundText::BoundText(Event *event, va_list *args) : text_(bind(event, args)) {}
+
+std::u16string_view BoundText::bind(Event *event, va_list *args) {
+  I18Msg *message = event->message;
   qlxUseEventLocale(event);
-  bound_ = qlxIntlBindI18MsgTo(event->message, args, buffer_.get());
+  if (message && !message->bundle && message->text) {
+    const std::u16string_view whole{message->text, cxUnitsLength(message->text)};
+    if (qlxIsPlainPattern(whole.data(), whole.size())) return whole;
+  }
+  CxUStringBuff *buffer = buffer_.emplace().get();
+  if (!qlxIntlBindI18MsgTo(message, args, buffer)) return {};
+  return {buffer->data, buffer->length};
 }
 
 // False where there is no text, or where it has to be made in another way.
 static bool formatAscii(QlxObject *handler, Event *event, va_list *args, CxAsciiLine *line) {
-  QlxObject *formatter = isKind(handler, Handler) ? handler->kind2.formatter : nullptr;
-  return appendOf(formatter) == qlxBasicFormatterAppend && cxUStringDefaultIsUtf8() &&
-         qlxBasicFormatterAppendAscii(formatter, event, args, line);
+  QlxObject *formatter = formatterOf(handler);
+  const Row *row = rowOf(formatter);
+  return row && cxUStringDefaultIsUtf8() && row->appendAscii(formatter, event, args, line);
 }
 
 FormattedEvent::FormattedEvent(QlxObject *handler, Event *event, va_list *args) {
-  qlxSettleEvent(event);
-  QlxObject *formatter = isKind(handler, Handler) ? handler->kind2.formatter : nullptr;
-  if (const QlxAppendEvent append = appendOf(formatter)) {
-    has_ = append(formatter, event, args, buffer_.get());
+  QlxObject *formatter = formatterOf(handler);
+  if (const Row *row = rowOf(formatter)) {
+    has_ = row->append(formatter, event, args, buffer_.get());
     length_ = buffer_.get()->length;
     return;
   }
+  qlxSettleEvent(event);
   own_.reset(qlxIntlUHandlerDoFmt(handler, event, args));
   has_ = own_ != nullptr;
   length_ = own_ ? static_cast<uint32_t>(cxUnitsLength(own_.get())) : 0;

@@ -3,6 +3,9 @@
 #ifndef QLX_SRC_QLXFORMATTED_H
 #define QLX_SRC_QLXFORMATTED_H
 
+#include <optional>
+#include <string_view>
+
 #include <qlx/buffers.h>
 #include <qlx/types.h>
 
@@ -22,9 +25,16 @@ uint8_t qlxPDXMLFormatterAppend(QlxObject *formatter, Event *event, va_list *arg
 uint8_t qlxVexTraceFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
                                    CxUStringBuff *text);
 
-// The same as bytes, as long as all of them are ASCII.
+// The same as bytes, as long as all of them are ASCII and fit.
+typedef bool (*QlxAppendEventAscii)(QlxObject *formatter, Event *event, va_list *args,
+                                    CxAsciiLine *line);
+
 bool qlxBasicFormatterAppendAscii(QlxObject *formatter, Event *event, va_list *args,
                                   CxAsciiLine *line);
+bool qlxPDXMLFormatterAppendAscii(QlxObject *formatter, Event *event, va_list *args,
+                                  CxAsciiLine *line);
+bool qlxVexTraceFormatterAppendAscii(QlxObject *formatter, Event *event, va_list *args,
+                                     CxAsciiLine *line);
 
 // The text as a formatter class's fFormat gives it: new, or null.
 UChar *qlxFormatNew(QlxAppendEvent append, QlxObject *formatter, Event *event, va_list *args);
@@ -49,16 +59,18 @@ class KeptBuffer {
   CxUStringBuff buffer_;
 };
 
-// The message's text of an event, as qlxIntlBindUI18Msg() binds it.
+// The message's text of an event, as qlxIntlBindUI18Msg() binds it. Good as long as the message.
 class BoundText {
  public:
   BoundText(Event *event, va_list *args);
 
-  const UChar *get() const { return bound_ ? buffer_.get()->data : nullptr; }  // null for none
+  std::u16string_view get() const { return text_; }  // empty for none
 
  private:
-  KeptBuffer buffer_;
-  bool bound_;
+  std::u16string_view bind(Event *event, va_list *args);
+
+  std::optional<KeptBuffer> buffer_;  // of a text that is not the message's own
+  std::u16string_view text_;
 };
 
 // The text that a handler's formatter makes of an event. The API lock is held.

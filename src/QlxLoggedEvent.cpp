@@ -34,7 +34,7 @@ static constexpr int kMaxKeptNodes = 32;
 // operation makes then gets an event of its own.
 static struct {
   Event *event;  // with a message; neither has contents
-  char *bundle, *key;
+  char *bundle, *key, *messageId;
   UChar *text;
   StringToStringMap *props;      // empty
   StringToStringMapNode *nodes;  // linked by next, in the order in which they were set
@@ -117,6 +117,10 @@ void qlxStampEventInt(Event *event, const char *key, int32_t value) {
   char *first = cxDecimalBefore(end, cxMagnitude(value), '0');
   if (value < 0) *--first = '-';
   qlxStampEvent(event, key, {first, static_cast<size_t>(end - first)});
+}
+
+void qlxStampEventMessageId(Event *event, std::string_view messageId) {
+  lend(&event->messageId, &gKept.messageId, messageId.data(), messageId.size());
 }
 
 // ---- Where an event comes from
@@ -237,7 +241,7 @@ LoggedEvent::~LoggedEvent() {
   }
   takeBackMessage(message);
   takeBackProps(event_->props);
-  OslMemoryFree(event_->messageId);
+  takeBack(&gKept.messageId, &event_->messageId);
   OslMemoryFree(event_->locale);
   *event_ = {};
   event_->message = message;
@@ -248,6 +252,7 @@ void qlxDropKeptEvent(void) {
   QlxFreeEvent(gKept.event);
   OslMemoryFree(gKept.bundle);
   OslMemoryFree(gKept.key);
+  OslMemoryFree(gKept.messageId);
   OslMemoryFree(gKept.text);
   qlxIntlFreeStringToStringMap(gKept.props);
   freeNodes(gKept.nodes);

@@ -30,6 +30,9 @@ void qlxSettleEvent(Event *event);
 void qlxStampEvent(Event *event, const char *key, std::string_view value);
 void qlxStampEventInt(Event *event, const char *key, int32_t value);
 
+// Sets the message identifier, of an event that has none, in the same way.
+void qlxStampEventMessageId(Event *event, std::string_view messageId);
+
 // Frees what is kept.
 void qlxDropKeptEvent(void);
 

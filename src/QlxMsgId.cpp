@@ -8,6 +8,7 @@
 #include <qlx/memory.h>
 
 #include "QlxFormatted.h"
+#include "QlxLoggedEvent.h"
 #include "util/CxOwned.h"
 
 static MessageId parse(const char *text) {
@@ -17,13 +18,24 @@ static MessageId parse(const char *text) {
   return id;
 }
 
-MessageId qlxMessageIdOf(const UChar *text) {
-  // An identifier is ASCII, so the start of the text up to anything else says it all.
+// What an identifier is made of, in ASCII.
+static bool isPartOfOne(UChar unit) {
+  const UChar lower = unit | 0x20;
+  return (unit >= u'0' && unit <= u'9') || (lower >= u'a' && lower <= u'z');
+}
+
+MessageId qlxMessageIdOfText(std::u16string_view text) {
+  // The start of the text up to anything else says it all.
   MessageId start{};
-  for (size_t i = 0; text && i + 1 < sizeof start.text && text[i] != 0 && text[i] < 0x80; ++i) {
+  const size_t limit = std::min(text.size(), sizeof start.text - 1);
+  for (size_t i = 0; i < limit && isPartOfOne(text[i]); ++i) {
     start.text[i] = static_cast<char>(text[i]);
   }
-  return parse(start.text);
+  return *start.text ? parse(start.text) : start;
+}
+
+MessageId qlxMessageIdOf(const UChar *text) {
+  return text ? qlxMessageIdOfText(text) : MessageId{};
 }
 
 static char *copyOf(const MessageId &id) {
@@ -41,5 +53,5 @@ char *qlxPDXMLUGetMessageID(const UChar *text) {
 void qlxPDXMLUFormatterCacheMessageID(QlxObject *, Event *event, va_list *args) {
   if (!event || event->messageId) return;
   const BoundText text{event, args};
-  QlxSetEventMessageId(event, qlxMessageIdOf(text.get()).text);
+  qlxStampEventMessageId(event, qlxMessageIdOfText(text.get()).text);
 }

@@ -2,6 +2,8 @@
 #ifndef QLX_SRC_QLXMSGID_H
 #define QLX_SRC_QLXMSGID_H
 
+#include <string_view>
+
 #include <qlx/class/msgid.h>
 #include <qlx/kmsid.h>
 
@@ -11,7 +13,8 @@ struct MessageId {
 
 QLX_BEGIN_DECLS
 
-MessageId qlxMessageIdOf(const UChar *text);
+MessageId qlxMessageIdOf(const UChar *text);  // null has none
+MessageId qlxMessageIdOfText(std::u16string_view text);
 
 QLX_END_DECLS
 

@@ -5,15 +5,12 @@
 #include <algorithm>
 #include <iterator>
 
-#include <qlx/buffers.h>
-#include <qlx/class/event.h>
 #include <qlx/event.h>
-#include <qlx/memory.h>
 
 #include "QlxHeldFormats.h"
 #include "QlxPatternTypes.h"
-#include "QlxProps.h"
-#include "QlxRecordText.h"
+
+using namespace std::string_view_literals;
 
 // ---- Words
 
@@ -21,121 +18,130 @@ namespace {
 
 struct LevelWord {
   int32_t level;
-  const UChar *word;
+  std::string_view word;
 };
 
 constexpr LevelWord kLevelWords[] = {
-    {DEBUG_MAX, u"MAX"}, {DEBUG_MID, u"MID"}, {DEBUG_MIN, u"MIN"}, {INFO, u"INFO"},
-    {WARN, u"WARN"},     {ERROR, u"ERROR"},   {FATAL, u"ERROR"},  // Deliberate: no word of its own
-};
-
-// Those with an element of their own. Deliberate: "organization" has none and is a free attribute.
-constexpr const char *kReservedKeys[] = {
-    "threadId",         "correlationId",    "client",
-    "qlx_prop_srcfile", "qlx_prop_srcline", "qlx_prop_srcfunction",
-    "server",           "serverFormat",     "product",
-    "component",        "productInstance",  "processId",
+    {DEBUG_MAX, "MAX"}, {DEBUG_MID, "MID"}, {DEBUG_MIN, "MIN"}, {INFO, "INFO"},
+    {WARN, "WARN"},     {ERROR, "ERROR"},   {FATAL, "ERROR"},  // Deliberate: no word of its own
 };
 
 }  // namespace
 
-void qlxPDXMLEmitULevel(CxUStringBuff *record, int32_t level) {
+void qlxPDXMLAppendLevel(RecordText &out, int32_t level) {
   const auto *row = std::ranges::find(kLevelWords, level, &LevelWord::level);
-  RecordText(record) << (row != std::end(kLevelWords) ? row->word : u"OTHER");
-}
-
-uint8_t qlxPDXMLCheckKey(const char *key) {
-  return std::ranges::none_of(
-      kReservedKeys, [key](const char *reserved) { return OslStringCmp(reserved, key) == 0; });
+  out << (row != std::end(kLevelWords) ? row->word : "OTHER"sv);
 }
 
 // ---- Product and source
 
-static const char *peek(const Event *event, const char *key) {
-  return event ? qlxPeekMapProp(event->props, key) : nullptr;
-}
-
-static void emitServer(CxUStringBuff *record, const Event *event) {
-  const char *server = peek(event, "server");
+static void appendServer(RecordText &out, const EventValues &values) {
+  const char *server = values[EventKey::kServer];
   if (!server) return;
-  RecordText(record) << u" <Server Format=\"" << peek(event, "serverFormat") << u"\">" << server
-                     << u"</Server>\n";
+  (out << " <Server Format=\""sv).value(values[EventKey::kServerFormat]);
+  (out << "\">"sv).value(server) << "</Server>\n"sv;
 }
 
-void qlxPDXMLEmitUProductInfo(CxUStringBuff *record, Event *event, uint8_t component,
-                              uint8_t product, uint8_t instance, uint8_t server) {
+void qlxPDXMLAppendProducts(RecordText &out, const EventValues &values,
+                            const ProductElements &selected) {
   const struct {
-    uint8_t selected;
-    const char *key;
-    const UChar *name;
-  } elements[] = {{product, "product", u"ProductId"},
-                  {component, "component", u"Component"},
-                  {instance, "productInstance", u"ProductInstance"}};
-  if (server) emitServer(record, event);
-  for (const auto &[selected, key, name] : elements) {
-    const char *value = selected ? peek(event, key) : nullptr;
-    if (value) RecordText(record) << u" <" << name << u">" << value << u"</" << name << u">\n";
+    bool selected;
+    EventKey key;
+    std::string_view start, end;
+  } elements[] = {
+      {selected.product, EventKey::kProduct, " <ProductId>"sv, "</ProductId>\n"sv},
+      {selected.component, EventKey::kComponent, " <Component>"sv, "</Component>\n"sv},
+      {selected.instance, EventKey::kProductInstance, " <ProductInstance>"sv,
+       "</ProductInstance>\n"sv},
+  };
+  if (selected.server) appendServer(out, values);
+  for (const auto &element : elements) {
+    const char *value = element.selected ? values[element.key] : nullptr;
+    if (value) (out << element.start).value(value) << element.end;
   }
 }
 
-uint8_t qlxPDXMLEmitUSource(CxUStringBuff *record, Event *event) {
-  const char *file = peek(event, "qlx_prop_srcfile");
-  if (!file) return 0;
-  RecordText out(record);
-  out << u" <Source FileName=\"" << file;
-  const char *function = peek(event, "qlx_prop_srcfunction");
-  if (function) out << u"\" Method=\"" << function;
-  uint8_t found = 0;
-  const int32_t line = QlxGetEventPropInt(event, "qlx_prop_srcline", &found);
-  if (found) {
-    out << u"\" Line=\"";
-    out.by(CxUStringBuffAppendInt32, line);  // Deliberate: a negative one in its unsigned form
-  }
-  out << u"\"/>\n";
-  return 1;
+bool qlxPDXMLAppendSource(RecordText &out, const EventValues &values) {
+  const char *file = values[EventKey::kSourceFile];
+  if (!file) return false;
+  (out << " <Source FileName=\""sv).value(file);
+  const char *function = values[EventKey::kSourceFunction];
+  if (function) (out << "\" Method=\""sv).value(function);
+  if (values.sourceLine) (out << "\" Line=\""sv).number(*values.sourceLine);
+  out << "\"/>\n"sv;
+  return true;
 }
 
 // ---- Translation
 
-static void emitSigned(RecordText &out, int64_t value) {
-  if (value < 0) out << u"-";
-  out.by(CxUStringBuffAppendUInt64, static_cast<uint64_t>(value < 0 ? -value : value));
+static void appendSigned(RecordText &out, int64_t value) {
+  if (value < 0) out << "-"sv;
+  out.number(cxMagnitude(value));
 }
 
 // Takes the next argument from the list and appends its value.
-static void emitValue(RecordText &out, ArgType type, va_list *args) {
+static void appendValue(RecordText &out, ArgType type, va_list *args) {
   if (type == ArgType::kString) {
-    out << va_arg(*args, const UChar *);
+    if (const UChar *text = va_arg(*args, const UChar *)) out << std::u16string_view{text};
   } else if (type == ArgType::kInteger) {
-    emitSigned(out, va_arg(*args, int32_t));
+    appendSigned(out, va_arg(*args, int32_t));
   } else {
-    out.by(CxUStringBuffAppendUDouble, va_arg(*args, double));
+    out.number(kHeldFraction, va_arg(*args, double));
   }
 }
 
 // Deliberate: ends at the first index without a type, whatever comes after it.
-static void emitParameters(CxUStringBuff *record, const ArgTypes &types, va_list *args) {
-  RecordText out(record);
+static void appendParameters(RecordText &out, const ArgTypes &types, va_list *args) {
   va_list copy;
   va_copy(copy, *args);
   for (const ArgType type : types) {
     if (type == ArgType::kNone) break;
-    out << u"<Param><![CDATA[";
-    emitValue(out, type, &copy);
-    out << u"]]></Param>";
+    out << "<Param><![CDATA["sv;
+    appendValue(out, type, &copy);
+    out << "]]></Param>"sv;
   }
   va_end(copy);
 }
 
-void qlxPDXMLEmitUTranslationInfo(CxUStringBuff *record, Event *event, const char *bundle,
-                                  va_list *args) {
-  if (!event || !event->message) return;
+void qlxPDXMLAppendTranslation(RecordText &out, const Event *event, const char *bundle,
+                               va_list *args) {
+  const I18Msg *message = event ? event->message : nullptr;
+  if (!message) return;
   // Deliberate: the attribute's name has a blank in it.
-  RecordText(record) << u" <TranslationInfo Resource Bundle=\"" << bundle << u"\" MsgKey=\""
-                     << event->message->key << u"\">";
+  (out << " <TranslationInfo Resource Bundle=\""sv).value(bundle);
+  (out << "\" MsgKey=\""sv).value(message->key) << "\">"sv;
   ArgTypes types;
   const bool known =
-      bundle && qlxScanBundlePattern({bundle, event->message->key, event->message->locale}, &types);
-  if (known && args) emitParameters(record, types, args);
-  RecordText(record) << u"</TranslationInfo>\n";
+      bundle && qlxScanBundlePattern({bundle, message->key, message->locale}, &types);
+  if (known && args) appendParameters(out, types, args);
+  out << "</TranslationInfo>\n"sv;
+}
+
+// ---- The same for one element alone
+
+void qlxPDXMLEmitULevel(CxUStringBuff *record, int32_t level) {
+  RecordText out(record);
+  qlxPDXMLAppendLevel(out, level);
+}
+
+void qlxPDXMLEmitUProductInfo(CxUStringBuff *record, Event *event, uint8_t component,
+                              uint8_t product, uint8_t instance, uint8_t server) {
+  RecordText out(record);
+  qlxPDXMLAppendProducts(out, qlxFindEventValues(event),
+                         {component != 0, product != 0, instance != 0, server != 0});
+}
+
+uint8_t qlxPDXMLEmitUSource(CxUStringBuff *record, Event *event) {
+  RecordText out(record);
+  return qlxPDXMLAppendSource(out, qlxFindEventValues(event));
+}
+
+void qlxPDXMLEmitUTranslationInfo(CxUStringBuff *record, Event *event, const char *bundle,
+                                  va_list *args) {
+  RecordText out(record);
+  qlxPDXMLAppendTranslation(out, event, bundle, args);
+}
+
+uint8_t qlxPDXMLCheckKey(const char *key) {
+  return !key || qlxPDXMLIsFree(qlxEventKeyOf(key));
 }

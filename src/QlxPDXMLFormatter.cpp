@@ -1,7 +1,6 @@
 // The XML formatter: each event as one Message or Trace element.
 #include "QlxPDXMLFormatter.h"
 
-#include <qlx/buffers.h>
 #include <qlx/class/containers.h>
 #include <qlx/class/event.h>
 #include <qlx/class/message.h>
@@ -15,9 +14,8 @@
 #include "QlxHeldFormats.h"
 #include "QlxMsgId.h"
 #include "QlxObject.h"
-#include "QlxProps.h"
-#include "QlxRecordText.h"
-#include "util/CxOwned.h"
+
+using namespace std::string_view_literals;
 
 namespace {
 
@@ -86,107 +84,111 @@ static bool isMessage(const PDXMLVars *vars, const Event *event) {
 }
 
 // The product elements whose flags say `single`: 1 for the preamble, 0 for each record.
-static void emitProducts(CxUStringBuff *record, const PDXMLVars *vars, Event *event,
-                         uint8_t single) {
-  qlxPDXMLEmitUProductInfo(record, event, vars->singleComponent == single,
-                           vars->singleProduct == single, vars->singleProductId == single,
-                           vars->singleServer == single);
+static ProductElements productsOf(const PDXMLVars *vars, uint8_t single) {
+  return {vars->singleComponent == single, vars->singleProduct == single,
+          vars->singleProductId == single, vars->singleServer == single};
 }
 
-static void emitId(CxUStringBuff *record, const Event *event, const UChar *text) {
-  const MessageId parsed = qlxMessageIdOf(text);
+static void appendId(RecordText &out, const Event *event, std::u16string_view text) {
+  const MessageId parsed = event->messageId ? MessageId{} : qlxMessageIdOfText(text);
   // An empty identifier of the event's own says that there is none.
   const char *id = event->messageId ? event->messageId : parsed.text;
-  RecordText(record) << (*id ? id : "None");
-}
-
-static void emitStart(CxUStringBuff *record, const Event *event, const UChar *text,
-                      bool asMessage) {
-  const bool hasLevel = event->level != UNSPECIFIED;
-  RecordText out(record);
-  if (asMessage) {
-    out << u"<Message Id=\"";
-    emitId(record, event, text);
-    out << (hasLevel ? u"\" Severity=\"" : u"");
+  if (*id) {
+    out.value(id);
   } else {
-    out << (hasLevel ? u"<Trace Level=\"" : u"<Trace");
+    out << "None"sv;
   }
-  if (hasLevel) qlxPDXMLEmitULevel(record, event->level);
-  out << (asMessage || hasLevel ? u"\">\n" : u">\n");
 }
 
-static void emitTime(CxUStringBuff *record, const QlxObject *formatter, double time) {
-  RecordText out(record);
-  out << u" <Time Millis=\"";
-  out.by(CxUStringBuffAppendUDate, time) << u"\">";
-  out.by(qlxAppendHeldDate, formatter->kind2.dateTimeFormat, time) << u"</Time>\n";
+static void appendStart(RecordText &out, const Event *event, std::u16string_view text,
+                        bool asMessage) {
+  const bool hasLevel = event->level != UNSPECIFIED;
+  if (asMessage) {
+    out << "<Message Id=\""sv;
+    appendId(out, event, text);
+    if (hasLevel) out << "\" Severity=\""sv;
+  } else {
+    out << (hasLevel ? "<Trace Level=\""sv : "<Trace"sv);
+  }
+  if (hasLevel) qlxPDXMLAppendLevel(out, event->level);
+  out << (asMessage || hasLevel ? "\">\n"sv : ">\n"sv);
 }
 
-static void emitFreeAttributes(CxUStringBuff *record, const Event *event) {
-  RecordText out(record);
-  const UChar *before = u" <LogAttribs>";  // only in front of the first
-  for (auto *it = event->props ? event->props->head : nullptr; it; it = it->next) {
-    if (!qlxPDXMLCheckKey(it->key)) continue;
-    out << before << u"<Key>" << it->key << u"</Key><Value>" << it->value << u"</Value>";
-    before = u"";
-  }
-  if (!*before) out << u"</LogAttribs>\n";
+static void appendTime(RecordText &out, const QlxObject *formatter, double time) {
+  out << " <Time Millis=\""sv;
+  out.number(kHeldWhole, time) << "\">"sv;
+  out.date(formatter->kind2.dateTimeFormat, time) << "</Time>\n"sv;
 }
 
-// Deliberate: the thread is an unsigned 32-bit number, the process has the buffer's unsigned form.
-static void emitThreadAndProcess(CxUStringBuff *record, Event *event) {
-  RecordText out(record);
-  uint8_t found = 0;
-  const int32_t thread = QlxGetEventPropLong(event, "threadId", &found);
-  if (found) {
-    out << u" <Thread>";
-    out.by(CxUStringBuffAppendUInt64, static_cast<uint32_t>(thread)) << u"</Thread>\n";
+static void appendFreeAttributes(RecordText &out, const Event *event, const EventValues &values) {
+  if (!values.has(EventKey::kNone) && !values.has(EventKey::kOrganization)) return;
+  out << " <LogAttribs>"sv;
+  for (const auto *it = event->props->head; it; it = it->next) {
+    if (!qlxPDXMLIsFree(qlxEventKeyOf(it->key))) continue;
+    (out << "<Key>"sv).value(it->key) << "</Key><Value>"sv;
+    out.value(it->value) << "</Value>"sv;
   }
-  const int32_t process = QlxGetEventPropLong(event, "processId", &found);
-  if (found) {
-    out << u" <Process>";
-    out.by(CxUStringBuffAppendInt32, process) << u"</Process>\n";
+  out << "</LogAttribs>\n"sv;
+}
+
+static void appendThreadAndProcess(RecordText &out, const EventValues &values) {
+  if (const auto thread = qlxThreadOf(values)) {
+    (out << " <Thread>"sv).number(*thread) << "</Thread>\n"sv;
+  }
+  if (const auto process = qlxProcessOf(values)) {
+    (out << " <Process>"sv).number(*process) << "</Process>\n"sv;
   }
 }
 
 // Where the event is from: a message by its source and its bundle, a trace by source and thread.
-static void emitOrigin(CxUStringBuff *record, Event *event, bool asMessage, va_list *args) {
-  const uint8_t hasSource = qlxPDXMLEmitUSource(record, event);
+static void appendOrigin(RecordText &out, const Event *event, const EventValues &values,
+                         bool asMessage, va_list *args) {
+  const bool hasSource = qlxPDXMLAppendSource(out, values);
   if (asMessage) {
     const char *bundle = event->message ? event->message->bundle : nullptr;
-    return qlxPDXMLEmitUTranslationInfo(record, event, bundle, args);
+    return qlxPDXMLAppendTranslation(out, event, bundle, args);
   }
-  if (!hasSource) RecordText(record) << u" <Source FileName=\"None\" Method=\"None\"/>\n";
-  emitThreadAndProcess(record, event);
+  if (!hasSource) out << " <Source FileName=\"None\" Method=\"None\"/>\n"sv;
+  appendThreadAndProcess(out, values);
 }
 
-static void emitProperty(CxUStringBuff *record, const Event *event, const char *key,
-                         const UChar *start, const UChar *end) {
-  const char *value = qlxPeekMapProp(event->props, key);
-  if (value) RecordText(record) << start << value << end;
+static void appendElement(RecordText &out, std::string_view start, const char *value,
+                          std::string_view end) {
+  if (value) (out << start).value(value) << end;
+}
+
+static bool appendRecord(RecordText out, QlxObject *formatter, Event *event, va_list *args) {
+  PDXMLVars *vars = varsOf(formatter);
+  if (!vars || !event) return false;
+  const bool asMessage = isMessage(vars, event);
+  if (formatter->kind3.locale) qlxSetEventLocale(event, formatter->kind3.locale);
+  const BoundText text{event, args};
+  const EventValues values = qlxFindEventValues(event);
+
+  if (vars->firstRecord) qlxPDXMLAppendProducts(out, values, productsOf(vars, 1));
+  appendStart(out, event, text.get(), asMessage);
+  appendTime(out, formatter, event->time);
+  qlxPDXMLAppendProducts(out, values, productsOf(vars, 0));
+  out << " <LogText><![CDATA["sv << text.get() << "]]></LogText>\n"sv;
+  appendFreeAttributes(out, event, values);
+  appendOrigin(out, event, values, asMessage, args);
+  appendElement(out, " <CorrelationId>"sv, values[EventKey::kCorrelationId],
+                "</CorrelationId>\n"sv);
+  appendElement(out, " <Principal>"sv, values[EventKey::kClient], "</Principal>\n"sv);
+  out << (asMessage ? "</Message>\n"sv : "</Trace>\n"sv);
+  if (!out.isWhole()) return false;  // a lost record leaves its preamble to the next one
+  vars->firstRecord = 0;
+  return true;
 }
 
 uint8_t qlxPDXMLFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
                                 CxUStringBuff *record) {
-  PDXMLVars *vars = varsOf(formatter);
-  if (!vars || !event) return 0;
-  const bool asMessage = isMessage(vars, event);
-  if (formatter->kind3.locale) qlxSetEventLocale(event, formatter->kind3.locale);
-  const BoundText text{event, args};
+  return appendRecord(RecordText{record}, formatter, event, args);
+}
 
-  if (vars->firstRecord) emitProducts(record, vars, event, 1);
-  emitStart(record, event, text.get(), asMessage);
-  emitTime(record, formatter, event->time);
-  emitProducts(record, vars, event, 0);
-  RecordText(record) << u" <LogText><![CDATA[" << text.get() << u"]]></LogText>\n";
-  emitFreeAttributes(record, event);
-  emitOrigin(record, event, asMessage, args);
-  emitProperty(record, event, "correlationId", u" <CorrelationId>", u"</CorrelationId>\n");
-  emitProperty(record, event, "client", u" <Principal>", u"</Principal>\n");
-  RecordText(record) << (asMessage ? u"</Message>\n" : u"</Trace>\n");
-  if (!record->data) return 0;  // a lost record leaves its preamble to the next one
-  vars->firstRecord = 0;
-  return 1;
+bool qlxPDXMLFormatterAppendAscii(QlxObject *formatter, Event *event, va_list *args,
+                                  CxAsciiLine *line) {
+  return appendRecord(RecordText{line}, formatter, event, args);
 }
 
 UChar *QlxPDXMLUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {

@@ -5,6 +5,9 @@
 
 #include <qlx/class/formatter.h>
 
+#include "QlxEventValues.h"
+#include "QlxRecordText.h"
+
 QLX_BEGIN_DECLS
 
 /** Appends the word of a level. */
@@ -25,5 +28,22 @@ void qlxPDXMLEmitUTranslationInfo(CxUStringBuff *record, Event *event, const cha
 uint8_t qlxPDXMLCheckKey(const char *key);
 
 QLX_END_DECLS
+
+// The same for a record on its way, of what was found of the event.
+struct ProductElements {
+  bool component, product, instance, server;  // those that are selected
+};
+
+void qlxPDXMLAppendLevel(RecordText &out, int32_t level);
+void qlxPDXMLAppendProducts(RecordText &out, const EventValues &values,
+                            const ProductElements &selected);
+bool qlxPDXMLAppendSource(RecordText &out, const EventValues &values);
+void qlxPDXMLAppendTranslation(RecordText &out, const Event *event, const char *bundle,
+                               va_list *args);
+
+// Deliberate: "organization" has no element of its own and is a free attribute.
+inline bool qlxPDXMLIsFree(EventKey key) {
+  return key == EventKey::kNone || key == EventKey::kOrganization;
+}
 
 #endif

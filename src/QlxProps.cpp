@@ -3,6 +3,7 @@
 #include "QlxProps.h"
 
 #include <cstdio>
+#include <limits>
 
 #include <qlx/class/containers/StringToStringMap.h>
 #include <qlx/ustring.h>
@@ -33,10 +34,11 @@ static T scan(const char *value, const char *format, uint8_t *ok) {
   return converted ? result : T{};
 }
 
-// A plain number of up to nine digits, which is nearly every one, without the scanner's cost.
-static bool readDigits(const char *value, int32_t *result) {
-  constexpr int kMaxDigits = 9;
-  int32_t number = 0;
+// A plain number of digits that always fit, which is nearly every one, without the scanner's cost.
+template <typename T>
+static bool readDigits(const char *value, T *result) {
+  constexpr int kMaxDigits = std::numeric_limits<T>::digits10;
+  T number = 0;
   int digits = 0;
   for (; value[digits] >= '0' && value[digits] <= '9' && digits < kMaxDigits; ++digits) {
     number = number * 10 + (value[digits] - '0');
@@ -45,17 +47,20 @@ static bool readDigits(const char *value, int32_t *result) {
   return digits > 0 && value[digits] == '\0';
 }
 
+template <typename T>
+static T scanWhole(const char *value, const char *format, uint8_t *ok) {
+  T number = 0;
+  if (!value || !readDigits(value, &number)) return scan<T>(value, format, ok);
+  report(ok, true);
+  return number;
+}
+
 int32_t qlxPropStrToInt32(const char *value, uint8_t *ok) {
-  int32_t number = 0;
-  if (value && readDigits(value, &number)) {
-    report(ok, true);
-    return number;
-  }
-  return scan<int>(value, "%d", ok);
+  return scanWhole<int>(value, "%d", ok);
 }
 
 int64_t qlxPropStrToInt64(const char *value, uint8_t *ok) {
-  return scan<long long>(value, "%lld", ok);
+  return scanWhole<long long>(value, "%lld", ok);
 }
 
 float qlxPropStrToFloat32(const char *value, uint8_t *ok) {

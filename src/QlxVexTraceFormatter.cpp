@@ -3,84 +3,82 @@
 #include <qlx/class/formatter.h>
 
 #include <algorithm>
+#include <cstring>
 #include <iterator>
+#include <string_view>
 
-#include <qlx/buffers.h>
 #include <qlx/class/event.h>
 #include <qlx/class/message.h>
 #include <qlx/event.h>
-#include <qlx/memory.h>
 
 #include "QlxClasses.h"
+#include "QlxEventValues.h"
 #include "QlxFormatted.h"
-#include "QlxHeldFormats.h"
 #include "QlxMsgId.h"
 #include "QlxObject.h"
-#include "QlxProps.h"
 #include "QlxRecordText.h"
-#include "util/CxOwned.h"
+
+using namespace std::string_view_literals;
 
 namespace {
 
 struct LevelWord {
   int32_t level;
-  const UChar *word;  // five characters
+  std::string_view word;  // five characters
 };
 
 constexpr LevelWord kLevelWords[] = {
-    {DEBUG_MAX, u" MAX "}, {DEBUG_MID, u" MID "}, {DEBUG_MIN, u" MIN "}, {INFO, u"INFO "},
-    {WARN, u"WARN "},      {ERROR, u"ERROR"},     {FATAL, u"ERROR"},
+    {DEBUG_MAX, " MAX "}, {DEBUG_MID, " MID "}, {DEBUG_MIN, " MIN "}, {INFO, "INFO "},
+    {WARN, "WARN "},      {ERROR, "ERROR"},     {FATAL, "ERROR"},
 };
 
 // What a line is made from.
 struct Record {
-  QlxObject *formatter;
-  Event *event;
-  const UChar *text;  // the bound message, or null
+  const QlxObject *formatter;
+  const Event *event;
+  std::u16string_view text;  // the bound message
+  EventValues values;
 };
 
 }  // namespace
 
 static void appendTime(RecordText &line, const Record &record) {
-  line << u"[";
-  line.by(qlxAppendHeldDate, record.formatter->kind2.dateTimeFormat, record.event->time) << u"]";
+  line << "["sv;
+  line.date(record.formatter->kind2.dateTimeFormat, record.event->time) << "]"sv;
 }
 
 static void appendLevel(RecordText &line, const Record &record) {
   const auto *row = std::ranges::find(kLevelWords, record.event->level, &LevelWord::level);
-  line << (row != std::end(kLevelWords) ? row->word : u"OTHER");
+  line << (row != std::end(kLevelWords) ? row->word : "OTHER"sv);
 }
 
 // Up to the first dot.
 static void appendShortHost(RecordText &line, const Record &record) {
-  const char *server = qlxPeekMapProp(record.event->props, "server");
-  if (!server) return;
-  line.by(CxUStringBuffAppendStrN, server, static_cast<int32_t>(OslStringStrcspn(server, ".")));
+  const char *server = record.values[EventKey::kServer];
+  if (server) line.value(std::string_view{server, std::strcspn(server, ".")});
 }
 
-// Deliberate: the thread is an unsigned 32-bit number, the process has the buffer's unsigned form.
 static void appendProcessAndThread(RecordText &line, const Record &record) {
-  uint8_t hasProcess = 0, hasThread = 0;
-  const int32_t process = QlxGetEventPropLong(record.event, "processId", &hasProcess);
-  const int32_t thread = QlxGetEventPropLong(record.event, "threadId", &hasThread);
-  if (hasProcess) (line << u"p").by(CxUStringBuffAppendInt32, process);
-  if (hasProcess && hasThread) line << u":";
-  if (hasThread) (line << u"t").by(CxUStringBuffAppendUInt64, static_cast<uint32_t>(thread));
+  const auto process = qlxProcessOf(record.values);
+  const auto thread = qlxThreadOf(record.values);
+  if (process) (line << "p"sv).number(*process);
+  if (process && thread) line << ":"sv;
+  if (thread) (line << "t"sv).number(*thread);
 }
 
 static void appendSource(RecordText &line, const Record &record) {
-  const char *file = qlxPeekMapProp(record.event->props, "qlx_prop_srcfile");
-  const char *function = qlxPeekMapProp(record.event->props, "qlx_prop_srcfunction");
-  line << file << (file && function ? u":" : u"") << function;
-  uint8_t hasLine = 0;
-  const int32_t number = QlxGetEventPropInt(record.event, "qlx_prop_srcline", &hasLine);
-  if (hasLine) (line << u"(").by(CxUStringBuffAppendInt32, number) << u")";
+  const char *file = record.values[EventKey::kSourceFile];
+  const char *function = record.values[EventKey::kSourceFunction];
+  line.value(file);
+  if (file && function) line << ":"sv;
+  line.value(function);
+  if (record.values.sourceLine) (line << "("sv).number(*record.values.sourceLine) << ")"sv;
 }
 
 // An event that has an identifier, be it empty, is not looked at for one.
 static void appendMessageId(RecordText &line, const Record &record) {
   const char *own = record.event->messageId;
-  line << (own ? own : qlxMessageIdOf(record.text).text);
+  line.value(own ? own : qlxMessageIdOfText(record.text).text);
 }
 
 static void appendText(RecordText &line, const Record &record) {
@@ -93,20 +91,29 @@ static constexpr void (*kFields[])(RecordText &line, const Record &record) = {
     appendSource, appendMessageId, appendText,
 };
 
-uint8_t qlxVexTraceFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
-                                   CxUStringBuff *record) {
-  if (!isKind(formatter, Formatter) || !event) return 0;
+static bool appendLine(RecordText line, QlxObject *formatter, Event *event, va_list *args) {
+  if (!isKind(formatter, Formatter) || !event) return false;
   if (formatter->kind3.locale) qlxSetEventLocale(event, formatter->kind3.locale);
   const BoundText text{event, args};
-  RecordText line(record);
-  const UChar *before = u"\x1e";  // a record separator (U+001E), then what stands between fields
+  const Record record{formatter, event, text.get(), qlxFindEventValues(event)};
+  std::string_view before = "\x1e";  // a record separator (U+001E), then what is between fields
   for (const auto append : kFields) {
     line << before;
-    append(line, {formatter, event, text.get()});
-    before = u" - ";
+    append(line, record);
+    before = " - ";
   }
-  line << u"\n";
-  return record->data != nullptr;
+  line << "\n"sv;
+  return line.isWhole();
+}
+
+uint8_t qlxVexTraceFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
+                                   CxUStringBuff *record) {
+  return appendLine(RecordText{record}, formatter, event, args);
+}
+
+bool qlxVexTraceFormatterAppendAscii(QlxObject *formatter, Event *event, va_list *args,
+                                     CxAsciiLine *line) {
+  return appendLine(RecordText{line}, formatter, event, args);
 }
 
 UChar *QlxVexTraceUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {

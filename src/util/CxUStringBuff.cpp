@@ -80,6 +80,13 @@ uint8_t cxUStringBuffAppend(CxUStringBuff *buffer, std::string_view text) {
   return appendBytes(buffer, text.data(), static_cast<uint32_t>(text.size()));
 }
 
+uint8_t cxUStringBuffAppendAscii(CxUStringBuff *buffer, std::string_view text) {
+  const auto units = static_cast<uint32_t>(text.size());
+  if (!cxUStringBuffHasCapacity(buffer, units)) return 0;
+  cxWidenAscii(endOf(buffer), text.data(), units);
+  return extend(buffer, units);
+}
+
 uint8_t CxUStringBuffAppendChar(CxUStringBuff *buffer, char character) {
   return appendBytes(buffer, &character, character ? 1 : 0);
 }

@@ -20,6 +20,9 @@ uint8_t cxUStringBuffHasCapacity(CxUStringBuff *buffer, uint32_t extra);
 // Appends bytes of the default code page, none of them zero, as CxUStringBuffAppendStr() does.
 uint8_t cxUStringBuffAppend(CxUStringBuff *buffer, std::string_view text);
 
+// Appends ASCII, whatever the default code page is.
+uint8_t cxUStringBuffAppendAscii(CxUStringBuff *buffer, std::string_view text);
+
 // Appends code units, as CxUStringBuffAppendUStr() does.
 uint8_t cxUStringBuffAppendUnits(CxUStringBuff *buffer, const UChar *text, uint32_t units);
 

@@ -71,7 +71,7 @@ struct QlxMapTemplate
 
   static const char *keyOf(const Node *node) { return node->key; }
   static uint32_t hashOf(const char *key) { return cxHashText(key); }
-  static bool equal(const char *a, const char *b) { return OslStringCmp(a, b) == 0; }
+  static bool equal(const char *a, const char *b) { return *a == *b && OslStringCmp(a, b) == 0; }
 
  private:
   static uint8_t putNew(Head *map, const char *key, Parameter value) {

@@ -1,0 +1,15 @@
+#include "QlxRecordText.h"
+
+#include "QlxFormatted.h"
+
+RecordText &RecordText::number(QlxHeldNumber format, double number) {
+  if (!line_) return by(qlxAppendHeldNumber, format, number);
+  KeptBuffer text;
+  if (!qlxAppendHeldNumber(text.get(), format, number)) return toLine(false);
+  return *this << std::u16string_view{text.get()->data, text.get()->length};
+}
+
+void RecordText::lose() {
+  CxUStringBuffDiscard(text_);
+  text_->capacity = 1;
+}

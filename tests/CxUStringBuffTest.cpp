@@ -79,6 +79,22 @@ TEST_F(CxUStringBuffTest, ConvertsEightBitTextWithTheDefaultCodePage) {
   EXPECT_EQ(text(), u"Grüße!\uFFFD");
 }
 
+TEST_F(CxUStringBuffTest, WordsInAsciiAreWidenedBehindTheText) {
+  std::u16string expected;
+  for (size_t length = 0; length < 1200; length += length < 40 ? 1 : 97) {
+    std::string words(length, 'w');
+    if (length > 0) words.back() = '\x7f';
+    EXPECT_EQ(cxUStringBuffAppendAscii(&buff, words), 1);
+    expected.append(words.begin(), words.end());
+    EXPECT_EQ(text(), expected);
+  }
+  FailingMemory memory;
+  memory.failFrom(1);
+  EXPECT_EQ(cxUStringBuffAppendAscii(&buff, std::string(1 << 16, 'x')), 0);
+  EXPECT_EQ(text(), expected);
+  EXPECT_EQ(cxUStringBuffAppendAscii(nullptr, "x"), 0);
+}
+
 // The contract of an append of 8-bit text, spelled out; the append itself takes shorter ways.
 void appendOverACopy(CxUStringBuff *buff, const char *text) {
   UChar *copy = CxUStringDupStrToUChar(text);

@@ -304,6 +304,19 @@ TEST_F(LoggedEventTest, NeedsNoMemoryOnceItsKindWasLogged) {
   EXPECT_EQ(memory.attempts(), 0U);
 }
 
+TEST_F(LoggedEventTest, NeedsNoMemoryForItsStampsOnceItsKindWasLogged) {
+  const Handle pd = get("pd", "qlx_pdlogger");
+  const auto each = [&] {
+    QlxLogDebugMin(pd.get(), "file.c", "function", 7, u"ABC123E text");
+    QlxLogDebugMin(pd.get(), "file.c", "function", 7, u"text");
+  };
+  QlxSetObjProp(pd.get(), "level", "DEBUG_MIN");
+  for (int i = 0; i < 5; ++i) each();
+  FailingMemory memory;
+  for (int i = 0; i < 100; ++i) each();
+  EXPECT_EQ(memory.attempts(), 0U);
+}
+
 TEST_F(LoggedEventTest, KeepsNoLargeBlocks) {
   const std::u16string text(1 << 20, u'x');
   const std::string name(1 << 20, 'y');

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstdio>
 #include <string>
 
 #include <qlx/class/containers/StringToStringMap.h>
@@ -75,6 +76,24 @@ TEST(QlxPropsTest, IntegersAreReadAsAScannerReadsThem) {
                                      {"", 0, 0},
                                      {"x1", 0, 0},
                                      {nullptr, 0, 0}});
+}
+
+// Around the most digits that are read without a scanner, and all that it takes beside digits.
+TEST(QlxPropsTest, IntegersOfAnyLengthAreReadAsAScannerReadsThem) {
+  for (const char *before : {"", " ", "\t\n", "+", "-", "- ", "00", "x"}) {
+    for (const char *after : {"", " ", "x", ".5", "-", "\xc3\xa4"}) {
+      std::string digits;
+      for (int count = 0; count < 24; ++count, digits += static_cast<char>('0' + count % 10)) {
+        const std::string text = before + digits + after;
+        long long wide = 0;
+        int narrow = 0;
+        const bool isWide = sscanf(text.c_str(), "%lld", &wide) == 1;
+        const bool isNarrow = sscanf(text.c_str(), "%d", &narrow) == 1;
+        check<int64_t>(qlxPropStrToInt64, {{text.c_str(), isWide ? wide : 0, isWide}});
+        check<int32_t>(qlxPropStrToInt32, {{text.c_str(), isNarrow ? narrow : 0, isNarrow}});
+      }
+    }
+  }
 }
 
 TEST(QlxPropsTest, FloatsAreReadAsAScannerReadsThem) {

@@ -2,12 +2,8 @@
 // message. Its operations are the defaults of every formatter class.
 #include <qlx/class/formatter.h>
 
-#include <array>
-#include <cstring>
-#include <optional>
 #include <string_view>
 
-#include <qlx/class/containers.h>
 #include <qlx/class/event.h>
 #include <qlx/class/message.h>
 #include <qlx/class/object.h>
@@ -16,12 +12,11 @@
 
 #include "QlxClasses.h"
 #include "QlxConfigKeys.h"
+#include "QlxEventValues.h"
 #include "QlxFormatted.h"
 #include "QlxHeldFormats.h"
 #include "QlxI18Msg.h"
-#include "QlxLoggedEvent.h"
 #include "QlxObject.h"
-#include "QlxProps.h"
 #include "util/CxDecimal.h"
 #include "util/CxUStringBuff.h"
 #include "util/CxUnits.h"
@@ -29,13 +24,11 @@
 static constexpr std::string_view kDefaultSeparator = " ";
 
 // Properties of an event, in the order in which a line has them.
-static constexpr std::string_view kLineKeys[] = {
-    "qlx_prop_srcfile", "qlx_prop_srcfunction",
-    "qlx_prop_srcline", "organization",
-    "product",          "component",
-    "client",           "server",
+static constexpr EventKey kLineKeys[] = {
+    EventKey::kSourceFile,   EventKey::kSourceFunction, EventKey::kSourceLine,
+    EventKey::kOrganization, EventKey::kProduct,        EventKey::kComponent,
+    EventKey::kClient,       EventKey::kServer,
 };
-static constexpr size_t kSourceLine = 2;  // its place: a number, the others are texts
 
 // Replaces a setting by the object's property; an empty value is kept as such.
 template <auto Setting>
@@ -135,56 +128,18 @@ class AsciiLine {
   CxAsciiLine *line_;
 };
 
-// Of the line's keys.
-struct LineValues {
-  std::array<const char *, std::size(kLineKeys)> texts;  // null for one that is absent
-  std::optional<int32_t> line;                           // of the source
-};
-
 }  // namespace
-
-// All of these keys differ in their length or in their last four bytes.
-static uint32_t lastFour(std::string_view key) {
-  uint32_t bytes;
-  std::memcpy(&bytes, key.data() + key.size() - sizeof bytes, sizeof bytes);
-  return bytes;
-}
-
-// Of the properties of an event.
-static LineValues findProperties(const StringToStringMapNode *node) {
-  LineValues values{};
-  for (; node; node = node->next) {
-    const std::string_view key{node->key};
-    for (size_t i = 0; i < values.texts.size(); ++i) {
-      if (key.size() != kLineKeys[i].size() || lastFour(key) != lastFour(kLineKeys[i])) continue;
-      if (key == kLineKeys[i]) values.texts[i] = node->value;
-      break;
-    }
-  }
-  uint8_t isNumber = 0;
-  const int32_t line = qlxPropStrToInt32(values.texts[kSourceLine], &isNumber);
-  if (isNumber) values.line = line;
-  return values;
-}
-
-static LineValues findLineValues(const Event *event) {
-  if (const EventSource *source = qlxNotedEventSource(event)) {
-    LineValues values{{source->file, source->function}, {}};
-    if (source->file) values.line = source->line;
-    return values;
-  }
-  return findProperties(event->props ? event->props->head : nullptr);
-}
 
 template <typename Line>
 static bool appendProperties(Line &line, const Event *event, std::string_view separator) {
-  const LineValues values = findLineValues(event);
-  for (size_t i = 0; i < values.texts.size(); ++i) {
-    if (i == kSourceLine ? !values.line : !values.texts[i]) continue;
+  const EventValues values = qlxFindEventValues(event);
+  for (const EventKey key : kLineKeys) {
+    const bool isLine = key == EventKey::kSourceLine;
+    if (isLine ? !values.sourceLine : !values[key]) continue;
     // Deliberate: a negative number has its unsigned 64-bit form.
-    const bool appended = i == kSourceLine
-                              ? line.appendNumber(static_cast<uint64_t>(int64_t{*values.line}))
-                              : line.append(values.texts[i]);
+    const bool appended =
+        isLine ? line.appendNumber(static_cast<uint64_t>(int64_t{*values.sourceLine}))
+               : line.append(values[key]);
     if (!appended || !line.append(separator)) return false;
   }
   return true;

@@ -24,7 +24,7 @@ class RecordText {
 
   // Words of the record's own, in ASCII.
   RecordText &operator<<(std::string_view words) {
-    return line_ ? toLine(line_->append(words)) : by(cxUStringBuffAppendAscii, words);
+    return line_ ? toLine(line_->appendAscii(words)) : by(cxUStringBuffAppendAscii, words);
   }
   RecordText &operator<<(std::u16string_view text) {
     if (line_) return toLine(line_->append(text.data(), text.size()));

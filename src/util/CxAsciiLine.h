@@ -5,6 +5,7 @@
 #define QLX_SRC_CXASCIILINE_H
 
 #include <array>
+#include <cstring>
 #include <string_view>
 
 #include "CxUnits.h"
@@ -18,6 +19,14 @@ class CxAsciiLine {
 
   bool append(std::string_view text) {
     if (text.size() > room() || !cxCopyAscii(end(), text.data(), text.size())) return false;
+    length_ += text.size();
+    return true;
+  }
+
+  // What is known to be ASCII.
+  bool appendAscii(std::string_view text) {
+    if (text.size() > room()) return false;
+    std::memcpy(end(), text.data(), text.size());
     length_ += text.size();
     return true;
   }

@@ -86,7 +86,7 @@ std::u16string_view BoundText::bind(Event *event, va_list *args) {
     if (qlxIsPlainPattern(whole.data(), whole.size())) return whole;
   }
   CxUStringBuff *buffer = buffer_.emplace().get();
-  if (!qlxIntlBindI18MsgTo(message, args, buffer)) return {};
+  if (!qlxIntlBindI18MsgTo(message, args, buffer)) return u"";
   return {buffer->data, buffer->length};
 }
 

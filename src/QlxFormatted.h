@@ -64,7 +64,7 @@ class BoundText {
  public:
   BoundText(Event *event, va_list *args);
 
-  std::u16string_view get() const { return text_; }  // empty for none
+  std::u16string_view get() const { return text_; }  // never null; empty for none
 
  private:
   std::u16string_view bind(Event *event, va_list *args);

@@ -20,6 +20,7 @@
 #include <qlx/buffers.h>
 
 #include "QlxHeldFormats.h"
+#include "util/CxUStringBuff.h"
 
 #include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"
@@ -494,5 +495,26 @@ TEST(QlxComposedTest, WithoutMemoryTheBufferStaysAsItWas) {
   }
   EXPECT_EQ(std::u16string(text.data), u"before");
   EXPECT_EQ(text.length, 6U);
+  CxUStringBuffDiscard(&text);
+}
+
+TEST(QlxComposedTest, WithoutMemoryNumbersAreWrittenThatFitTheBlock) {
+  const Message message("en", u"{0,number,integer}|{1,number}");
+  const std::u16string expected = u"-1,234|5.25";
+  CxUStringBuff text{};
+  const auto fill = [&](size_t room) {
+    CxUStringBuffRestart(&text);
+    while (text.length + 1 + room < text.capacity / sizeof(UChar))
+      CxUStringBuffAppendChar(&text, 'x');
+  };
+  cxUStringBuffHasCapacity(&text, 0);
+  for (const size_t room : {expected.size(), expected.size() - 1}) {
+    fill(room);
+    FailingMemory memory;
+    memory.failFrom(1);
+    const uint32_t before = text.length;
+    EXPECT_EQ(message.append(&text, -1234, 5.25), room == expected.size());
+    EXPECT_EQ(std::u16string(text.data + before), room == expected.size() ? expected : u"");
+  }
   CxUStringBuffDiscard(&text);
 }

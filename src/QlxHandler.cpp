@@ -7,6 +7,7 @@
 
 #include "QlxConfigKeys.h"
 #include "QlxLocked.h"
+#include "QlxLoggedEvent.h"
 #include "QlxObject.h"
 
 QlxObject *qlxIntlHandlerGetFormatter(QlxObject *handler) {
@@ -29,12 +30,14 @@ static const ObjClass *formatterClass(const QlxObject *handler) {
 char *qlxIntlHandlerGetFmtHeader(QlxObject *handler) {
   const ObjClass *formatter = formatterClass(handler);
   if (!formatter || !formatter->op2.fGetHeader) return nullptr;
+  qlxSettleNotedEvent();
   return formatter->op2.fGetHeader(handler->kind2.formatter);
 }
 
 char *qlxIntlHandlerGetFmtTrailer(QlxObject *handler) {
   const ObjClass *formatter = formatterClass(handler);
   if (!formatter || !formatter->op3.fGetTrailer) return nullptr;
+  qlxSettleNotedEvent();
   return formatter->op3.fGetTrailer(handler->kind2.formatter);
 }
 

@@ -40,7 +40,7 @@ static struct {
   StringToStringMapNode *nodes;  // linked by next, in the order in which they were set
 } gKept;
 
-// Of the event that was made last; before another one is made, it is settled.
+// Of the event that was made last. It is settled before a host's operation may make another one.
 static struct {
   Event *event;  // null: nothing is noted
   EventSource source;
@@ -143,6 +143,10 @@ void qlxSettleEvent(Event *event) {
   stampSource(event, gNoted.source);
 }
 
+void qlxSettleNotedEvent(void) {
+  qlxSettleEvent(gNoted.event);
+}
+
 // ---- Properties taken back
 
 static void freeNodes(StringToStringMapNode *node) {
@@ -206,7 +210,6 @@ static Event *refillEvent(const char *bundle, const char *key, const UChar *text
 
 LoggedEvent::LoggedEvent(int32_t level, const char *bundle, const char *key, const UChar *text)
     : event_(nullptr) {
-  qlxSettleEvent(gNoted.event);
   if (gKept.event) event_ = refillEvent(bundle, key, text);
   if (!event_) {
     event_ = QlxVaAllocUEvent(level, bundle, key, text);

@@ -25,6 +25,10 @@ const EventSource *qlxNotedEventSource(const Event *event);
 // own code that asks for the note gets the event.
 void qlxSettleEvent(Event *event);
 
+// The same for whatever event something is noted for. To be called before a host's operation that
+// gets no event (a header, a trailer): it may log too, and reuse the caller's texts for that.
+void qlxSettleNotedEvent(void);
+
 // Sets a property as QlxSetEventProp() does, in a kept block where there is one.
 // The event is settled.
 void qlxStampEvent(Event *event, const char *key, std::string_view value);

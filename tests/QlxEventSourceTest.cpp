@@ -27,7 +27,7 @@ std::string propsOf(const Event *event) {
 
 // What a host's operation found when it got an event; each ends with "/".
 std::string gFound;
-std::function<void()> gInHeader;
+std::function<void()> gInHeader, gInTrailer, gInBind;
 
 void look(Event *event) {
   gFound += propsOf(event) + "/";
@@ -48,12 +48,22 @@ UChar *formatOwn(QlxObject *formatter, Event *event, va_list *args) {
   return QlxBasicUFormatterFFormat(formatter, event, args);
 }
 
+void actOnce(std::function<void()> &act) {
+  if (const auto now = std::exchange(act, nullptr)) now();
+}
+
 UChar *bind(I18Msg *message, va_list *args) {
+  actOnce(gInBind);
   return qlxIntlBindUI18Msg(message, args);
 }
 
 char *header(QlxObject *) {
-  if (const auto act = std::exchange(gInHeader, nullptr)) act();
+  actOnce(gInHeader);
+  return nullptr;
+}
+
+char *trailer(QlxObject *) {
+  actOnce(gInTrailer);
   return nullptr;
 }
 
@@ -72,7 +82,7 @@ class EventSourceTest : public ChainTest {
     QlxAddUFormatterClass("test_binding", nullptr, nullptr, nullptr, nullptr,
                           QlxBasicUFormatterFFormat, nullptr, nullptr, bind);
     QlxAddUFormatterClass("test_heading", nullptr, nullptr, nullptr, nullptr, nullptr, header,
-                          nullptr, nullptr);
+                          trailer, nullptr);
     QlxSetObjProp(logger.get(), "level", "DEBUG_MIN");
   }
 
@@ -198,6 +208,37 @@ TEST_F(EventSourceTest, OutlivesALogCallThatAHeaderMakes) {
   debug();
   EXPECT_EQ(linesOf("b.log"), "inner.c inside 1 inner\n");
   EXPECT_EQ(linesOf("a.log"), "file.c function 7 text\n");
+}
+
+TEST_F(EventSourceTest, OutlivesTheCallersTexts) {
+  // A host may have one place for the texts of all its calls, those of its operations too.
+  std::string place = "file.c";
+  const auto overwrite = [&] { place = "inner"; };
+  const auto log = [&] {
+    place = "file.c";
+    QlxLogDebugMin(logger.get(), place.c_str(), nullptr, 7, u"text");
+  };
+  const Handle first = attachFile("first.log");
+  format(first, "heading", "test_heading");
+  const Handle second = attachFile("second.log");
+  gInHeader = overwrite;
+  log();
+  EXPECT_EQ(linesOf("first.log") + linesOf("second.log"), "file.c 7 text\nfile.c 7 text\n");
+
+  QlxSetObjPropInt(first.get(), "maxFileBytes", 1);
+  log();  // opens again
+  gInTrailer = overwrite;
+  log();  // rolls over
+  EXPECT_FALSE(gInTrailer);
+  EXPECT_EQ(linesOf("first.log"), "file.c 7 text\n");
+  EXPECT_EQ(linesOf("second.log"), "file.c 7 text\nfile.c 7 text\nfile.c 7 text\n");
+
+  format(first, "binding", "test_binding");
+  gInBind = overwrite;
+  log();
+  EXPECT_FALSE(gInBind);
+  EXPECT_EQ(linesOf("first.log"), "file.c 7 text\n");
+  EXPECT_EQ(linesOf("second.log").substr(3 * 14), "file.c 7 text\n");
 }
 
 TEST_F(EventSourceTest, IsNotTakenForThatOfTheNextEvent) {

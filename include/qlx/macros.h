@@ -1,8 +1,8 @@
 /**
  * @file
  * Log calls as macros. Each tests the logger in place, so a call below the threshold costs a load,
- * a compare and a branch, and evaluates none of its arguments but the logger, which is evaluated
- * once.
+ * a compare and a branch behind the test for null, and evaluates none of its arguments but the
+ * logger, which is evaluated once.
  *
  * A macro is a statement and drops the call's result; call the function where the result matters.
  * What a function of qlx/logger.h says of its arguments holds for the macro that calls it. Debug

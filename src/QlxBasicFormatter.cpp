@@ -16,6 +16,7 @@
 #include "QlxFormatted.h"
 #include "QlxHeldFormats.h"
 #include "QlxI18Msg.h"
+#include "QlxLoggedEvent.h"
 #include "QlxObject.h"
 #include "util/CxDecimal.h"
 #include "util/CxUStringBuff.h"
@@ -81,6 +82,7 @@ class WideLine {
   // The library's own binder writes straight into the line.
   bool appendMessage(Event *event, fBindMsg bind, va_list *args) {
     if (bind != qlxIntlBindUI18Msg) {
+      qlxSettleEvent(event);
       const OwnedUStr text{QlxBindEventUMsg(event, bind, args)};
       if (text) CxUStringBuffAppendUStr(text_, text.get());
       return true;

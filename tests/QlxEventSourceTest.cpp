@@ -233,12 +233,14 @@ TEST_F(EventSourceTest, OutlivesTheCallersTexts) {
   EXPECT_EQ(linesOf("first.log"), "file.c 7 text\n");
   EXPECT_EQ(linesOf("second.log"), "file.c 7 text\nfile.c 7 text\nfile.c 7 text\n");
 
+  const Handle third = attachFile("third.log");
   format(first, "binding", "test_binding");
+  QlxSetObjPropInt(first.get(), "maxFileBytes", 1000);
+  log();  // all are open
   gInBind = overwrite;
   log();
   EXPECT_FALSE(gInBind);
-  EXPECT_EQ(linesOf("first.log"), "file.c 7 text\n");
-  EXPECT_EQ(linesOf("second.log").substr(3 * 14), "file.c 7 text\n");
+  EXPECT_EQ(linesOf("third.log"), "file.c 7 text\nfile.c 7 text\n");
 }
 
 TEST_F(EventSourceTest, IsNotTakenForThatOfTheNextEvent) {

@@ -20,11 +20,12 @@ typedef struct QlxFileWatch {
 } QlxFileWatch;
 
 /**
- * Whether the path leads to a regular file, now: nothing that happened before the call is missed,
- * except that a change which the system does not tell of, such as another file system mounted over
- * a directory, may be seen a second late. A zeroed watch looks at the path; how it goes on is its
- * own affair. Where nothing can be watched (a relative path, symbolic links, a network's file
- * system, no watches left) it looks every time.
+ * Whether the path leads to a regular file, now: nothing that happened before the call is missed.
+ * Only a change which the system does not tell of, such as another file system mounted over a
+ * directory, may be seen a second late, and one whose notice a child took that was made without
+ * the handlers of a fork. A zeroed watch looks at the path; how it goes on is its own affair. Where
+ * nothing can be watched (a relative path, symbolic links, a network's file system, no watches
+ * left) it looks every time.
  */
 bool qlxFileWatchFindsFile(QlxFileWatch *watch, const char *path);
 

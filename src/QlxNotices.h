@@ -3,7 +3,8 @@
 // memory after it was asked for long (QlxReadiness), by a system call before that and elsewhere.
 //
 // All functions are called with the API lock held. A host may close the descriptors, and have
-// files of its own with their numbers, which are left alone.
+// files of its own with their numbers, which are left alone; only of an epoll set of its own in
+// their place may a question take an edge-triggered event.
 #ifndef QLX_SRC_QLXNOTICES_H
 #define QLX_SRC_QLXNOTICES_H
 

@@ -291,18 +291,12 @@ TEST_F(FileWatchTest, NoticesWhatWasLostInTooManyNotices) {
   EXPECT_EQ(vars()->watch.watching, 0);  // a new file
 }
 
-// An empty file with two directories of its own.
-std::string makeOneOfMany(const TempDir &dir, int i) {
-  const std::string name = "many/" + std::to_string(i) + "/own/app.log";
-  fs::create_directories(fs::path(dir.path(name)).parent_path());
-  dir.write(name, "");
-  return name;
-}
-
 TEST_F(FileWatchTest, GivesBackWatchesThatNobodyNeeds) {
   QlxFileWatch watch{};
   for (int i = 0; i < 600; ++i) {
-    const std::string name = makeOneOfMany(dir, i);
+    const std::string name = "many/" + std::to_string(i) + "/own/app.log";
+    fs::create_directories(fs::path(dir.path(name)).parent_path());
+    dir.write(name, "");
     const ApiLock lock;
     for (int look = 0; look < kUntilWatched; ++look) {
       ASSERT_TRUE(qlxFileWatchFindsFile(&watch, dir.path(name).c_str()));
@@ -324,11 +318,28 @@ TEST_F(FileWatchTest, GivesBackWatchesThatNobodyNeeds) {
   qlxFileWatchEnd(&watch);
 }
 
-// To give them up again and again would cost far more than to look at all of them.
+TEST_F(FileWatchTest, GivesWatchesBackAgainAtOnceAfterItWasStopped) {
+  const std::string path = dir.write("app.log", "");
+  const ApiLock lock;
+  for (int round = 0; round < 2; ++round) {
+    int32_t number = 0;
+    for (int i = 0; i < 1100; ++i) {
+      QlxFileWatch watch{};
+      for (int look = 0; look < kUntilWatched; ++look) qlxFileWatchFindsFile(&watch, path.c_str());
+      ASSERT_EQ(watch.watching, 1);
+      number = watch.watchNumber;
+      qlxFileWatchEnd(&watch);
+    }
+    EXPECT_LT(number, 500);  // they begin again
+    qlxFileWatchStop();
+  }
+}
+
+// To give them up again and again would cost far more than to look at all of the files.
 TEST_F(FileWatchTest, StaysWithMoreWatchesThanItUsuallyKeeps) {
-  constexpr int kFiles = 600;
+  constexpr int kFiles = 1100;
   std::vector<std::string> paths;
-  for (int i = 0; i < kFiles; ++i) paths.push_back(dir.path(makeOneOfMany(dir, i)));
+  for (int i = 0; i < kFiles; ++i) paths.push_back(dir.write(std::to_string(i), ""));
   std::vector<QlxFileWatch> watches(kFiles);
   const auto countWatching = [&] {
     const ApiLock lock;

@@ -342,6 +342,22 @@ TEST_F(WithoutFlagTest, AsksTheSystemWhereRequestsAreRefusedAndTriesOnce) {
   askInChild([] { EXPECT_EQ(sSubmits, 1); });
 }
 
+// Such as by a host, between two calls.
+TEST_F(WithoutFlagTest, TriesAgainWhereTheDescriptorWasClosedMeanwhile) {
+  qlxAioCalls.submit = [](aio_context_t context, long count, iocb **requests) {
+    if (++sSubmits > 1) return static_cast<int>(syscall(SYS_io_submit, context, count, requests));
+    errno = EBADF;
+    return -1;
+  };
+  Child child([&] {
+    watch();
+    awaitFlag();
+    EXPECT_GT(sSubmits, 1);
+    expectSeen([&] { removeOne(); });
+  });
+  EXPECT_EQ(child.end(), 0);
+}
+
 TEST_F(WithoutFlagTest, AsksTheSystemWhereTheRingIsOfAnotherKind) {
   qlxAioCalls.setUp = setUpUnknown;
   qlxAioCalls.submit = refuseSubmit;

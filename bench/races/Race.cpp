@@ -28,19 +28,19 @@ constexpr int64_t kMiB = 1'048'576;
 constexpr Row kRows[] = {
     {"suppressed", Call::Suppressed, 20'000'000},
     {"suppressed-inline", Call::SuppressedInline, 20'000'000},
-    {"text", Call::Text, 100'000},
-    {"message", Call::Message, 100'000},
-    {"message-localized", Call::Localized, 100'000},
+    {"text", Call::Text, 300'000},
+    {"message", Call::Message, 300'000},
+    {"message-localized", Call::Localized, 300'000},
     // At any scale some rollovers.
-    {"rolling", Call::Text, 100'000, 1, 1, kMiB, 3, Layout::Line, false, 30'000},
-    {"threads-2", Call::Text, 100'000, 2},
-    {"threads-8", Call::Text, 100'000, 8},
+    {"rolling", Call::Text, 300'000, 1, 1, kMiB, 3, Layout::Line, false, 30'000},
+    {"threads-2", Call::Text, 300'000, 2},
+    {"threads-8", Call::Text, 300'000, 8},
     // All generations are kept here: 60000 records are eight or nine of the twelve MiB.
     {"processes-4", Call::Text, 60'000, 1, 4, kMiB, 12, Layout::Line, false, 30'000},
-    {"xml", Call::Text, 100'000, 1, 1, 1'000'000'000, 3, Layout::Xml},
-    {"trace", Call::Text, 100'000, 1, 1, 1'000'000'000, 3, Layout::Trace},
-    {"xml-stamped", Call::Text, 100'000, 1, 1, 1'000'000'000, 3, Layout::Xml, true},
-    {"trace-stamped", Call::Text, 100'000, 1, 1, 1'000'000'000, 3, Layout::Trace, true},
+    {"xml", Call::Text, 300'000, 1, 1, 1'000'000'000, 3, Layout::Xml},
+    {"trace", Call::Text, 300'000, 1, 1, 1'000'000'000, 3, Layout::Trace},
+    {"xml-stamped", Call::Text, 300'000, 1, 1, 1'000'000'000, 3, Layout::Xml, true},
+    {"trace-stamped", Call::Text, 300'000, 1, 1, 1'000'000'000, 3, Layout::Trace, true},
 };
 
 constexpr int kMaxWorkers = 8;

@@ -42,10 +42,10 @@ QLX_BEGIN_DECLS
 // The key is not null.
 EventKey qlxEventKeyOf(const char *key);
 
+QLX_END_DECLS
+
 // A null event has none.
 EventValues qlxFindEventValues(const Event *event);
-
-QLX_END_DECLS
 
 // Numbers, where the event has such. Deliberate: both are cut to 32 bits; the thread is unsigned
 // then, the process is not.

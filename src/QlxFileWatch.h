@@ -19,6 +19,10 @@ typedef struct QlxFileWatch {
   int64_t lastLook;  // seconds
 } QlxFileWatch;
 
+/** A process starts no watch before it has looked so often: one that logs little ends sooner
+ *  without. Counted anew after qlxFileWatchStop(). Tests set another number. */
+extern uint32_t qlxFileWatchFirstLooks;
+
 /**
  * Whether the path leads to a regular file, now: nothing that happened before the call is missed.
  * Only a change which the system does not tell of, such as another file system mounted over a

@@ -1,5 +1,11 @@
 #include "support/FileWatchTest.h"
 
+// This program's tests are about watches, also those of processes that would have none yet.
+static const bool gStartsAtOnce = [] {
+  qlxFileWatchFirstLooks = 0;
+  return true;
+}();
+
 static bool gTellsMounted = true;
 
 // In place of the C library's, for the whole program of the tests: as old systems answer.
@@ -185,6 +191,35 @@ TEST_F(FileWatchTest, NoticesADirectoryThatMayNotBeSearchedAnyMore) {
 }
 
 // ---- Sizes
+
+TEST_F(FileWatchTest, StartsNoWatchBeforeTheProcessHasLookedOften) {
+  const auto stop = [](uint32_t looks) {
+    const ApiLock lock;
+    qlxFileWatchStop();
+    qlxFileWatchFirstLooks = looks;
+  };
+  const auto isWatched = [&] { return vars()->watch.watching == 1; };
+  ASSERT_TRUE(gStartsAtOnce);
+  stop(30);
+  set("fileName", dir.path(kName));
+  logTimes(30);
+  EXPECT_FALSE(isWatched());
+  EXPECT_TRUE(descriptorsOf("inotify").empty());
+  fs::remove(dir.path(kName));
+  log(u"again");
+  EXPECT_EQ(dir.read(kName), "again\n") << "the path is looked at meanwhile";
+  logTimes(30);
+  EXPECT_TRUE(isWatched());
+  set("fileName", dir.path("other.log"));
+  logTimes(kUntilWatched);
+  EXPECT_TRUE(isWatched()) << "the looks of all files count";
+  stop(30);
+  logTimes(kUntilWatched);
+  EXPECT_FALSE(isWatched()) << "and are counted anew";
+  stop(0);
+  logTimes(kUntilWatched);
+  EXPECT_TRUE(isWatched());
+}
 
 TEST_F(FileWatchTest, CountsTheBytesOfOtherWriters) {
   ASSERT_NO_FATAL_FAILURE(watchFile());

@@ -134,21 +134,32 @@ class HostsPair {
   int ends_[2];
 };
 
+// Both of the watch's numbers as a host has taken them.
+class TakenNumbers {
+ public:
+  TakenNumbers() {
+    for (const int number : {inotify_, epoll_}) EXPECT_EQ(dup2(pair_.end(), number), number);
+  }
+  void expectUntouched() const {
+    for (const int number : {inotify_, epoll_}) pair_.expectUntouched(number);
+  }
+
+ private:
+  const int inotify_ = descriptorsOf("inotify").at(0);
+  const int epoll_ = descriptorsOf("eventpoll").at(0);
+  const HostsPair pair_;
+};
+
 TEST_P(FileWatchDescriptorTest, LeavesAHostsFilesAloneThatHaveItsNumbers) {
   Child child([&] {
     ASSERT_NO_FATAL_FAILURE(watchInChild());
-    const int inotify = descriptorsOf("inotify").at(0);
-    const int epoll = descriptorsOf("eventpoll").at(0);
-    const HostsPair pair;
-    dup2(pair.end(), inotify);
-    dup2(pair.end(), epoll);
+    const TakenNumbers taken;
     fs::remove(dir.path(kName));
     EXPECT_EQ(next(), "next\n");
     logTimes(kUntilWatched);
     EXPECT_EQ(vars()->watch.watching, 1);
     set("maxFiles", "5");  // closes the file
-    pair.expectUntouched(inotify);
-    pair.expectUntouched(epoll);
+    taken.expectUntouched();
   });
   EXPECT_EQ(child.end(), 0);
 }
@@ -156,22 +167,14 @@ TEST_P(FileWatchDescriptorTest, LeavesAHostsFilesAloneThatHaveItsNumbers) {
 TEST_P(FileWatchDescriptorTest, LeavesAHostsFilesAloneWhenItStops) {
   Child child([&] {
     ASSERT_NO_FATAL_FAILURE(watchInChild());
-    const int inotify = descriptorsOf("inotify").at(0);
-    const int epoll = descriptorsOf("eventpoll").at(0);
-    const HostsPair pair;
-    dup2(pair.end(), inotify);
-    dup2(pair.end(), epoll);
-    Child forked([&] {
-      pair.expectUntouched(inotify);
-      pair.expectUntouched(epoll);
-    });
+    const TakenNumbers taken;
+    Child forked([&] { taken.expectUntouched(); });
     EXPECT_EQ(forked.end(), 0);
     set("maxFiles", "5");  // closes the file
     handler.reset();
     logger.reset();
     QlxCloseToolkit();
-    pair.expectUntouched(inotify);
-    pair.expectUntouched(epoll);
+    taken.expectUntouched();
   });
   EXPECT_EQ(child.end(), 0);
 }

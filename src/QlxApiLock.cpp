@@ -8,8 +8,8 @@
 #include <qlx/system.h>
 #include <qlx/toolkit.h>
 
-#include "QlxFileWatch.h"
 #include "QlxHeldFormats.h"
+#include "QlxLook.h"
 
 namespace {
 
@@ -34,7 +34,7 @@ void afterForkInParent() {
 }
 
 void afterForkInChild() {
-  qlxFileWatchStop();
+  qlxLookRestart();
   afterForkInParent();
 }
 

@@ -6,7 +6,6 @@
 #include <cerrno>
 #include <cstdio>
 #include <fcntl.h>
-#include <unistd.h>
 
 #include <qlx/class/object.h>
 #include <qlx/files.h>
@@ -17,7 +16,7 @@
 #include "QlxConfigKeys.h"
 #include "QlxFileNames.h"
 #include "QlxObject.h"
-#include "util/CxFile.h"
+#include "QlxRolling.h"
 #include "util/CxStatus.h"
 
 static constexpr const char *kFirstFileName = "default.log";
@@ -35,18 +34,19 @@ static void nameActiveFile(QlxFileHandlerVars *vars, const char *name) {
   qlxFHGetFileNameParts(name, vars);
   OslMemoryFree(vars->fullName);
   vars->fullName = qlxFHGenerationName(vars, vars->generation);
+  if (vars->basePart && !vars->fullName) vars->nameError = ENOMEM;
+  vars->stuck = vars->log.torn = vars->log.taken = 0;  // those were of another file
 }
 
 static void closeFile(QlxFileHandlerVars *vars) {
   vars->opened = 0;
-  qlxFileWatchEnd(&vars->watch);
-  if (vars->file != -1) qlxKeepFailure(nullptr, CxFileClose(&vars->file));
+  qlxKeepFailure(nullptr, qlxLogFileClose(vars));
 }
 
 void *QlxFileHandlerFAllocVars(void) {
   auto *vars = static_cast<QlxFileHandlerVars *>(OslMemoryCalloc(1, sizeof(QlxFileHandlerVars)));
   if (!vars) return nullptr;
-  vars->file = -1;
+  vars->file = vars->log.reserve = -1;
   vars->maxBytes = kFirstMaxBytes;
   vars->maxFiles = kDefaultMaxFiles;
   vars->filePermission = kFirstFilePermission;
@@ -76,42 +76,23 @@ QlxFileHandlerVars *qlxFileHandlerVars(QlxObject *handler) {
   return handler ? static_cast<QlxFileHandlerVars *>(handler->vars) : nullptr;
 }
 
-void qlxKeepFailure(Event *event, CxStatus status) {
-  if (!qlxFailed(status)) return;
-  QlxReportPlatformErr(status);
-  if (event) event->status = status;
-}
-
 // ---- The bytes of the active file
-
-// The end of an append-mode file costs a tenth of its status; without that mode the seek would move
-// the place of the next write.
-CxStatus qlxFileHandlerMeasure(QlxFileHandlerVars *vars) {
-  int64_t size = vars->appending == 1 ? lseek(vars->file, 0, SEEK_END) : -1;
-  CxStatus status = kCxSuccess;
-  if (size < 0) status = CxFileGetSize(&vars->file, &size);
-  if (!qlxFailed(status)) vars->size = static_cast<uint64_t>(size);
-  return status;
-}
 
 bool qlxFileHandlerIsFull(const QlxFileHandlerVars *vars) {
   // Deliberate: a negative limit is as unsigned the largest of all, and 0 is always reached.
-  return vars->maxFiles > 1 && vars->size >= static_cast<uint64_t>(int64_t{vars->maxBytes});
-}
-
-CxStatus qlxFileHandlerWrite(QlxFileHandlerVars *vars, const char *bytes, uint32_t length) {
-  return cxIntlFileWriteAll(&vars->file, bytes, length, &vars->size);
+  return vars->log.rolls && vars->maxFiles > 1 &&
+         vars->size >= static_cast<uint64_t>(int64_t{vars->maxBytes});
 }
 
 CxStatus qlxFileHandlerWriteText(QlxFileHandlerVars *vars, const FormattedBytes &text) {
   if (!text.data()) return cxFailure(ENOMEM);
-  return qlxFileHandlerWrite(vars, text.data(), text.length());
+  return qlxLogFileWrite(vars, text.data(), text.length());
 }
 
 // Writes a header or a trailer and frees it; null writes nothing.
 static CxStatus writeFrame(QlxFileHandlerVars *vars, char *frame) {
   const OwnedStr text{frame};
-  return qlxFileHandlerWrite(vars, text.get(), OslStringLen(text.get()));
+  return qlxLogFileWrite(vars, text.get(), OslStringLen(text.get()));
 }
 
 // ---- Opening and closing
@@ -119,47 +100,50 @@ static CxStatus writeFrame(QlxFileHandlerVars *vars, char *frame) {
 void qlxFileHandlerMakeDirectory(const QlxFileHandlerVars *vars) {
   CxFilePath path;
   CxInitFilePath(&path, vars->dirPart);
-  qlxKeepFailure(nullptr, cxStatusOf(CxFilePathMkdirs(&path, vars->dirPermission)));
+  qlxKeepFailure(nullptr, cxStatusOf(CxFilePathMkdirs(&path, vars->dirPermission & 0777)));
 }
 
 static CxStatus openFile(QlxFileHandlerVars *vars) {
-  const int32_t existing = vars->appending == 1 ? O_APPEND : O_TRUNC;
-  return CxFileOpenMode(&vars->file, vars->fullName, O_CREAT | O_RDWR | existing,
-                        vars->filePermission);
+  return qlxLogFileOpen(vars, vars->appending == 1 ? O_APPEND : O_TRUNC);
 }
 
-static void rollOver(QlxObject *handler, QlxFileHandlerVars *vars) {
+void qlxFileHandlerDoRollover(QlxFileHandlerVars *vars) {
+  if (vars && !qlxFailed(qlxFHCheckNames(vars))) qlxMoveActiveFile(vars);
+}
+
+// False when the full file has to take the next event too.
+static bool rollOver(QlxObject *handler, QlxFileHandlerVars *vars) {
+  if (!qlxMoveActiveFile(vars)) return false;
   QlxFileHandlerFClose(handler);  // the trailer goes into the full file
-  qlxFileHandlerDoRollover(vars);
   vars->size = 0;
+  return true;
 }
 
 // Whether the open file can take the next event; if not it is closed. Deliberate: another regular
-// file under its name is not noticed, what is open goes on.
+// file under its name is not noticed, what is open goes on. Between two looks own bytes are
+// counted; what the count calls full is measured.
 static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
-  if (!qlxFileWatchFindsFile(&vars->watch, vars->fullName)) {
-    QlxFileHandlerFClose(handler);
-    return false;
-  }
-  const CxStatus status = qlxFileHandlerMeasure(vars);
+  if (!qlxLookAgain(&vars->log.look) && !qlxFileHandlerIsFull(vars)) return true;
+  const CxStatus status = qlxLogFileMeasure(vars);
   if (qlxFailed(status)) {
     qlxKeepFailure(nullptr, status);
     closeFile(vars);
     return false;
   }
-  if (!qlxFileHandlerIsFull(vars)) return true;
-  rollOver(handler, vars);
-  return false;
+  if (!vars->log.rolls) return true;
+  if (!qlxLeadsToFile(vars->fullName)) {
+    QlxFileHandlerFClose(handler);
+    return false;
+  }
+  return !qlxFileHandlerIsFull(vars) || !rollOver(handler, vars);
 }
 
 // Opens the active file with room for an event, behind its header.
 static CxStatus openForEvent(QlxObject *handler, QlxFileHandlerVars *vars) {
   CxStatus status = openFile(vars);
-  if (!qlxFailed(status)) status = qlxFileHandlerMeasure(vars);
   if (!qlxFailed(status) && qlxFileHandlerIsFull(vars)) {
     vars->opened = 1;  // what is open is closed with its trailer
-    rollOver(handler, vars);
-    status = openFile(vars);
+    if (rollOver(handler, vars)) status = openFile(vars);
   }
   if (qlxFailed(status)) return status;
   return writeFrame(vars, qlxIntlHandlerGetFmtHeader(handler));
@@ -167,10 +151,14 @@ static CxStatus openForEvent(QlxObject *handler, QlxFileHandlerVars *vars) {
 
 CxStatus QlxFileHandlerFOpenWithErr(QlxObject *handler) {
   QlxFileHandlerVars *vars = qlxFileHandlerVars(handler);
-  if (!vars || !vars->fullName) return kCxSuccess;
+  if (!vars) return kCxSuccess;
   if (vars->opened == 1 && staysOpen(handler, vars)) return kCxSuccess;
-  qlxFileHandlerMakeDirectory(vars);
-  const CxStatus status = openForEvent(handler, vars);
+  CxStatus status = qlxFHCheckNames(vars);
+  if (!qlxFailed(status) && !vars->fullName) return status;
+  if (!qlxFailed(status)) {
+    qlxFileHandlerMakeDirectory(vars);
+    status = openForEvent(handler, vars);
+  }
   if (qlxFailed(status)) {
     qlxKeepFailure(nullptr, status);
     closeFile(vars);
@@ -187,21 +175,33 @@ void QlxFileHandlerFOpen(QlxObject *handler) {
 void QlxFileHandlerFClose(QlxObject *handler) {
   QlxFileHandlerVars *vars = qlxFileHandlerVars(handler);
   if (!vars || vars->opened != 1) return;
-  qlxKeepFailure(nullptr, writeFrame(vars, qlxIntlHandlerGetFmtTrailer(handler)));
+  const bool isOurs = !qlxFailed(qlxLogFileMeasure(vars));
+  if (isOurs) qlxKeepFailure(nullptr, writeFrame(vars, qlxIntlHandlerGetFmtTrailer(handler)));
   closeFile(vars);
+}
+
+// A descriptor that was taken away since the last look: the record goes into the file of the name.
+static CxStatus writeAnew(QlxObject *handler, QlxFileHandlerVars *vars,
+                          const FormattedBytes &text) {
+  closeFile(vars);
+  const CxStatus status = QlxFileHandlerFOpenWithErr(handler);
+  return qlxFailed(status) ? status : qlxFileHandlerWriteText(vars, text);
 }
 
 // Formatting has effects of its own on the event, so it is done without an open file too.
 static void formatAndWrite(QlxObject *handler, QlxFileHandlerVars *vars, Event *event,
                            va_list *args) {
   const FormattedBytes text{handler, event, args};
-  if (text && vars->opened == 1) qlxKeepFailure(event, qlxFileHandlerWriteText(vars, text));
+  if (!text || vars->opened != 1) return;
+  CxStatus status = qlxFileHandlerWriteText(vars, text);
+  if (status.code == EBADF) status = writeAnew(handler, vars, text);
+  qlxKeepLost(event, status);
 }
 
 void QlxFileUHandlerFProcess(QlxObject *handler, Event *event, va_list *args) {
   QlxFileHandlerVars *vars = qlxFileHandlerVars(handler);
   if (!vars || !event || !loadEnabled(handler)) return;
-  qlxKeepFailure(event, QlxFileHandlerFOpenWithErr(handler));
+  qlxKeepLost(event, QlxFileHandlerFOpenWithErr(handler));
   formatAndWrite(handler, vars, event, args);
   QlxBasicObjectFLog(handler, event, args);
 }
@@ -234,6 +234,12 @@ static void applyAppending(QlxObject *handler, const char *) {
 
 static void applyLogInternalErrs(QlxObject *handler, const char *) {
   qlxFileHandlerVars(handler)->logInternalErrs = appendingProperty(handler);
+}
+
+static void applyKeepFullFile(QlxObject *handler, const char *key) {
+  uint8_t found = 0;
+  const uint8_t value = qlxIntlGetObjPropBool(handler, key, &found);
+  closeForChange(handler)->keepFullFile = found ? value : 0;
 }
 
 static void applyFileName(QlxObject *handler, const char *key) {
@@ -280,6 +286,7 @@ static constexpr ConfigKey kFileHandlerKeys[] = {
     {"fileEncoding", applyEncoding},
     {"MPFileSemKey", applyInt<&QlxFileHandlerVars::semKey, 0>},
     {"logInternalErrs", applyLogInternalErrs},
+    {"keepFullFile", applyKeepFullFile},
 };
 
 void QlxFileHandlerFCfgChange(QlxObject *handler, const char *key) {

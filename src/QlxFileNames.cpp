@@ -1,10 +1,11 @@
 // The naming of log files: a configured name is taken apart into directory, base, number and
-// extension, and put together again for each generation; a rollover moves the generations up.
+// extension, and put together again for each generation.
 #include "QlxFileNames.h"
 
 #include <cerrno>
+#include <cstdio>
 #include <cstring>
-#include <utility>
+#include <iterator>
 
 #include <qlx/class/props.h>
 #include <qlx/files.h>
@@ -15,7 +16,7 @@
 #include "util/CxOwned.h"
 #include "util/CxStatus.h"
 
-static constexpr uint32_t kMaxNameBytes = 256;
+static constexpr uint32_t kMaxNameBytes = sizeof(QlxFileName) - 1;
 static constexpr uint32_t kMaxNumberBytes = sizeof "-2147483648";
 
 int32_t qlxFHTrailingBaseDigit(const char *name) {
@@ -84,7 +85,8 @@ static void getCurrentDirectory(char buffer[kMaxNameBytes + 1]) {
 void qlxFHGetFileNameParts(const char *name, QlxFileHandlerVars *vars) {
   if (!vars) return;
   clearParts(vars);
-  if (!name || OslStringLen(name) > kMaxNameBytes) return;
+  vars->nameError = OslStringLen(name) > kMaxNameBytes ? ENAMETOOLONG : 0;
+  if (!name || vars->nameError != 0) return;
   char stem[kMaxNameBytes + 1];
   qlxGetNativePath(name, stem);
 
@@ -101,7 +103,9 @@ void qlxFHGetFileNameParts(const char *name, QlxFileHandlerVars *vars) {
   if (*stem) vars->dirPart = OslStringDup(stem);
 
   const bool complete = vars->basePart && (!dot || vars->extPart) && (!*stem || vars->dirPart);
-  if (!complete) clearParts(vars);  // half a name could be that of somebody else's file
+  if (complete) return;
+  clearParts(vars);  // half a name could be that of somebody else's file
+  vars->nameError = ENOMEM;
 }
 
 // ---- Putting a name together
@@ -123,26 +127,24 @@ char *qlxFHGenerationName(const QlxFileHandlerVars *vars, int32_t generation) {
   return name;
 }
 
-// ---- Moving the generations up
-
-static void keepUnlessMissing(Event *event, CxStatus status) {
-  if (status.code != ENOENT) qlxKeepFailure(event, status);
+uint8_t qlxFHWriteName(const QlxFileHandlerVars *vars, int32_t generation, QlxFileName name) {
+  const auto orNone = [](const char *part) { return part ? part : ""; };
+  char number[kMaxNumberBytes] = "";
+  if (generation != 0) OslStringSprintf(number, "%d", generation);
+  name[0] = '\0';
+  if (!vars->basePart) return 0;
+  const int length = snprintf(name, sizeof(QlxFileName), "%s%s%s%s%s%s", orNone(vars->dirPart),
+                              vars->dirPart ? "/" : "", vars->basePart, number,
+                              vars->extPart ? "." : "", orNone(vars->extPart));
+  const bool fits = length >= 0 && static_cast<uint32_t>(length) <= kMaxNameBytes;
+  if (!fits) name[0] = '\0';
+  return fits;
 }
 
-void qlxFHShiftGenerations(const QlxFileHandlerVars *vars, int32_t lowest, Event *event) {
-  if (!vars || vars->maxFiles < 2) return;
-  const int32_t last = vars->maxFiles - 1;
-  OwnedStr to{qlxFHGenerationName(vars, last)};
-  if (to) keepUnlessMissing(event, CxFileNameRemove(to.get()));
-  for (int32_t i = last - 1; to && i >= lowest; --i) {
-    OwnedStr from{qlxFHGenerationName(vars, i)};
-    if (from) keepUnlessMissing(event, CxFileNameRename(from.get(), to.get()));
-    to = std::move(from);
-  }
-  // A name that cannot be made ends the moving: the files below must not replace one that stayed.
-  if (!to) qlxKeepFailure(event, cxFailure(ENOMEM));
-}
-
-void qlxFileHandlerDoRollover(QlxFileHandlerVars *vars) {
-  qlxFHShiftGenerations(vars, 0, nullptr);
+CxStatus qlxFHCheckNames(const QlxFileHandlerVars *vars) {
+  if (vars->nameError != 0) return cxFailure(vars->nameError);
+  QlxFileName longest;
+  const int32_t last = vars->maxFiles > 1 ? vars->maxFiles - 1 : 0;
+  const bool fits = !vars->fullName || qlxFHWriteName(vars, last, longest);
+  return cxStatusOf(fits ? 0 : ENAMETOOLONG);
 }

@@ -34,11 +34,16 @@ char *qlxFHCloseBaseDigits(const char *name);
 /** The name of a generation, or null. */
 char *qlxFHGenerationName(const QlxFileHandlerVars *vars, int32_t generation);
 
-/**
- * Removes the oldest generation and moves those from `lowest` on up by one, the highest first.
- * Failures are reported and stored in the event, which may be null; a missing file is none.
- */
-void qlxFHShiftGenerations(const QlxFileHandlerVars *vars, int32_t lowest, Event *event);
+/** A name that is not cut, with its terminator. */
+typedef char QlxFileName[257];
+
+/** As qlxFHGenerationName(), without memory. 0, and an empty name, for one that would have to be
+ * cut, and for none. */
+uint8_t qlxFHWriteName(const QlxFileHandlerVars *vars, int32_t generation, QlxFileName name);
+
+/** Success when the handler may open its file: the names of all its generations fit, or it has
+ * none. A name must never be cut, since the rest of it may be the name of another file. */
+CxStatus qlxFHCheckNames(const QlxFileHandlerVars *vars);
 
 QLX_END_DECLS
 

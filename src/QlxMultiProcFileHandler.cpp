@@ -8,22 +8,30 @@
 #include <cstdio>
 
 #include <fcntl.h>
+#include <sys/statvfs.h>
 #include <unistd.h>
 
 #include <qlx/class/object.h>
 #include <qlx/files.h>
+#include <qlx/memory.h>
 
 #include "QlxClasses.h"
 #include "QlxFileNames.h"
 #include "QlxObject.h"
+#include "QlxRolling.h"
 #include "QlxSharedLock.h"
 #include "util/CxFile.h"
-#include "util/CxOwned.h"
 #include "util/CxStatus.h"
 
 static constexpr uint32_t kCopyBytes = 8192;
 
 // ---- Rolling over. Failures are reported and stored in the event, which may be null.
+
+// True for a success.
+static bool keep(QlxFileHandlerVars *vars, Event *event, CxStatus status) {
+  qlxKeepRollover(event, status, vars->fullName);
+  return !qlxFailed(status);
+}
 
 // Copies from the place of one descriptor on to another.
 static CxStatus copyBytes(CxFile *from, CxFile *to) {
@@ -31,75 +39,135 @@ static CxStatus copyBytes(CxFile *from, CxFile *to) {
   uint64_t copied = 0;
   for (;;) {
     int32_t count = 0;
-    CxStatus status = CxFileRead(from, bytes.data(), kCopyBytes, &count);
-    if (qlxFailed(status) && status.code == EINTR) continue;
+    CxStatus status =
+        cxUntilDone([&] { return CxFileRead(from, bytes.data(), kCopyBytes, &count); });
     if (qlxFailed(status) || count == 0) return status;
     status = cxIntlFileWriteAll(to, bytes.data(), static_cast<uint32_t>(count), &copied);
     if (qlxFailed(status)) return status;
   }
 }
 
-static void copyToFirstGeneration(QlxFileHandlerVars *vars, Event *event) {
-  const OwnedStr name{qlxFHGenerationName(vars, 1)};
-  CxFile generation = -1;
-  // Deliberate: not truncated; what the rollover could not move away is written over.
-  const CxStatus status =
-      CxFileOpenMode(&generation, name.get(), O_CREAT | O_RDWR, vars->filePermission);
-  qlxKeepFailure(event, status);
-  if (qlxFailed(status)) {
-    std::printf("ERR opening %s pre rollover\n", name ? name.get() : "");
-    return;
-  }
-  qlxKeepFailure(event, copyBytes(&vars->file, &generation));
-  qlxKeepFailure(event, CxFileFlush(&generation));
-  qlxKeepFailure(event, CxFileClose(&generation));
+// A file that is much larger than what is free: the copy would fill the disk first.
+static CxStatus checkRoom(const QlxFileHandlerVars *vars) {
+  struct statvfs system;
+  if (fstatvfs(vars->file, &system) != 0) return kCxSuccess;  // it does not say
+  return cxStatusOf(vars->size / 2 > uint64_t{system.f_bfree} * system.f_frsize ? ENOSPC : 0);
 }
 
-static void rollActiveFile(QlxFileHandlerVars *vars, Event *event) {
-  const CxStatus atStart = CxFileSeek(&vars->file, 0, SEEK_SET);
-  qlxKeepFailure(event, atStart);
-  if (!qlxFailed(atStart)) copyToFirstGeneration(vars, event);
-  // Deliberate: whatever became of the copy, so that the file never grows past its limit.
-  qlxKeepFailure(event, CxFileTrunc(&vars->file));
-  qlxKeepFailure(event, CxFileSeek(&vars->file, 0, SEEK_SET));
+// Whatever stands there under the name, such as a link to another file, goes: nothing else than a
+// new file is written.
+static CxStatus makeGeneration(QlxFileHandlerVars *vars, const char *name, CxFile *generation) {
+  const auto open = [&] {
+    return qlxOpenHigh(generation, name, O_CREAT | O_EXCL | O_NOFOLLOW | O_RDWR,
+                       vars->filePermission);
+  };
+  const CxStatus removed =
+      cxUntilDone([&] { return cxStatusOfCall(unlink(name) == 0 || errno == ENOENT); });
+  if (qlxFailed(removed)) return removed;
+  const CxStatus status = open();
+  const bool noNumbers = status.code == EMFILE || status.code == ENFILE;
+  return noNumbers && qlxLogFileSpend(vars) ? open() : status;
+}
+
+static bool copyTo(CxFile *generation, QlxFileHandlerVars *vars, Event *event) {
+  bool copied = keep(vars, event, copyBytes(&vars->file, generation));
+  copied &= keep(vars, event, cxUntilDone([&] { return CxFileFlush(generation); }));
+  copied &= keep(vars, event, CxFileClose(generation));
+  qlxLogFileReserve(vars);
+  return copied;
+}
+
+// `made` becomes the name of the generation as soon as it is there.
+static bool copyToFirstGeneration(QlxFileHandlerVars *vars, Event *event, QlxFileName made) {
+  QlxFileName name;
+  qlxFHWriteName(vars, 1, name);
+  CxFile generation = -1;
+  if (!keep(vars, event, makeGeneration(vars, name, &generation))) {
+    std::printf("ERR opening %s pre rollover\n", name);
+    return false;
+  }
+  OslStringCpy(made, name);
+  return copyTo(&generation, vars, event);
+}
+
+static bool copyActiveFile(QlxFileHandlerVars *vars, Event *event, QlxFileName made) {
+  const bool hasRoom = keep(vars, event, checkRoom(vars));
+  if (!hasRoom && vars->keepFullFile) return false;
+  return keep(vars, event, CxFileSeek(&vars->file, 0, SEEK_SET)) &&
+         copyToFirstGeneration(vars, event, made);
+}
+
+static void emptyActiveFile(QlxFileHandlerVars *vars, Event *event) {
+  if (!keep(vars, event, qlxLogFileMeasure(vars))) return;  // not ours any more
+  keep(vars, event, cxUntilDone([&] { return CxFileTrunc(&vars->file); }));
+  keep(vars, event, CxFileSeek(&vars->file, 0, SEEK_SET));
+}
+
+// False when the file is as full as before; then there is no copy of it either.
+static bool rollActiveFile(QlxFileHandlerVars *vars, Event *event) {
+  QlxFileName made = "";
+  const bool copied = copyActiveFile(vars, event, made);
+  // Deliberate: else whatever became of the copy, so that the file never grows past its limit.
+  if (copied || !vars->keepFullFile) emptyActiveFile(vars, event);
+  const bool isFull = !qlxFailed(qlxLogFileMeasure(vars)) && vars->size > 0;
+  if (isFull && made[0]) unlink(made);
+  return !isFull;
+}
+
+// ---- A file that stays full is copied once a second, and costs no older generation.
+
+static constexpr int64_t kNanosecondsBetweenTries = 1000000000;
+
+static bool waitsForNextTry(const QlxFileHandlerVars *vars) {
+  return vars->stuck && qlxLookTick() - vars->stuckSince < kNanosecondsBetweenTries;
 }
 
 static void rollOver(QlxFileHandlerVars *vars, Event *event) {
-  qlxFHShiftGenerations(vars, 1, event);
-  rollActiveFile(vars, event);
+  const bool mayComeAgain = vars->keepFullFile || vars->stuck;
+  const auto makeRoom = mayComeAgain ? qlxFreeFirstGeneration : qlxShiftGenerations;
+  const bool hasRoom = makeRoom(vars, event) || !vars->keepFullFile;
+  vars->stuck = !hasRoom || !rollActiveFile(vars, event);
+  vars->stuckSince = qlxLookTick();
+}
+
+static bool mayRoll(QlxFileHandlerVars *vars) {
+  return vars && !qlxFailed(qlxFHCheckNames(vars));
 }
 
 void qlxMultiProcFileHandlerRollActiveLog(QlxFileHandlerVars *vars) {
-  if (vars) rollActiveFile(vars, nullptr);
+  if (mayRoll(vars)) rollActiveFile(vars, nullptr);
 }
 
 void qlxMultiProcFileHandlerDoRollover(QlxFileHandlerVars *vars) {
-  if (vars) rollOver(vars, nullptr);
+  if (mayRoll(vars)) rollOver(vars, nullptr);
 }
 
 // ---- Opening and closing
 
+// Deliberate: appends also when "appending" is off.
 static CxStatus openFile(QlxFileHandlerVars *vars) {
   qlxFileHandlerMakeDirectory(vars);
-  // Deliberate: appends also when "appending" is off.
-  return CxFileOpenMode(&vars->file, vars->fullName, O_CREAT | O_RDWR | O_APPEND,
-                        vars->filePermission);
+  const CxStatus status = qlxLogFileOpen(vars, O_APPEND);
+  vars->opened = !qlxFailed(status);
+  if (vars->opened == 1) qlxLogFileReserve(vars);
+  return status;
 }
 
 // Opens the file, if there is one to open. Without the semaphore it stays closed.
 static CxStatus openShared(QlxFileHandlerVars *vars) {
-  if (!vars || !vars->fullName || vars->opened == 1) return kCxSuccess;
-  CxStatus status = vars->semReady == 1 ? kCxSuccess : qlxSharedLockSetUp(vars);
-  if (!qlxFailed(status)) status = openFile(vars);
-  if (!qlxFailed(status)) vars->opened = 1;
-  return status;
+  if (!vars || vars->opened == 1) return kCxSuccess;
+  CxStatus status = qlxFHCheckNames(vars);
+  if (qlxFailed(status) || !vars->fullName) return status;
+  if (vars->semReady != 1) status = qlxSharedLockSetUp(vars);
+  return qlxFailed(status) ? status : openFile(vars);
 }
 
 CxStatus QlxMultiProcFileHandlerFOpenWithErr(QlxObject *handler) {
   QlxFileHandlerVars *vars = qlxFileHandlerVars(handler);
   const CxStatus status = openShared(vars);
   qlxKeepFailure(nullptr, status);
-  return vars && vars->semReady == 1 ? status : kCxSuccess;  // Deliberate: no semaphore, no failure
+  // Deliberate: no semaphore, no failure
+  return vars && (vars->semReady == 1 || status.code == ENAMETOOLONG) ? status : kCxSuccess;
 }
 
 void QlxMultiProcFileHandlerFOpen(QlxObject *handler) {
@@ -109,26 +177,36 @@ void QlxMultiProcFileHandlerFOpen(QlxObject *handler) {
 void QlxMultiProcFileHandlerFClose(QlxObject *handler) {
   QlxFileHandlerVars *vars = qlxFileHandlerVars(handler);
   if (!vars || vars->opened != 1) return;
-  qlxKeepFailure(nullptr, CxFileClose(&vars->file));
+  qlxKeepFailure(nullptr, qlxLogFileClose(vars));
   vars->opened = 0;
 }
 
 // ---- Writing
 
+// A descriptor that was taken away: what is written goes into the file of the name.
+static CxStatus measureOurs(QlxFileHandlerVars *vars) {
+  if (!qlxFailed(qlxLogFileMeasure(vars))) return kCxSuccess;
+  qlxKeepFailure(nullptr, qlxLogFileClose(vars));
+  return openFile(vars);
+}
+
 // Runs while this process holds the semaphore.
-static void checkSizeAndWrite(QlxFileHandlerVars *vars, Event *event, const FormattedBytes &text) {
-  qlxKeepFailure(event, qlxFileHandlerMeasure(vars));
-  if (qlxFileHandlerIsFull(vars)) rollOver(vars, event);
-  qlxKeepFailure(event, qlxFileHandlerWriteText(vars, text));
+static CxStatus checkSizeAndWrite(QlxFileHandlerVars *vars, Event *event,
+                                  const FormattedBytes &text) {
+  const CxStatus status = measureOurs(vars);
+  if (qlxFailed(status)) return status;
+  if (qlxFileHandlerIsFull(vars) && !waitsForNextTry(vars)) rollOver(vars, event);
+  return qlxFileHandlerWriteText(vars, text);
 }
 
 // Deliberate: a record whose lock fails is dropped; the event tells of it.
 static void writeText(QlxFileHandlerVars *vars, Event *event, const FormattedBytes &text) {
-  const CxStatus lock = qlxSharedLockTake(vars);
-  qlxKeepFailure(event, lock);
-  if (qlxFailed(lock)) return;
-  checkSizeAndWrite(vars, event, text);
-  qlxMultiProcFileHandlerUnlockSem(vars);
+  CxStatus status = qlxSharedLockTake(vars);
+  if (!qlxFailed(status)) {
+    status = checkSizeAndWrite(vars, event, text);
+    qlxMultiProcFileHandlerUnlockSem(vars);
+  }
+  qlxKeepLost(event, status);
 }
 
 // The text is gone before the listeners get the event.
@@ -141,7 +219,7 @@ static void formatAndWrite(QlxObject *handler, QlxFileHandlerVars *vars, Event *
 void QlxMultiProcFileUHandlerFProcess(QlxObject *handler, Event *event, va_list *args) {
   QlxFileHandlerVars *vars = qlxFileHandlerVars(handler);
   if (!vars || !event || !loadEnabled(handler)) return;
-  qlxKeepFailure(event, openShared(vars));
+  qlxKeepLost(event, openShared(vars));
   if (vars->opened != 1) return;  // Deliberate: the listeners do not get the event either
   formatAndWrite(handler, vars, event, args);
   QlxBasicObjectFLog(handler, event, args);

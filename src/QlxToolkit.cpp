@@ -10,7 +10,6 @@
 #include <qlx/toolkit.h>
 
 #include "QlxClasses.h"
-#include "QlxFileWatch.h"
 #include "QlxFormatted.h"
 #include "QlxHeldFormats.h"
 #include "QlxLocked.h"
@@ -176,7 +175,6 @@ static void closeToolkit() {
   qlxDropKeptEvent();
   qlxDropFormatted();
   qlxDropHeldFormats();
-  qlxFileWatchStop();
   gToolkit.open = 0;
 }
 

@@ -1,7 +1,10 @@
 #include "support/FileHandlerTest.h"
 
 #include <fstream>
+#include <sys/stat.h>
+#include <unistd.h>
 
+#include "support/Child.h"
 #include "support/WorkingDir.h"
 
 namespace {
@@ -114,6 +117,62 @@ TEST_F(FileHandlerTest, PutsTheUnderscoreAlsoIntoANameWithoutExtension) {
   set("fileName", "app7");
   log(u"1");
   EXPECT_EQ(dir.read("app7_"), "1\n");
+}
+
+// Nobody's files in a folder of the superuser's, where each may move its own files only.
+constexpr int kNotAllowed = 77;
+
+void becomeNobody() {
+  if (geteuid() != 0 || setresuid(65534, 65534, 65534) != 0) _exit(kNotAllowed);
+}
+
+TEST_F(FileHandlerTest, LeavesTheOlderGenerationsWhileTheActiveFileCannotBeMoved) {
+  formatter->header = "head\n";
+  formatter->trailer = "tail\n";
+  const TempDir folder;
+  for (const char *name : {"app.log", "app1.log", "app2.log", "app3.log"}) {
+    folder.write(name, std::string(name) + "\n");
+    chmod(folder.path(name).c_str(), 0666);
+    if (name[3] != '.') (void)!chown(folder.path(name).c_str(), 65534, 65534);
+  }
+  ASSERT_EQ(chmod(folder.path().c_str(), 01777), 0);
+  set("fileName", folder.path("app.log"));
+  set("maxFileBytes", "1");
+  set("maxFiles", "5");
+  Child child([&] {
+    becomeNobody();
+    const QlxHandlerProblems before = problems();
+    for (const char16_t *text : {u"1", u"2", u"3"}) EXPECT_EQ(logged(text), kSuccess);
+    EXPECT_EQ(problems().rolloversFailed, before.rolloversFailed + 3);
+    EXPECT_EQ(problems().rollover, failure(EPERM));
+    EXPECT_EQ(problems().rolloverFile, folder.path() + "//app.log");
+    EXPECT_EQ(problems().recordsLost, before.recordsLost);
+  });
+  const int end = child.end();
+  if (end == kNotAllowed) GTEST_SKIP() << "this process may not become another user";
+  ASSERT_EQ(end, 0);
+  EXPECT_EQ(folder.read("app.log"), "app.log\nhead\n1\n2\n3\n");
+  EXPECT_FALSE(folder.has("app1.log"));
+  EXPECT_EQ(folder.read("app2.log"), "app1.log\n");
+  EXPECT_EQ(folder.read("app4.log"), "app3.log\n");
+}
+
+TEST_F(FileHandlerTest, MovesTheFileOnceItCanBe) {
+  formatter->trailer = "tail\n";
+  set("maxFileBytes", "1");
+  set("maxFiles", "2");
+  std::filesystem::create_directories(dir.path("app1.log/occupied"));
+  for (const char16_t *text : {u"1", u"2"}) log(text);
+  std::filesystem::remove_all(dir.path("app1.log"));
+  EXPECT_EQ(logged(u"3"), kSuccess);
+  EXPECT_EQ(generations(), "3| 1|2|tail| - -");
+}
+
+TEST_F(FileHandlerTest, DoesNotStopForManyGenerations) {
+  set("maxFileBytes", "1");
+  set("maxFiles", "2147483647");
+  for (const char16_t *text : {u"1", u"2", u"3", u"4"}) EXPECT_EQ(logged(text), kSuccess);
+  EXPECT_EQ(generations(), "4| 3| 2| 1|");
 }
 
 TEST_F(FileHandlerTest, WritesOnIntoTheFullFileWhenItCannotBeRenamed) {

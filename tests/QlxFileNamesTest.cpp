@@ -135,7 +135,6 @@ TEST(FileNames, HaveAtMost256Bytes) {
 
 TEST(FileNames, IgnoreNullVariables) {
   qlxFHGetFileNameParts("app.log", nullptr);
-  qlxFHShiftGenerations(nullptr, 0, nullptr);
 }
 
 TEST(FileNames, HaveNoDirectoryWhenTheWorkingDirectoryIsGone) {
@@ -212,86 +211,6 @@ TEST(FileNames, AreMadeNativeInTheirFirst256Bytes) {
   qlxGetNativePath(nullptr, buffer);
   EXPECT_STREQ(buffer, "");
   qlxGetNativePath("name", nullptr);
-}
-
-// ---- Moving the generations up
-
-class Generations : public ::testing::Test {
- protected:
-  void SetUp() override { qlxFHGetFileNameParts(dir.path("app.log").c_str(), vars.get()); }
-
-  // The contents of app.log, app1.log, ... up to app4.log, "-" for a missing one.
-  std::string contents() {
-    std::string all;
-    for (const char *name : {"app.log", "app1.log", "app2.log", "app3.log", "app4.log"}) {
-      all += dir.has(name) ? dir.read(name) : "-";
-    }
-    return all;
-  }
-
-  TempDir dir;
-  Vars vars = makeVars();
-};
-
-TEST_F(Generations, MoveUpByOneAndTheOldestGoes) {
-  dir.write("app.log", "0");
-  dir.write("app1.log", "1");
-  dir.write("app2.log", "2");
-  dir.write("app3.log", "3");
-  vars->maxFiles = 3;
-  qlxFileHandlerDoRollover(vars.get());
-  EXPECT_EQ(contents(), "-013-");  // the fourth is not one of three
-}
-
-TEST_F(Generations, MoveUpAlsoWhenSomeAreMissing) {
-  dir.write("app.log", "0");
-  dir.write("app2.log", "2");
-  vars->maxFiles = 4;
-  qlxFileHandlerDoRollover(vars.get());
-  EXPECT_EQ(contents(), "-0-2-");
-}
-
-TEST_F(Generations, LoseTheOldestAlsoWhenNoneTakesItsPlace) {
-  dir.write("app.log", "0");
-  dir.write("app2.log", "2");
-  vars->maxFiles = 3;
-  qlxFileHandlerDoRollover(vars.get());
-  EXPECT_EQ(contents(), "-0---");
-}
-
-TEST_F(Generations, MoveOnlyFromTheLowestThatIsAskedFor) {
-  dir.write("app.log", "0");
-  dir.write("app1.log", "1");
-  vars->maxFiles = 3;
-  qlxFHShiftGenerations(vars.get(), 1, nullptr);
-  EXPECT_EQ(contents(), "0-1--");
-}
-
-TEST_F(Generations, StayWhenThereIsOnlyOne) {
-  dir.write("app.log", "0");
-  dir.write("app1.log", "1");
-  for (int32_t count : {1, 0, -1, INT32_MIN}) {
-    vars->maxFiles = count;
-    qlxFileHandlerDoRollover(vars.get());
-    EXPECT_EQ(contents(), "01---");
-  }
-}
-
-TEST_F(Generations, AreNotOverwrittenByOneThatStaysBehindWhenMemoryRunsOut) {
-  vars->maxFiles = 4;
-  for (uint64_t nth = 1; nth <= 4; ++nth) {
-    for (const char *name : {"app.log", "app1.log", "app2.log", "app3.log"}) {
-      dir.write(name, name[3] == '.' ? "0" : std::string(1, name[3]));
-    }
-    FailingMemory memory;
-    memory.failOnce(nth);
-    qlxFileHandlerDoRollover(vars.get());
-    EXPECT_EQ(memory.failures(), 1u);
-    std::string left = contents();
-    for (const char content : {'0', '1', '2'}) {
-      EXPECT_NE(left.find(content), std::string::npos) << nth << " left " << left;
-    }
-  }
 }
 
 }  // namespace

@@ -194,13 +194,23 @@ TEST_F(MultiProcFileHandlerTest, KeepsTheOpenFileAtTheNextOpening) {
 
 TEST_F(MultiProcFileHandlerTest, HasNothingToOpenWithoutAName) {
   forward();
-  set("fileName", std::string(300, 'x'));
+  changeAbsent("fileName");
   EXPECT_EQ(vars()->fullName, nullptr);
   open();
   EXPECT_EQ(logged(u"one"), kSuccess);
   EXPECT_EQ(vars()->opened, 0);
   EXPECT_EQ(key.set(), -1);
   EXPECT_RECORDED(u"");
+}
+
+TEST_F(MultiProcFileHandlerTest, TellsOfANameThatIsTooLong) {
+  forward();
+  set("fileName", std::string(300, 'x'));
+  EXPECT_EQ(logged(u"one"), failure(ENAMETOOLONG));
+  EXPECT_EQ(key.set(), -1);
+  EXPECT_RECORDED(u"");
+  const ApiLock lock;
+  EXPECT_EQ(QlxMultiProcFileHandlerFOpenWithErr(handler.get()), failure(ENAMETOOLONG));
 }
 
 TEST_F(MultiProcFileHandlerTest, DropsTheEventForItsListenersTooWhenTheFileCannotBeOpened) {

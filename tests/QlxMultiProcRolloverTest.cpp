@@ -1,5 +1,8 @@
 // The rollover of a file that several processes share, and what fails in it.
 #include "support/MultiProcFileHandlerTest.h"
+#include "support/TestClock.h"
+
+#include <sys/syscall.h>
 
 namespace {
 
@@ -202,14 +205,26 @@ TEST_F(MultiProcFileHandlerTest, PrintsNothingElse) {
   EXPECT_EQ(output.bytes(), "");
 }
 
-TEST_F(MultiProcFileHandlerTest, WritesOverAGenerationOneThatCouldNotBeMovedWithoutTruncatingIt) {
+TEST_F(MultiProcFileHandlerTest, ReplacesAGenerationOneThatCouldNotBeMoved) {
   rollAlways("3");
   log(u"new");
   dir.write("app1.log", "longer\n");
   obstruct("app2.log");
   EXPECT_EQ(logged(u"last"), failure(EISDIR));
-  EXPECT_EQ(dir.read("app1.log"), "new\ner\n");
+  EXPECT_EQ(dir.read("app1.log"), "new\n");
   EXPECT_EQ(dir.read("app.log"), "last\n");
+}
+
+TEST_F(MultiProcFileHandlerTest, DoesNotFollowALinkThatWasPlantedAsGenerationOne) {
+  dir.write("precious", "untouched\n");
+  rollAlways("3");
+  log(u"new");
+  obstruct("app2.log");  // the link stays where it is, too
+  std::filesystem::create_symlink(dir.path("precious"), dir.path("app1.log"));
+  log(u"last");
+  EXPECT_EQ(dir.read("precious"), "untouched\n");
+  EXPECT_FALSE(std::filesystem::is_symlink(dir.path("app1.log")));
+  EXPECT_EQ(dir.read("app1.log"), "new\n");
 }
 
 TEST_F(MultiProcFileHandlerTest, EmptiesTheFileAlsoWhenItCannotBeRead) {
@@ -221,17 +236,12 @@ TEST_F(MultiProcFileHandlerTest, EmptiesTheFileAlsoWhenItCannotBeRead) {
 }
 
 TEST_F(MultiProcFileHandlerTest, DoesNotOpenGenerationOneWhenTheFileHasNoBeginning) {
-  set("maxFileBytes", "0");
-  open();
-  int ends[2];
-  ASSERT_EQ(pipe(ends), 0);
-  replaceDescriptor(ends[1]);
+  rollAlways("2");
+  log(u"lost");
+  calls.onSeek = [](int, int origin) { return origin == SEEK_SET ? ESPIPE : 0; };
   EXPECT_EQ(logged(u"two"), failure(ESPIPE));
-  EXPECT_EQ(generations(), " - - -");
-  char bytes[8] = {};
-  EXPECT_EQ(read(ends[0], bytes, sizeof bytes), 4);
-  EXPECT_STREQ(bytes, "two\n");
-  ::close(ends[0]);
+  calls.onSeek = nullptr;
+  EXPECT_FALSE(dir.has("app1.log"));
 }
 
 TEST_F(MultiProcFileHandlerTest, EmptiesTheFileAlsoWhenTheCopyCannotBeWritten) {
@@ -242,15 +252,6 @@ TEST_F(MultiProcFileHandlerTest, EmptiesTheFileAlsoWhenTheCopyCannotBeWritten) {
   EXPECT_EQ(dir.read("app1.log"), "12345");
   EXPECT_EQ(dir.read("app.log"), "two\n");
   EXPECT_TRUE(semaphoreIsFree());
-}
-
-TEST_F(MultiProcFileHandlerTest, TellsOfACopyThatMayNotHaveReachedTheDisk) {
-  rollAlways("3");
-  log(u"one");
-  obstruct("app2.log");  // generation 1 stays in its place
-  std::filesystem::create_symlink("/dev/null", dir.path("app1.log"));
-  EXPECT_EQ(logged(u"two"), failure(EINVAL));  // what the null device answers a flush
-  EXPECT_EQ(dir.read("app.log"), "two\n");
 }
 
 TEST_F(MultiProcFileHandlerTest, ClosesTheCopy) {
@@ -266,29 +267,45 @@ TEST_F(MultiProcFileHandlerTest, ClosesTheCopy) {
   EXPECT_EQ(descriptors(), before);
 }
 
+constexpr int64_t kSecond = 1000000000;
+
 TEST_F(MultiProcFileHandlerTest, TellsOfAFileThatCannotBeEmptiedAndWritesOn) {
-  rollAlways("2");
-  open();
-  const int sealed = memfd_create("sealed", MFD_ALLOW_SEALING);
-  ASSERT_EQ(fcntl(sealed, F_SETFL, O_APPEND), 0);
-  ASSERT_EQ(fcntl(sealed, F_ADD_SEALS, F_SEAL_SHRINK), 0);
-  replaceDescriptor(sealed);
+  const TestClock clock;
+  set("maxFileBytes", "4");
+  set("maxFiles", "4");
+  dir.write("app2.log", "older\n");
   log(u"one");
-  EXPECT_EQ(logged(u"two"), failure(EPERM));
-  EXPECT_EQ(dir.read("app1.log"), "one\n");
-  char bytes[16] = {};
-  EXPECT_EQ(pread(vars()->file, bytes, sizeof bytes, 0), 8);
-  EXPECT_STREQ(bytes, "one\ntwo\n");
+  calls.onTruncate = [](int) { return EPERM; };
+  for (int i = 0; i < 3; ++i, TestClock::tick += kSecond) {
+    EXPECT_EQ(logged(u"two"), failure(EPERM));
+    EXPECT_EQ(logged(u"at once"), kSuccess);  // the next try is a second later
+  }
+  EXPECT_FALSE(dir.has("app1.log"));  // the same records twice
+  EXPECT_EQ(dir.read("app3.log"), "older\n");
   EXPECT_TRUE(semaphoreIsFree());
+  calls.onTruncate = nullptr;
+  EXPECT_EQ(logged(u"new"), kSuccess);
+  EXPECT_EQ(generations(), "new| one|two|at once|two|at once|two|at once| - older|");
 }
 
-TEST_F(MultiProcFileHandlerTest, TellsOfAFileThatCannotBeMeasuredAndWritesNowhere) {
-  forward();
+TEST_F(MultiProcFileHandlerTest, KeepsTheCopyOfAFileThatWasEmptiedWithoutAnAnswer) {
+  rollAlways("3");
   log(u"one");
-  ::close(vars()->file);
-  EXPECT_EQ(logged(u"two"), failure(EBADF));
-  EXPECT_RECORDED(u"one|two|");
-  EXPECT_TRUE(semaphoreIsFree());
+  calls.onTruncate = [](int file) {
+    EXPECT_EQ(syscall(SYS_ftruncate, file, 0), 0);
+    return EIO;
+  };
+  EXPECT_EQ(logged(u"two"), failure(EIO));
+  EXPECT_EQ(generations(), "two| one| - -");
+}
+
+TEST_F(MultiProcFileHandlerTest, TriesInterruptedCallsAgain) {
+  rollAlways("2");
+  log(u"one");
+  int interruptions = 3;
+  calls.onTruncate = [&](int) { return interruptions-- > 0 ? EINTR : 0; };
+  EXPECT_EQ(logged(u"two"), kSuccess);
+  EXPECT_EQ(generations(), "two| one| - -");
 }
 
 TEST_F(MultiProcFileHandlerTest, DoesNotMindGenerationsThatAreMissing) {
@@ -314,6 +331,81 @@ TEST_F(MultiProcFileHandlerTest, RollsStepByStepForItsCallers) {
   qlxMultiProcFileHandlerRollActiveLog(nullptr);
 }
 
+// ---- No descriptors left
+
+TEST_F(MultiProcFileHandlerTest, CopiesWithTheNumberThatItHasInReserve) {
+  rollAlways("5");
+  log(u"1");
+  std::vector<int> taken;
+  for (int number; (number = ::open("/dev/null", O_RDONLY | O_CLOEXEC)) != -1;) {
+    taken.push_back(number);
+  }
+  ASSERT_EQ(errno, EMFILE);
+  for (const char16_t *text : {u"2", u"3", u"4"}) EXPECT_EQ(logged(text), kSuccess);
+  for (const int number : taken) ::close(number);
+  EXPECT_EQ(generations(), "4| 3| 2| 1|");
+}
+
+// ---- keepFullFile: what could not be copied is not emptied
+
+class KeepFullFileTest : public MultiProcFileHandlerTest {
+ protected:
+  void SetUp() override {
+    MultiProcFileHandlerTest::SetUp();
+    set("keepFullFile", "true");
+    EXPECT_EQ(vars()->keepFullFile, 1);
+  }
+
+  const TestClock clock;
+};
+
+TEST_F(KeepFullFileTest, RollsAsEverWhenNothingFails) {
+  rollAlways("3");
+  for (const char16_t *text : {u"1", u"2", u"3", u"4"}) EXPECT_EQ(logged(text), kSuccess);
+  EXPECT_EQ(generations(), "4| 3| 2| -");
+}
+
+TEST_F(KeepFullFileTest, KeepsTheFileWhenGenerationOneCannotBeMade) {
+  rollAlways("2");
+  log(u"1");
+  obstruct("app1.log");
+  const uint64_t lost = problems().recordsLost;
+  EXPECT_EQ(logged(u"2"), failure(ENOTEMPTY));
+  EXPECT_EQ(logged(u"3"), kSuccess);  // told once a second
+  EXPECT_EQ(dir.read("app.log"), "1\n2\n3\n");
+  EXPECT_EQ(problems().recordsLost, lost);
+  std::filesystem::remove_all(dir.path("app1.log"));
+  TestClock::tick += kSecond;
+  EXPECT_EQ(logged(u"4"), kSuccess);
+  EXPECT_EQ(generations(), "4| 1|2|3| - -");
+}
+
+TEST_F(KeepFullFileTest, KeepsTheFileAndTheOlderGenerationsWhenTheCopyCannotBeWritten) {
+  set("maxFileBytes", "8");
+  set("maxFiles", "4");
+  dir.write("app1.log", "older\n");
+  dir.write("app3.log", "oldest\n");
+  log(u"12345678");
+  {
+    const FileSizeLimit limit{5};
+    for (int i = 0; i < 3; ++i) {
+      EXPECT_EQ(logged(u"lost"), failure(EFBIG));
+      TestClock::tick += kSecond;
+    }
+  }
+  EXPECT_EQ(generations(), "12345678| - older| oldest|");
+  EXPECT_EQ(logged(u"two"), kSuccess);
+  EXPECT_EQ(generations(), "two| 12345678| older| oldest|");
+}
+
+TEST_F(KeepFullFileTest, IsOffWithoutAValue) {
+  set("keepFullFile", "true");
+  changeAbsent("keepFullFile");
+  EXPECT_EQ(vars()->keepFullFile, 0);
+  set("keepFullFile", "maybe");
+  EXPECT_EQ(vars()->keepFullFile, 0);
+}
+
 // ---- A full disk, and no memory
 
 TEST_F(MultiProcFileHandlerTest, TellsOfARecordThatCannotBeWrittenAndForwardsIt) {
@@ -321,7 +413,7 @@ TEST_F(MultiProcFileHandlerTest, TellsOfARecordThatCannotBeWrittenAndForwardsIt)
   log(u"12345");
   const FileSizeLimit limit{8};
   EXPECT_EQ(logged(u"67890"), failure(EFBIG));
-  EXPECT_EQ(dir.read("app.log"), "12345\n67");
+  EXPECT_EQ(dir.read("app.log"), "12345\n");  // the piece that was written is cut off again
   EXPECT_RECORDED(u"12345|67890|");
   EXPECT_TRUE(semaphoreIsFree());
 }
@@ -347,11 +439,18 @@ TEST_F(MultiProcFileHandlerTest, EmptiesTheFileAlsoWhenTheDiskIsTooFullForTheCop
     size_t whole = 0;
     while (logged(line.c_str()) == kSuccess) ++whole;
     EXPECT_EQ(whole, kDiskBytes / 1000);
-    EXPECT_EQ(logged(u"1234567"), failure(ENOSPC));
-    EXPECT_EQ(dir.read("disk/app.log").size(), kDiskBytes);
+    EXPECT_EQ(logged(u"1234567"), kSuccess);
+    EXPECT_EQ(logged(line.c_str()), failure(ENOSPC));
+    EXPECT_EQ(dir.read("disk/app.log").size(), whole * 1000 + 8);
     EXPECT_TRUE(semaphoreIsFree());
 
     rollAlways("2");
+    set("keepFullFile", "true");  // not even begun
+    EXPECT_EQ(logged(u"kept"), failure(ENOSPC));
+    EXPECT_FALSE(dir.has("disk/app1.log"));
+    EXPECT_EQ(dir.read("disk/app.log").size(), whole * 1000 + 8 + 5);
+    set("keepFullFile", "false");
+    vars()->stuck = 0;
     EXPECT_EQ(logged(u"next"), failure(ENOSPC));
     EXPECT_EQ(dir.read("disk/app1.log"), "");
     EXPECT_EQ(dir.read("disk/app.log"), "next\n");
@@ -381,18 +480,15 @@ TEST_F(MultiProcFileHandlerTest, SurvivesEveryFailedAllocationOfAnEvent) {
   }
 }
 
-TEST_F(MultiProcFileHandlerTest, TellsOfARolloverWithoutMemoryForAName) {
+TEST_F(MultiProcFileHandlerTest, RollsWithoutMemoryForNames) {
   rollAlways("3");
-  const CaptureStdout silence;
-  int told = 0;
-  for (uint64_t nth = 1, failures = 1; failures > 0; ++nth) {
-    for (const UChar *text : {u"1", u"2", u"3"}) log(text);  // what one without memory left empty
-    FailingMemory memory;
-    memory.failOnce(nth);
-    told += logged(u"more") == failure(ENOMEM);
-    failures = memory.failures();
-  }
-  EXPECT_GE(told, 2);  // the names of two generations
+  log(u"one");
+  qlxMultiProcFileHandlerDoRollover(vars());
+  log(u"two");
+  FailingMemory memory;
+  memory.failFrom(1);
+  qlxMultiProcFileHandlerDoRollover(vars());
+  EXPECT_EQ(generations(), " two| one| -");
 }
 
 }  // namespace

@@ -60,8 +60,7 @@ CxStatus CxFileWrite(CxFile *file, const void *buffer, uint32_t length, int32_t 
 CxStatus cxIntlFileWriteAll(CxFile *file, const char *bytes, uint32_t length, uint64_t *written) {
   while (length > 0) {
     int32_t count = 0;
-    const CxStatus status = CxFileWrite(file, bytes, length, &count);
-    if (status.kind != '-' && status.code == EINTR) continue;
+    const CxStatus status = cxUntilDone([&] { return CxFileWrite(file, bytes, length, &count); });
     if (status.kind != '-') return status;
     if (count == 0) return cxFailure(EIO);
     bytes += count;

@@ -22,4 +22,14 @@ inline CxStatus cxStatusOfCall(bool succeeded) {
   return succeeded ? kCxSuccess : cxFailure(errno);
 }
 
+// Makes a call that answers a status again while a signal interrupts it. One that is interrupted
+// all the time fails at last, since its caller may hold locks.
+template <typename Call>
+CxStatus cxUntilDone(Call call) {
+  constexpr int kMaxCalls = 1000;
+  CxStatus status = call();
+  for (int calls = 1; status.code == EINTR && calls < kMaxCalls; ++calls) status = call();
+  return status;
+}
+
 #endif

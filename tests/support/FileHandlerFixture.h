@@ -5,6 +5,8 @@
 
 #include <string>
 
+#include <qlx/class/handler.h>
+
 #include "QlxFileHandler.h"
 #include "support/ChainTest.h"
 #include "support/Status.h"
@@ -32,6 +34,13 @@ class FileHandlerFixture : public ChainTest {
     EXPECT_EQ(QlxSetObjProp(handler.get(), key, value.c_str()), 1);
   }
 
+  // Tells the handler of a key that has no value.
+  void changeAbsent(const char *key) {
+    const ApiLock lock;
+    if (handler->props) qlxIntlStringToStringMapRem(handler->props, key);
+    QlxFileHandlerFCfgChange(handler.get(), key);
+  }
+
   // Has another handler record what this one passes on.
   void forward() {
     const Handle next = get("recording", RecordingHandler::kClass);
@@ -42,6 +51,13 @@ class FileHandlerFixture : public ChainTest {
   CxStatus logged(const char16_t *text) {
     const QlxLogResult result = log(text);
     return {result.statusKind, result.statusCode};
+  }
+
+  // What could not be done so far.
+  static QlxHandlerProblems problems() {
+    QlxHandlerProblems problems;
+    qlxIntlGetHandlerProblems(&problems);
+    return problems;
   }
 
   // The generations of "app.log", "-" for a missing one, joined with blanks; line feeds show as

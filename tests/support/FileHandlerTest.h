@@ -8,13 +8,6 @@ class FileHandlerTest : public FileHandlerFixture {
  protected:
   FileHandlerTest() : FileHandlerFixture("qlx_filehandler") {}
 
-  // Tells the handler of a key that has no value.
-  void changeAbsent(const char *key) {
-    const ApiLock lock;
-    if (handler->props) qlxIntlStringToStringMapRem(handler->props, key);
-    QlxFileHandlerFCfgChange(handler.get(), key);
-  }
-
   void close() {
     const ApiLock lock;
     QlxFileHandlerFClose(handler.get());

@@ -47,3 +47,13 @@ extern "C" int semctl(int id, int number, int command, ...) noexcept {
   va_end(rest);
   return static_cast<int>(syscall(SYS_semctl, id, number, command, argument));
 }
+
+extern "C" int ftruncate(int file, off_t length) noexcept {
+  if (fails(&SystemCalls::onTruncate, file)) return -1;
+  return static_cast<int>(syscall(SYS_ftruncate, file, length));
+}
+
+extern "C" off_t lseek(int file, off_t offset, int origin) noexcept {
+  if (fails(&SystemCalls::onSeek, file, origin)) return -1;
+  return syscall(SYS_lseek, file, offset, origin);
+}

@@ -1,5 +1,6 @@
-// In place of the C library's sleep, semget, semop and semctl, for the whole program of the tests:
-// nothing in it waits by the clock, and a test may answer instead of the semaphores.
+// In place of the C library's sleep, semget, semop, semctl, ftruncate and lseek, for the whole
+// program of the tests: nothing in it waits by the clock, and a test may answer instead of the
+// system.
 #ifndef QLX_TESTS_SYSTEMCALLS_H
 #define QLX_TESTS_SYSTEMCALLS_H
 
@@ -20,6 +21,8 @@ class SystemCalls {
   std::function<int(key_t key, int flags)> onGet;
   std::function<int(const sembuf &first, size_t count)> onOperate;
   std::function<int(int command)> onControl;
+  std::function<int(int file)> onTruncate;
+  std::function<int(int file, int origin)> onSeek;
   std::vector<unsigned> slept;  // the seconds of each sleep
 };
 

@@ -42,20 +42,22 @@ QLX_API void QlxConsoleHandlerFClose(QlxObject *handler);
  */
 /** @return variables with the initial settings; null when memory ran out */
 QLX_API void *QlxFileHandlerFAllocVars(void);
-/** Closes an open file, without the trailer, and frees the variables. */
+/** Closes an open file, without the trailer, and frees the variables. Null is ignored. */
 QLX_API void QlxFileHandlerFFreeVars(void *vars);
 /** The file handler's keys, and every handler's. All but "logInternalErrs", and a permission
  *  without a value, close the file first; the next event opens it under the new setting. */
 QLX_API void QlxFileHandlerFCfgChange(QlxObject *handler, const char *key);
-/** Opens as QlxFileHandlerFOpenWithErr() does, writes, and passes the event on in any case. */
+/** Opens as QlxFileHandlerFOpenWithErr() does, writes, and passes the event on, whether or not it
+ *  could be written. A disabled handler does nothing. */
 QLX_API void QlxFileUHandlerFProcess(QlxObject *handler, Event *event, va_list *args);
 /** QlxFileHandlerFOpenWithErr() without its answer. */
 QLX_API void QlxFileHandlerFOpen(QlxObject *handler);
 /**
  * Opens the active file, or keeps it open when it is still there and not full; rolls over a full
- * one.
+ * one. A full one that cannot be moved stays open.
  *
- * @return success also when there is nothing to open: no variables, or no file name
+ * @return success also when there is nothing to open: no variables, or no file name; 36 when the
+ * name of a generation would have more than 256 bytes
  */
 QLX_API CxStatus QlxFileHandlerFOpenWithErr(QlxObject *handler);
 /** Writes the trailer and closes; a closed file stays as it is. */
@@ -81,6 +83,18 @@ QLX_API void QlxMultiProcFileHandlerFOpen(QlxObject *handler);
 QLX_API CxStatus QlxMultiProcFileHandlerFOpenWithErr(QlxObject *handler);
 /** Closes the file without a trailer. Only a configuration change writes one. */
 QLX_API void QlxMultiProcFileHandlerFClose(QlxObject *handler);
+
+/** What the file handlers of this process could not do so far. */
+typedef struct QlxHandlerProblems {
+  uint64_t recordsLost;     /* each is also the status of its event */
+  uint64_t rolloversFailed; /* steps of rollovers; the record was written all the same, or is
+                               counted above too */
+  CxStatus rollover;        /* of the last of these */
+  char rolloverFile[257];   /* whose rollover it was */
+} QlxHandlerProblems;
+
+/** Copies the counts. The statuses of log calls do not tell the two apart. Null is ignored. */
+QLX_API void qlxIntlGetHandlerProblems(QlxHandlerProblems *problems);
 
 QLX_END_DECLS
 

@@ -1,0 +1,159 @@
+#include "QlxRolling.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <charconv>
+#include <cstring>
+#include <functional>
+#include <string_view>
+
+#include <dirent.h>
+#include <sys/stat.h>
+
+#include <qlx/files.h>
+#include <qlx/memory.h>
+
+#include "QlxFileNames.h"
+#include "util/CxOwned.h"
+#include "util/CxStatus.h"
+
+// Up to so many generations each is tried; for more of them the directory says which are there.
+static constexpr int32_t kMostTried = 100;
+
+static bool succeedsUnlessMissing(QlxFileHandlerVars *vars, Event *event, CxStatus status) {
+  if (!qlxFailed(status) || status.code == ENOENT) return true;
+  qlxKeepRollover(event, status, vars->fullName);
+  return false;
+}
+
+static bool removeGeneration(QlxFileHandlerVars *vars, int32_t generation, Event *event) {
+  QlxFileName name;
+  qlxFHWriteName(vars, generation, name);
+  const CxStatus status = cxUntilDone([&] { return CxFileNameRemove(name); });
+  return succeedsUnlessMissing(vars, event, status);
+}
+
+static bool moveUp(QlxFileHandlerVars *vars, int32_t generation, Event *event) {
+  QlxFileName from, to;
+  qlxFHWriteName(vars, generation, from);
+  qlxFHWriteName(vars, generation + 1, to);
+  const CxStatus status = cxUntilDone([&] { return CxFileNameRename(from, to); });
+  return succeedsUnlessMissing(vars, event, status);
+}
+
+static bool exists(const QlxFileHandlerVars *vars, int32_t generation) {
+  QlxFileName name;
+  qlxFHWriteName(vars, generation, name);
+  struct stat info;
+  return lstat(name, &info) == 0 || errno != ENOENT;
+}
+
+// ---- The generations that are there
+
+namespace {
+
+// Numbers from 1 to below maxFiles, of files that are there, in no order.
+class Numbers {
+ public:
+  ~Numbers() { OslMemoryFree(numbers_); }
+  bool add(int32_t number) {
+    if (count_ == room_ && !grow()) return false;
+    numbers_[count_++] = number;
+    return true;
+  }
+  int32_t *begin() { return numbers_; }
+  int32_t *end() { return numbers_ + count_; }
+
+ private:
+  bool grow() {
+    const uint32_t room = room_ == 0 ? 64 : 2 * room_;
+    const uint64_t bytes = uint64_t{room} * sizeof(int32_t);
+    void *larger =
+        bytes > UINT32_MAX ? nullptr : OslMemoryRealloc(numbers_, static_cast<uint32_t>(bytes));
+    if (!larger) return false;
+    numbers_ = static_cast<int32_t *>(larger);
+    room_ = room;
+    return true;
+  }
+
+  int32_t *numbers_ = nullptr;
+  uint32_t count_ = 0, room_ = 0;
+};
+
+using Directory = Owned<DIR, closedir>;
+
+}  // namespace
+
+// The number of a generation by the name of its file; 0 for a file that is none.
+static int32_t numberOf(std::string_view name, std::string_view base, const char *extension) {
+  if (!name.starts_with(base)) return 0;
+  name.remove_prefix(base.size());
+  int32_t number = 0;
+  const char *const end = name.data() + name.size();
+  const auto [rest, error] = std::from_chars(name.data(), end, number);
+  if (error != std::errc() || number < 1 || name.front() == '0') return 0;
+  const std::string_view after{rest, static_cast<size_t>(end - rest)};
+  const bool isOurs =
+      extension ? after.starts_with('.') && after.substr(1) == extension : after.empty();
+  return isOurs ? number : 0;
+}
+
+// False when the directory cannot be read, or memory ran out.
+static bool listGenerations(const QlxFileHandlerVars *vars, Numbers *numbers) {
+  if (OslStringChr(vars->extPart, '/')) return false;  // each is in a directory of its own
+  const Directory directory{opendir(vars->dirPart ? vars->dirPart : ".")};
+  if (!directory) return false;
+  const std::string_view base{vars->basePart + (vars->basePart[0] == '/')};
+  for (;;) {
+    errno = 0;
+    const dirent *entry = readdir(directory.get());
+    if (!entry) return errno == 0;
+    const int32_t number = numberOf(entry->d_name, base, vars->extPart);
+    if (number > 0 && number < vars->maxFiles && !numbers->add(number)) return false;
+  }
+}
+
+// ---- Moving
+
+static bool shiftTried(QlxFileHandlerVars *vars, Event *event) {
+  for (int32_t i = vars->maxFiles - 2; i >= 1; --i) {
+    if (!moveUp(vars, i, event)) return false;
+  }
+  return true;
+}
+
+static bool shiftListed(QlxFileHandlerVars *vars, Numbers &numbers, Event *event) {
+  std::sort(numbers.begin(), numbers.end(), std::greater<>());
+  for (const int32_t number : numbers) {
+    if (number < vars->maxFiles - 1 && !moveUp(vars, number, event)) return false;
+  }
+  return true;
+}
+
+bool qlxShiftGenerations(QlxFileHandlerVars *vars, Event *event) {
+  if (vars->maxFiles < 2) return false;
+  Numbers numbers;
+  const bool fewEnough = vars->maxFiles <= kMostTried;
+  if (!fewEnough && !listGenerations(vars, &numbers)) return qlxFreeFirstGeneration(vars, event);
+  removeGeneration(vars, vars->maxFiles - 1, event);  // what stays is replaced
+  return fewEnough ? shiftTried(vars, event) : shiftListed(vars, numbers, event);
+}
+
+bool qlxFreeFirstGeneration(QlxFileHandlerVars *vars, Event *event) {
+  if (vars->maxFiles < 2) return false;
+  const int32_t last = vars->maxFiles - 1;
+  int32_t gap = 1;
+  while (gap < last && exists(vars, gap)) ++gap;
+  if (gap == last && !removeGeneration(vars, last, event)) return false;
+  for (int32_t i = gap - 1; i >= 1; --i) {
+    if (!moveUp(vars, i, event)) return false;
+  }
+  return true;
+}
+
+bool qlxMoveActiveFile(QlxFileHandlerVars *vars) {
+  if (vars->maxFiles < 2) return false;
+  const auto makeRoom = vars->stuck ? qlxFreeFirstGeneration : qlxShiftGenerations;
+  vars->stuck = !makeRoom(vars, nullptr) || !moveUp(vars, 0, nullptr);
+  return !vars->stuck;
+}

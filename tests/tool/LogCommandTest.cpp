@@ -11,6 +11,7 @@
 #include <pty.h>
 #include <unistd.h>
 
+#include "support/SemaphoreKey.h"
 #include "support/TempDir.h"
 #include "tool/Process.h"
 
@@ -272,6 +273,30 @@ TEST_F(LogCommandTest, TellsTheSystemsErrorOnceWhenRecordsCannotBeWritten) {
   const Outcome outcome = log("one\ntwo\nthree\n");
   EXPECT_EQ(outcome.status, 1);
   EXPECT_EQ(outcome.err, "qlx: a record failed: Is a directory\n");
+}
+
+TEST_F(LogCommandTest, TellsOnceOfRolloversThatFailedAndSucceedsWhenTheRecordsAreWritten) {
+  ASSERT_EQ(system(("mkdir -p " + dir.path("app1.log/occupied")).c_str()), 0);
+  const std::string old = dir.read("app.properties") + "app.file.maxFileBytes=1\n";
+  dir.write("app.properties", old + "app.file.maxFiles=2\n");
+  const Outcome outcome = log("one\ntwo\nthree\n");
+  EXPECT_EQ(outcome.status, 0);
+  EXPECT_EQ(outcome.err, "qlx: " + std::filesystem::canonical(dir.path()).string() +
+                             "/app.log: written, but not rolled over: Is a directory\n");
+  EXPECT_EQ(dir.read("app.log"), ">one\n>two\n>three\n");
+}
+
+TEST_F(LogCommandTest, TellsOfASharedFileThatCouldNotBeCopiedAndSucceedsWhenTheRecordsAreWritten) {
+  const SemaphoreKey key;
+  ASSERT_EQ(system(("mkdir -p " + dir.path("app1.log/occupied")).c_str()), 0);
+  const std::string old = dir.read("app.properties") + "app.file.maxFileBytes=1\n";
+  dir.write("app.properties", old + "app.file.className=qlx_multiproc_filehandler\n" +
+                                  "app.file.maxFiles=2\napp.file.keepFullFile=true\n" +
+                                  "app.file.MPFileSemKey=" + key.text() + "\n");
+  const Outcome outcome = log("one\ntwo\n");
+  EXPECT_EQ(outcome.status, 0);
+  EXPECT_NE(outcome.err.find("written, but not rolled over"), std::string::npos) << outcome.err;
+  EXPECT_EQ(dir.read("app.log"), ">one\n>two\n");
 }
 
 TEST_F(LogCommandTest, FailsWhenStandardOutputCannotBeWritten) {

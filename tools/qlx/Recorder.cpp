@@ -8,6 +8,7 @@
 
 #include <unicode/utypes.h>
 
+#include <qlx/class/handler.h>
 #include <qlx/class/logger.h>
 #include <qlx/class/toolkit.h>
 #include <qlx/logger.h>
@@ -85,15 +86,40 @@ void Recorder::logMessage(const char *bundle, const char *key,
   judge(logWith(message, arguments.data(), arguments.size()));
 }
 
-// The console handler reports nothing, but it writes to this process's standard output.
+static QlxHandlerProblems problemsSoFar() {
+  QlxHandlerProblems problems = {};
+  if (qlxAPIMutexLock() != 1) return problems;
+  qlxIntlGetHandlerProblems(&problems);
+  qlxAPIMutexUnlock();
+  return problems;
+}
+
+// A status alone does not say whether the record was lost: a failed rollover has one, too.
 void Recorder::judge(const QlxLogResult &result) {
+  const QlxHandlerProblems now = problemsSoFar();
+  const bool rolled = now.rolloversFailed == before_.rolloversFailed;
+  const bool lost = now.recordsLost != before_.recordsLost || (result.statusKind != '-' && rolled);
+  before_ = now;
+  if (!rolled && !lost) tellRollover(now);
+  judge(result, lost);
+}
+
+// The console handler reports nothing, but it writes to this process's standard output.
+void Recorder::judge(const QlxLogResult &result, bool lost) {
   if (hasFailed_) return;
   if (ferror(stdout))
     fail("standard output cannot be written");
-  else if (result.statusKind != '-')
+  else if (lost)
     fail(platformErrorText({result.statusKind, result.statusCode}));
   else if (result.msgStatus > 0)
     fail(u_errorName(static_cast<UErrorCode>(result.msgStatus)));
+}
+
+void Recorder::tellRollover(const QlxHandlerProblems &problems) {
+  if (hasToldRollover_) return;
+  hasToldRollover_ = true;
+  fprintf(stderr, "qlx: %s: written, but not rolled over: %s\n", problems.rolloverFile,
+          platformErrorText(problems.rollover).c_str());
 }
 
 void Recorder::fail(const std::string &why) {

@@ -1,11 +1,12 @@
 // Hands records to a logger and keeps in mind whether one failed; the first failure is told on
-// standard error, once.
+// standard error, once, and so is the first rollover that failed while its record was written.
 #ifndef QLX_TOOLS_RECORDER_H
 #define QLX_TOOLS_RECORDER_H
 
 #include <string>
 #include <vector>
 
+#include <qlx/class/handler.h>
 #include <qlx/types.h>
 
 #include "MessageArguments.h"
@@ -29,11 +30,15 @@ class Recorder {
 
  private:
   void judge(const QlxLogResult &result);
+  void judge(const QlxLogResult &result, bool lost);
+  void tellRollover(const QlxHandlerProblems &problems);
   void fail(const std::string &why);
 
   QlxObject *const logger_;
   const int32_t level_;
+  QlxHandlerProblems before_ = {};
   bool hasFailed_ = false;
+  bool hasToldRollover_ = false;
 };
 
 #endif

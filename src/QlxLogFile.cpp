@@ -172,6 +172,13 @@ CxStatus qlxLogFileClose(QlxFileHandlerVars *vars) {
 
 // ---- Writing
 
+static CxStatus endTornLine(QlxFileHandlerVars *vars) {
+  if (!vars->log.torn) return kCxSuccess;
+  const CxStatus status = cxIntlFileWriteAll(&vars->file, "\n", 1, &vars->size);
+  vars->log.torn = qlxFailed(status);
+  return status;
+}
+
 // What somebody appended behind the piece stays, and so does the piece then.
 static void cutOff(QlxFileHandlerVars *vars, uint64_t piece) {
   const off_t end = vars->log.rolls ? lseek(vars->file, 0, SEEK_CUR) : -1;
@@ -180,16 +187,9 @@ static void cutOff(QlxFileHandlerVars *vars, uint64_t piece) {
                       vars->size == static_cast<uint64_t>(end);
   const auto cut = [&] { return cxStatusOfCall(ftruncate(vars->file, start) == 0); };
   vars->log.torn = !isLast || qlxFailed(cxUntilDone(cut));
-  if (vars->log.torn) return;
+  if (vars->log.torn) return (void)endTornLine(vars);  // other processes do not know of the piece
   vars->size = static_cast<uint64_t>(start);
   lseek(vars->file, start, SEEK_SET);
-}
-
-static CxStatus endTornLine(QlxFileHandlerVars *vars) {
-  if (!vars->log.torn) return kCxSuccess;
-  const CxStatus status = cxIntlFileWriteAll(&vars->file, "\n", 1, &vars->size);
-  vars->log.torn = qlxFailed(status);
-  return status;
 }
 
 CxStatus qlxLogFileWrite(QlxFileHandlerVars *vars, const char *bytes, uint32_t length) {

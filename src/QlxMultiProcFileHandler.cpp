@@ -55,22 +55,27 @@ static CxStatus checkRoom(const QlxFileHandlerVars *vars) {
 }
 
 // Whatever stands there under the name, such as a link to another file, goes: nothing else than a
-// new file is written.
+// new file is written. With keepFullFile it was moved before, so what stands there is new and
+// stays.
+static CxStatus clearName(const QlxFileHandlerVars *vars, const char *name) {
+  if (vars->keepFullFile) return kCxSuccess;
+  return cxUntilDone([&] { return cxStatusOfCall(unlink(name) == 0 || errno == ENOENT); });
+}
+
 static CxStatus makeGeneration(QlxFileHandlerVars *vars, const char *name, CxFile *generation) {
   const auto open = [&] {
     return qlxOpenHigh(generation, name, O_CREAT | O_EXCL | O_NOFOLLOW | O_RDWR,
                        vars->filePermission);
   };
-  const CxStatus removed =
-      cxUntilDone([&] { return cxStatusOfCall(unlink(name) == 0 || errno == ENOENT); });
-  if (qlxFailed(removed)) return removed;
-  const CxStatus status = open();
+  CxStatus status = clearName(vars, name);
+  if (!qlxFailed(status)) status = open();
   const bool noNumbers = status.code == EMFILE || status.code == ENFILE;
   return noNumbers && qlxLogFileSpend(vars) ? open() : status;
 }
 
 static bool copyTo(CxFile *generation, QlxFileHandlerVars *vars, Event *event) {
   bool copied = keep(vars, event, copyBytes(&vars->file, generation));
+  if (!copied && vars->keepFullFile) CxFileTrunc(generation);  // should it not be removed
   copied &= keep(vars, event, cxUntilDone([&] { return CxFileFlush(generation); }));
   copied &= keep(vars, event, CxFileClose(generation));
   qlxLogFileReserve(vars);

@@ -3,11 +3,12 @@
 #include <algorithm>
 #include <cerrno>
 #include <charconv>
-#include <cstring>
+#include <cstdio>
 #include <functional>
 #include <string_view>
 
 #include <dirent.h>
+#include <fcntl.h>
 #include <sys/stat.h>
 
 #include <qlx/files.h>
@@ -33,12 +34,27 @@ static bool removeGeneration(QlxFileHandlerVars *vars, int32_t generation, Event
   return succeedsUnlessMissing(vars, event, status);
 }
 
-static bool moveUp(QlxFileHandlerVars *vars, int32_t generation, Event *event) {
+static CxStatus renameOver(const char *from, const char *to) {
+  return cxUntilDone([&] { return CxFileNameRename(from, to); });
+}
+
+// Into a gap: whoever has filled it meanwhile stays.
+static CxStatus renameIntoGap(const char *from, const char *to) {
+  const auto call = [&] {
+    return cxStatusOfCall(renameat2(AT_FDCWD, from, AT_FDCWD, to, RENAME_NOREPLACE) == 0);
+  };
+  const CxStatus status = cxUntilDone(call);
+  const bool isUnknown = status.code == EINVAL || status.code == ENOSYS;  // to the file system
+  return isUnknown ? renameOver(from, to) : status;
+}
+
+using Rename = CxStatus(const char *from, const char *to);
+
+static bool moveUp(QlxFileHandlerVars *vars, int32_t generation, Rename *move, Event *event) {
   QlxFileName from, to;
   qlxFHWriteName(vars, generation, from);
   qlxFHWriteName(vars, generation + 1, to);
-  const CxStatus status = cxUntilDone([&] { return CxFileNameRename(from, to); });
-  return succeedsUnlessMissing(vars, event, status);
+  return succeedsUnlessMissing(vars, event, move(from, to));
 }
 
 static bool exists(const QlxFileHandlerVars *vars, int32_t generation) {
@@ -117,7 +133,7 @@ static bool listGenerations(const QlxFileHandlerVars *vars, Numbers *numbers) {
 
 static bool shiftTried(QlxFileHandlerVars *vars, Event *event) {
   for (int32_t i = vars->maxFiles - 2; i >= 1; --i) {
-    if (!moveUp(vars, i, event)) return false;
+    if (!moveUp(vars, i, renameOver, event)) return false;
   }
   return true;
 }
@@ -125,7 +141,7 @@ static bool shiftTried(QlxFileHandlerVars *vars, Event *event) {
 static bool shiftListed(QlxFileHandlerVars *vars, Numbers &numbers, Event *event) {
   std::sort(numbers.begin(), numbers.end(), std::greater<>());
   for (const int32_t number : numbers) {
-    if (number < vars->maxFiles - 1 && !moveUp(vars, number, event)) return false;
+    if (number < vars->maxFiles - 1 && !moveUp(vars, number, renameOver, event)) return false;
   }
   return true;
 }
@@ -146,7 +162,7 @@ bool qlxFreeFirstGeneration(QlxFileHandlerVars *vars, Event *event) {
   while (gap < last && exists(vars, gap)) ++gap;
   if (gap == last && !removeGeneration(vars, last, event)) return false;
   for (int32_t i = gap - 1; i >= 1; --i) {
-    if (!moveUp(vars, i, event)) return false;
+    if (!moveUp(vars, i, renameIntoGap, event)) return false;
   }
   return true;
 }
@@ -154,6 +170,7 @@ bool qlxFreeFirstGeneration(QlxFileHandlerVars *vars, Event *event) {
 bool qlxMoveActiveFile(QlxFileHandlerVars *vars) {
   if (vars->maxFiles < 2) return false;
   const auto makeRoom = vars->stuck ? qlxFreeFirstGeneration : qlxShiftGenerations;
-  vars->stuck = !makeRoom(vars, nullptr) || !moveUp(vars, 0, nullptr);
+  const auto move = vars->stuck ? renameIntoGap : renameOver;
+  vars->stuck = !makeRoom(vars, nullptr) || !moveUp(vars, 0, move, nullptr);
   return !vars->stuck;
 }

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <fstream>
 #include <map>
 #include <memory>
 #include <random>
@@ -12,6 +13,7 @@
 
 #include "QlxFileNames.h"
 #include "support/FailingMemory.h"
+#include "support/SystemCalls.h"
 #include "support/TempDir.h"
 #include "support/WorkingDir.h"
 
@@ -19,6 +21,21 @@ namespace {
 
 struct FreeVars {
   void operator()(QlxFileHandlerVars *vars) const { QlxFileHandlerFFreeVars(vars); }
+};
+
+// A file that is made by somebody else right after the library looked whether it is there.
+class FileThatAppears {
+ public:
+  FileThatAppears(const std::string &name, const std::string &bytes) {
+    calls_.afterLook = [=, this](const char *path) {
+      const std::filesystem::path looked(path);
+      if (looked.lexically_normal() != name || std::filesystem::exists(looked)) return;
+      std::ofstream(name) << bytes;
+    };
+  }
+
+ private:
+  SystemCalls calls_;
 };
 
 class Generations : public ::testing::Test {
@@ -162,6 +179,16 @@ TEST_F(Generations, MoveTheActiveFileAloneOnceThatIsAllThatIsLeft) {
   vars->stuck = 1;
   EXPECT_TRUE(qlxMoveActiveFile(vars.get()));
   EXPECT_EQ(contents(), "-023-");
+}
+
+// What the look for a gap saw need not be true any more when the file is moved.
+TEST_F(Generations, NeverReplaceAFileThatTookTheGapMeanwhile) {
+  vars->maxFiles = 3;
+  vars->stuck = 1;
+  dir.write("app.log", "0");
+  FileThatAppears appears{dir.path("app1.log"), "1"};
+  EXPECT_FALSE(qlxMoveActiveFile(vars.get()));
+  EXPECT_EQ(contents(), "01---");
 }
 
 // ---- Many generations

@@ -190,7 +190,8 @@ void judgeFolder(const Variant &variant, const std::string &root, const std::str
   judgeAnswers(variant, board, &judge, verdict);
   verdict->note(verdict->lost, "records lost");
   verdict->note(verdict->doubled, "records twice");
-  if (!variant.cutWhen) verdict->note(verdict->torn, "torn pieces");
+  const bool mayTear = variant.cutWhen || variant.mayLoseCopies;  // a copy, too, may be a piece
+  if (!mayTear) verdict->note(verdict->torn, "torn pieces");
   verdict->note(verdict->disordered, "out of order");
   verdict->note(verdict->refused, "refused after the faults");
   judgeForeignFiles(variant, root, folder, verdict);

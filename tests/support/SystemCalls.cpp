@@ -4,6 +4,8 @@
 #include <cstdarg>
 #include <unistd.h>
 
+#include <fcntl.h>
+#include <sys/stat.h>
 #include <sys/syscall.h>
 
 static SystemCalls *current;
@@ -56,4 +58,12 @@ extern "C" int ftruncate(int file, off_t length) noexcept {
 extern "C" off_t lseek(int file, off_t offset, int origin) noexcept {
   if (fails(&SystemCalls::onSeek, file, origin)) return -1;
   return syscall(SYS_lseek, file, offset, origin);
+}
+
+extern "C" int lstat(const char *path, struct stat *info) noexcept {
+  const int result = fstatat(AT_FDCWD, path, info, AT_SYMLINK_NOFOLLOW);
+  const int error = errno;
+  if (current && current->afterLook) current->afterLook(path);
+  errno = error;
+  return result;
 }

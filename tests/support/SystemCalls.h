@@ -1,6 +1,6 @@
-// In place of the C library's sleep, semget, semop, semctl, ftruncate and lseek, for the whole
-// program of the tests: nothing in it waits by the clock, and a test may answer instead of the
-// system.
+// In place of the C library's sleep, semget, semop, semctl, ftruncate, lseek and lstat, for the
+// whole program of the tests: nothing in it waits by the clock, and a test may answer instead of
+// the system.
 #ifndef QLX_TESTS_SYSTEMCALLS_H
 #define QLX_TESTS_SYSTEMCALLS_H
 
@@ -23,7 +23,8 @@ class SystemCalls {
   std::function<int(int command)> onControl;
   std::function<int(int file)> onTruncate;
   std::function<int(int file, int origin)> onSeek;
-  std::vector<unsigned> slept;  // the seconds of each sleep
+  std::function<void(const char *path)> afterLook;  // by lstat
+  std::vector<unsigned> slept;                      // the seconds of each sleep
 };
 
 #endif

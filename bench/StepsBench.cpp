@@ -3,18 +3,14 @@
 // more care of descriptors then. Prints nanoseconds a record, minimum and median over many short
 // batches.
 #include <fcntl.h>
-#include <linux/aio_abi.h>
-#include <poll.h>
 #include <stdlib.h>
-#include <sys/epoll.h>
-#include <sys/inotify.h>
 #include <sys/stat.h>
-#include <sys/syscall.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <chrono>
 #include <cstdio>
+#include <ctime>
 #include <filesystem>
 #include <semaphore>
 #include <string>
@@ -40,20 +36,6 @@ void measure(const char *name, int file, Step step) {
   std::printf("%-50s %7.0f %7.0f\n", name, times.front(), times[times.size() / 2]);
 }
 
-// Where the ends of requests have their count: a change of it says that there are notices. Null:
-// the system has no such requests.
-const unsigned *startFlag(int poll) {
-  static iocb request;
-  aio_context_t context = 0;
-  request.aio_lio_opcode = IOCB_CMD_POLL;
-  request.aio_fildes = static_cast<unsigned>(poll);
-  request.aio_buf = POLLIN;
-  iocb *requests = &request;
-  if (syscall(SYS_io_setup, 1, &context) != 0) return nullptr;
-  if (syscall(SYS_io_submit, context, 1, &requests) != 1) return nullptr;
-  return reinterpret_cast<const unsigned *>(context) + 3;
-}
-
 }  // namespace
 
 int main() {
@@ -62,37 +44,28 @@ int main() {
   const std::string path = std::string(folder) + "/log";
   const std::string record = std::string(150, 'x') + "\n";
   const int file = open(path.c_str(), O_RDWR | O_APPEND | O_CREAT | O_CLOEXEC, 0600);
-  const int notices = inotify_init1(IN_NONBLOCK | IN_CLOEXEC);
-  const int poll = epoll_create1(EPOLL_CLOEXEC);
-  epoll_event event{.events = EPOLLIN, .data = {}};
-  epoll_ctl(poll, EPOLL_CTL_ADD, notices, &event);
-  inotify_add_watch(notices, path.c_str(), IN_ATTRIB | IN_MOVE_SELF | IN_DELETE_SELF);
 
   const auto write = [&] {
     if (::write(file, record.data(), record.size()) < 0) abort();
   };
-  const auto size = [&] { lseek(file, 0, SEEK_END); };
-  const auto ask = [&] { epoll_wait(poll, &event, 1, 0); };
-  const auto look = [&] {
-    struct statx type;
-    if (statx(AT_FDCWD, path.c_str(), 0, STATX_TYPE, &type) != 0) abort();
+  struct statx found;
+  const auto size = [&] {
+    if (statx(file, "", AT_EMPTY_PATH, STATX_TYPE | STATX_INO | STATX_SIZE, &found) != 0) abort();
   };
-  const unsigned *const told = startFlag(poll);
-  const unsigned quiet = told ? *told : 0;
-  const auto load = [&] {
-    if (__atomic_load_n(told, __ATOMIC_ACQUIRE) != quiet) abort();
+  const auto look = [&] {
+    if (statx(AT_FDCWD, path.c_str(), 0, STATX_TYPE, &found) != 0) abort();
+  };
+  const auto tick = [] {
+    timespec now;
+    clock_gettime(CLOCK_MONOTONIC_COARSE, &now);
   };
   const auto measureAll = [&](const char *process) {
     std::printf("%-50s %7s %7s\n", process, "minimum", "median");
     measure("getppid: the way into the system and back", file, [] { getppid(); });
     measure("write", file, write);
+    measure("tick, write (a record of a burst)", file, [&] { tick(), write(); });
     measure("size, write", file, [&] { size(), write(); });
-    measure("notices, size, write (a watched path)", file, [&] { ask(), size(), write(); });
-    if (told) {
-      measure("flag, size, write (a path watched for long)", file,
-              [&] { load(), size(), write(); });
-    }
-    measure("look at the path, size, write (any other path)", file,
+    measure("look at the path, size, write (any other record)", file,
             [&] { look(), size(), write(); });
   };
   measureAll("ns a record, one thread");

@@ -144,6 +144,9 @@ static void withPattern(const MessageName &message, UErrorCode *status, Use use)
     if (BundlePattern *pattern = patternOf(held, message.key, &room, status)) use(*pattern);
     return;
   }
+  // ICU looks in the default locale when there is no bundle of the other.
+  if (!qlxIntlIsGoodLocale(key.defaultLocale)) *status = U_ILLEGAL_ARGUMENT_ERROR;
+  if (U_FAILURE(*status)) return;
   const char *locale = key.locale ? key.locale : key.defaultLocale;
   icu::LocalUResourceBundlePointer fresh = open(key.name, locale, status);
   if (U_FAILURE(*status)) return;

@@ -10,6 +10,7 @@
 #include <unicode/ucal.h>
 #include <unicode/uchar.h>
 #include <unicode/udat.h>
+#include <unicode/uloc.h>
 #include <unicode/ustring.h>
 
 #include <qlx/memory.h>
@@ -61,7 +62,7 @@ static UDateFormat *openDate(const char *pattern, const char *locale) {
   const OwnedUStr own{CxUStringDupStrToUChar(pattern)};
   if (pattern && !own) return nullptr;
   UErrorCode status = U_ZERO_ERROR;
-  return udat_open(UDAT_PATTERN, UDAT_PATTERN, locale, nullptr, -1,
+  return udat_open(UDAT_PATTERN, UDAT_PATTERN, qlxIntlGoodLocale(locale), nullptr, -1,
                    pattern ? own.get() : kDefaultPattern, -1, &status);
 }
 
@@ -82,8 +83,9 @@ static HeldDate *fetch(const char *pattern, const char *locale) {
 // The default zone's offset from UTC at a time, in milliseconds.
 static int32_t offsetAt(double time) {
   UErrorCode status = U_ZERO_ERROR;
+  const char *locale = qlxIntlGoodLocale(uloc_getDefault());
   const icu::LocalUCalendarPointer calendar{
-      ucal_open(nullptr, -1, nullptr, UCAL_TRADITIONAL, &status)};
+      ucal_open(nullptr, -1, locale, UCAL_TRADITIONAL, &status)};
   ucal_setMillis(calendar.getAlias(), time, &status);
   const int32_t zone = ucal_get(calendar.getAlias(), UCAL_ZONE_OFFSET, &status);
   const int32_t daylight = ucal_get(calendar.getAlias(), UCAL_DST_OFFSET, &status);

@@ -2,10 +2,13 @@
 
 #include <pthread.h>
 
+#include <algorithm>
 #include <array>
 #include <cstring>
+#include <string_view>
 
 #include <unicode/localpointer.h>
+#include <unicode/locid.h>
 #include <unicode/timezone.h>
 #include <unicode/ucnv.h>
 #include <unicode/uloc.h>
@@ -35,6 +38,19 @@ const char *qlxIntlCheckHeldLocale(void) {
   const char *name = uloc_getDefault();
   check(gLocale, name);
   return name;
+}
+
+// The parser itself minds the capacities of the language, the script, the country and each key.
+bool qlxIntlIsGoodLocale(const char *name) {
+  const icu::Locale locale(name);
+  if (locale.isBogus()) return false;
+  const std::string_view whole{locale.getName()};
+  const size_t keywords = whole.size() - std::min(whole.size(), whole.find('@'));  // with the "@"
+  return whole.size() < ULOC_FULLNAME_CAPACITY && keywords <= ULOC_KEYWORD_AND_VALUES_CAPACITY;
+}
+
+const char *qlxIntlGoodLocale(const char *name) {
+  return qlxIntlIsGoodLocale(name) ? name : "";
 }
 
 void qlxIntlCheckHeldCodePage(void) {

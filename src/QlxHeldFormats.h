@@ -30,7 +30,8 @@ QLX_BEGIN_DECLS
 // u_vformatMessage() formats it. Null args read as zeros: a number is 0, a date is 1970, and a text
 // is a null string, which ICU answers with U_ILLEGAL_ARGUMENT_ERROR. Returns the units appended; 0
 // with the buffer's text unchanged when *status is a failure and when the text is empty. When
-// memory runs out *status is U_MEMORY_ALLOCATION_ERROR.
+// memory runs out *status is U_MEMORY_ALLOCATION_ERROR. Dates and plurals in a locale of a name that
+// is none are U_ILLEGAL_ARGUMENT_ERROR.
 uint32_t qlxAppendHeldMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
                               va_list *args, UErrorCode *status);
 
@@ -79,6 +80,14 @@ void qlxIntlDropHeldBundles(void);
 void qlxIntlDropHeldMessages(void);
 void qlxIntlDropHeldDates(void);
 void qlxIntlDropHeldNumbers(void);
+
+// Whether ICU takes a name for one of a locale: its own parser can read it, and what that makes of
+// it keeps to ICU's lengths. By some other names ICU cannot make dates and plural rules without
+// ending the process.
+bool qlxIntlIsGoodLocale(const char *name);
+
+// The name, or the root's for one that is not good.
+const char *qlxIntlGoodLocale(const char *name);
 
 // Each drops everything when that default is not the one of its last call.
 const char *qlxIntlCheckHeldLocale(void);  // the default locale's name

@@ -98,7 +98,13 @@ static bool isCurrent(const HeldMessage &held) {
   return held.format;
 }
 
-// Whether an argument may have one of the types, which are words in any mix of case.
+// Behind the white space that ICU leaves out at a place.
+static size_t skipSpace(std::u16string_view pattern, size_t at) {
+  while (at < pattern.size() && u_hasBinaryProperty(pattern[at], UCHAR_PATTERN_WHITE_SPACE)) ++at;
+  return at;
+}
+
+// Whether an argument may have one of the types, which are words in any mix of case behind a comma.
 static bool mayHaveType(std::u16string_view pattern,
                         std::initializer_list<std::u16string_view> types) {
   const auto isAt = [&](size_t at, std::u16string_view type) {
@@ -106,8 +112,10 @@ static bool mayHaveType(std::u16string_view pattern,
            u_strncasecmp(pattern.data() + at, type.data(), static_cast<int32_t>(type.size()),
                          U_FOLD_CASE_DEFAULT) == 0;
   };
-  for (size_t at = 0; at < pattern.size(); ++at)
+  for (size_t at = 0; (at = pattern.find(u',', at)) != pattern.npos;) {
+    at = skipSpace(pattern, at + 1);
     if (std::ranges::any_of(types, [&](auto type) { return isAt(at, type); })) return true;
+  }
   return false;
 }
 
@@ -116,23 +124,29 @@ static bool mayUseZone(std::u16string_view pattern) {
   return mayHaveType(pattern, {u"date", u"time"});
 }
 
-// ICU crashes in a date style, and in a choice by plural rules, of a locale whose name begins with
-// more than a language.
-static bool hasLanguage(const char *locale) {
-  char language[ULOC_LANG_CAPACITY];
-  UErrorCode status = U_ZERO_ERROR;
-  uloc_getLanguage(locale, language, sizeof language, &status);
-  return U_SUCCESS(status) && status != U_STRING_NOT_TERMINATED_WARNING;
+// Worded numbers take the forms of their words from them too.
+static bool mayUsePluralRules(std::u16string_view pattern) {
+  return mayHaveType(pattern, {u"plural", u"selectordinal", u"ordinal", u"spellout", u"duration"});
+}
+
+// Whether ICU can be given the pattern. What has a type takes data of its locale, and where there
+// are none those of the default one.
+static bool isSafe(std::u16string_view pattern, const char *locale, const char *defaultLocale,
+                   bool usesZone) {
+  const bool hasTypes = pattern.find(u',') != pattern.npos;
+  const bool usesRules = usesZone || mayUsePluralRules(pattern);
+  return (!hasTypes || qlxIntlIsGoodLocale(defaultLocale)) &&
+         (!usesRules || qlxIntlIsGoodLocale(locale));
 }
 
 // The default locale is the one that was checked: ICU, asked for no locale, would take the one of a
 // moment later.
 static icu::LocalUMessageFormatPointer open(const PatternKey &key, bool usesZone,
                                             UErrorCode *status) {
-  const char *locale = key.locale ? key.locale : qlxIntlCheckHeldLocale();
+  const char *defaultLocale = qlxIntlCheckHeldLocale();
+  const char *locale = key.locale ? key.locale : defaultLocale;
   if (usesZone) qlxIntlCheckHeldZone();
-  const bool usesLanguage = usesZone || mayHaveType(key.pattern, {u"plural", u"selectordinal"});
-  if (usesLanguage && !hasLanguage(locale)) *status = U_ILLEGAL_ARGUMENT_ERROR;
+  if (!isSafe(key.pattern, locale, defaultLocale, usesZone)) *status = U_ILLEGAL_ARGUMENT_ERROR;
   return icu::LocalUMessageFormatPointer{umsg_open(
       key.pattern.data(), static_cast<int32_t>(key.pattern.size()), locale, nullptr, status)};
 }
@@ -155,8 +169,7 @@ static void hold(const PatternKey &key, bool usesZone, icu::LocalUMessageFormatP
 static int32_t highestArgument(std::u16string_view pattern) {
   int32_t highest = -1;
   for (size_t at = 0; (at = pattern.find(u'{', at)) != pattern.npos;) {
-    ++at;
-    while (at < pattern.size() && u_hasBinaryProperty(pattern[at], UCHAR_PATTERN_WHITE_SPACE)) ++at;
+    at = skipSpace(pattern, at + 1);
     int32_t number = -1;
     for (; at < pattern.size() && pattern[at] >= u'0' && pattern[at] <= u'9'; ++at)
       number = std::min(std::max(number, 0) * 10 + (pattern[at] - u'0'), kMaxZeroArgs);

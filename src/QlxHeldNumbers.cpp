@@ -43,7 +43,7 @@ static bool writesPlainDigits(const UNumberFormat *format) {
 // pattern, as that of a locale with worded numbers, stays as it is.
 static void open(HeldNumber &held, const char *locale) {
   UErrorCode status = U_ZERO_ERROR;
-  held.format = unum_open(UNUM_DECIMAL, nullptr, 0, locale, nullptr, &status);
+  held.format = unum_open(UNUM_DECIMAL, nullptr, 0, qlxIntlGoodLocale(locale), nullptr, &status);
   if (U_FAILURE(status)) held.format = nullptr;
   if (!held.format) return;
   unum_applyPattern(held.format, 0, held.pattern.data(), static_cast<int32_t>(held.pattern.size()),

@@ -6,7 +6,9 @@
 #include <cstdlib>
 #include <cstring>
 #include <optional>
+#include <utility>
 
+#include <unicode/calendar.h>
 #include <unicode/ucal.h>
 #include <unicode/uchar.h>
 #include <unicode/udat.h>
@@ -44,6 +46,7 @@ struct Moment {
 };
 
 static HeldDate gDates[kMaxHeldDates];
+static UCalendar *gCalendar;  // null: not opened
 static uint64_t gUses;
 
 static void drop(HeldDate &held) {
@@ -56,6 +59,7 @@ static void drop(HeldDate &held) {
 void qlxIntlDropHeldDates(void) {
   for (HeldDate &held : gDates)
     if (held.format) drop(held);
+  ucal_close(std::exchange(gCalendar, nullptr));
 }
 
 static UDateFormat *openDate(const char *pattern, const char *locale) {
@@ -80,16 +84,49 @@ static HeldDate *fetch(const char *pattern, const char *locale) {
   return &place;
 }
 
+// In the zone that was checked: the default one may be another by now.
+static UCalendar *openCalendar(UErrorCode *status) {
+  const char *locale = qlxIntlGoodLocale(uloc_getDefault());
+  UCalendar *calendar = ucal_open(nullptr, -1, locale, UCAL_TRADITIONAL, status);
+  const icu::TimeZone *zone = qlxIntlHeldZone();
+  if (calendar && zone) reinterpret_cast<icu::Calendar *>(calendar)->setTimeZone(*zone);
+  return calendar;
+}
+
+// The held calendar, at a time.
+static const UCalendar *calendarAt(double time, UErrorCode *status) {
+  if (!gCalendar) gCalendar = openCalendar(status);
+  ucal_setMillis(gCalendar, time, status);
+  return gCalendar;
+}
+
+static int32_t offsetOf(const UCalendar *calendar, UErrorCode *status) {
+  const int32_t zone = ucal_get(calendar, UCAL_ZONE_OFFSET, status);
+  return zone + ucal_get(calendar, UCAL_DST_OFFSET, status);
+}
+
 // The default zone's offset from UTC at a time, in milliseconds.
 static int32_t offsetAt(double time) {
   UErrorCode status = U_ZERO_ERROR;
-  const char *locale = qlxIntlGoodLocale(uloc_getDefault());
-  const icu::LocalUCalendarPointer calendar{
-      ucal_open(nullptr, -1, locale, UCAL_TRADITIONAL, &status)};
-  ucal_setMillis(calendar.getAlias(), time, &status);
-  const int32_t zone = ucal_get(calendar.getAlias(), UCAL_ZONE_OFFSET, &status);
-  const int32_t daylight = ucal_get(calendar.getAlias(), UCAL_DST_OFFSET, &status);
-  return U_SUCCESS(status) ? zone + daylight : 0;
+  const int32_t offset = offsetOf(calendarAt(time, &status), &status);
+  return U_SUCCESS(status) ? offset : 0;
+}
+
+// Whether the zone's clock goes on by a second when UTC does, and at the same moment. A zone may
+// have parts of a second, or change within one.
+static bool isSteady(double second) {
+  constexpr double kLastMillis = 999;
+  UErrorCode status = U_ZERO_ERROR;
+  const UCalendar *calendar = calendarAt(second, &status);
+  const int32_t offset = offsetOf(calendar, &status);
+  double change = 0;
+  if (ucal_getTimeZoneTransitionDate(calendar, UCAL_TZ_TRANSITION_NEXT, &change, &status) &&
+      change <= second + kLastMillis) {
+    return false;
+  }
+  // Not every zone tells of its changes.
+  const bool lasts = offsetOf(calendarAt(second + kLastMillis, &status), &status) == offset;
+  return U_SUCCESS(status) && lasts && offset % 1000 == 0;
 }
 
 // As "%02d" writes it: a sign takes the place of a leading zero.
@@ -152,6 +189,7 @@ static bool keep(HeldDate &held, int64_t second) {
   const icu::LocalUFieldPositionIteratorPointer fields{ufieldpositer_open(&status)};
   if (U_FAILURE(status)) return false;
   const double time = static_cast<double>(second) * 1000;
+  if (!isSteady(time)) return false;
   if (!appendDate(&held.text, held, time, fields.getAlias(), &status)) return false;
   const std::optional<int32_t> fraction = findFraction(held.text, fields.getAlias());
   held.varies = U_FAILURE(status) || !fraction;

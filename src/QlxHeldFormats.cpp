@@ -9,7 +9,6 @@
 
 #include <unicode/localpointer.h>
 #include <unicode/locid.h>
-#include <unicode/timezone.h>
 #include <unicode/ucnv.h>
 #include <unicode/uloc.h>
 
@@ -65,6 +64,10 @@ void qlxIntlCheckHeldZone(void) {
   dropAll();
   delete gZone;
   gZone = zone.orphan();
+}
+
+const icu::TimeZone *qlxIntlHeldZone(void) {
+  return gZone;
 }
 
 void qlxDropHeldFormats(void) {

@@ -14,6 +14,8 @@
 #include <cstring>
 #include <string_view>
 
+#include <unicode/timezone.h>
+
 #include <qlx/types.h>
 
 #include "QlxPatternTypes.h"
@@ -93,6 +95,9 @@ const char *qlxIntlGoodLocale(const char *name);
 const char *qlxIntlCheckHeldLocale(void);  // the default locale's name
 void qlxIntlCheckHeldZone(void);
 void qlxIntlCheckHeldCodePage(void);
+
+// The default zone as it was when it was checked last; null when it is not known.
+const icu::TimeZone *qlxIntlHeldZone(void);
 
 QLX_END_DECLS
 

@@ -11,8 +11,11 @@
 #include <thread>
 #include <vector>
 
+#include <unicode/dtrule.h>
+#include <unicode/rbtz.h>
 #include <unicode/simpletz.h>
 #include <unicode/timezone.h>
+#include <unicode/tzrule.h>
 #include <unicode/udat.h>
 #include <unicode/uloc.h>
 
@@ -204,6 +207,66 @@ TEST_F(HeldDatesTest, TheHourChangesAtTheMillisecondOfTheTransition) {
     EXPECT_EQ(bytesOf("HH:mm:ss.SSS", kToSummer - 1), "01:59:59.999");
     EXPECT_EQ(bytesOf("HH:mm:ss.SSS", kToSummer), "03:00:00.000");
   }
+}
+
+// Patterns whose text of a second says nothing of its milliseconds, and one that does.
+constexpr const char *kWithinASecond[] = {"HH:mm:ss",     "ss",       "HH:mm",
+                                          "HH:mm:ss.SSS", "ss XXXXX", "yyyy-MM-dd HH:mm:ss zzzz"};
+
+TEST_F(HeldDatesTest, AZoneWithAPartOfASecondTellsTheTimeAtItsMilliseconds) {
+  for (const int32_t offset : {500, -1, 3'600'001, -17'999'500, 999, 1'234'567})
+    for (const bool inSummer : {false, true}) {
+      auto *zone = new icu::SimpleTimeZone(inSummer ? 0 : offset, u"Odd");
+      UErrorCode status = U_ZERO_ERROR;
+      if (inSummer) {
+        zone->setStartRule(0, 1, 0, status);
+        zone->setEndRule(11, 31, 0, status);
+        zone->setDSTSavings(std::abs(offset) % 1000 + 3'600'000, status);
+      }
+      ASSERT_TRUE(U_SUCCESS(status));
+      icu::TimeZone::adoptDefault(zone);
+      for (const char *pattern : kWithinASecond)
+        for (const double millis : {0, 1, 499, 500, 876, 999, 0, 877})
+          compare(pattern, kTime - 123 + millis);
+    }
+}
+
+// A zone whose offset from UTC is another one at each of two moments.
+void setZoneThatChanges(int32_t first, UDate at, int32_t second, UDate again, int32_t third) {
+  UErrorCode status = U_ZERO_ERROR;
+  auto *zone =
+      new icu::RuleBasedTimeZone(u"Changing", new icu::InitialTimeZoneRule(u"first", first, 0));
+  zone->addTransitionRule(
+      new icu::TimeArrayTimeZoneRule(u"second", second, 0, &at, 1, icu::DateTimeRule::UTC_TIME),
+      status);
+  zone->addTransitionRule(
+      new icu::TimeArrayTimeZoneRule(u"third", third, 0, &again, 1, icu::DateTimeRule::UTC_TIME),
+      status);
+  zone->complete(status);
+  ASSERT_TRUE(U_SUCCESS(status)) << u_errorName(status);
+  icu::TimeZone::adoptDefault(zone);
+}
+
+TEST_F(HeldDatesTest, AnOffsetThatChangesWithinASecondDoesSoAtItsMillisecond) {
+  constexpr UDate kSecond = kTime - 123, kLater = kSecond + 60'000;
+  constexpr int32_t kHour = 3'600'000;
+  for (const UDate again : {kLater, kSecond + 700, kSecond + 999, kSecond + 401}) {
+    setZoneThatChanges(0, kSecond + 400, kHour, again, again == kLater ? 2 * kHour : 0);
+    for (const char *pattern : kWithinASecond)
+      for (int round = 0; round < 2; ++round)
+        for (const double millis : {-1000, 0, 399, 400, 401, 699, 700, 998, 999, 1000, 0, 60'000})
+          compare(pattern, kSecond + millis);
+    EXPECT_EQ(unitsOf(nullptr, kSecond + 399), u"2006-08-16 10:48:55.399+00:00");
+    EXPECT_EQ(unitsOf(nullptr, kSecond + 400), u"2006-08-16 11:48:55.400+01:00");
+  }
+}
+
+TEST_F(HeldDatesTest, AfterAnOddSecondTextsAreKeptAgain) {
+  constexpr UDate kSecond = kTime - 123;
+  setZoneThatChanges(0, kSecond + 400, 3'600'000, kSecond + 60'000, 0);
+  EXPECT_EQ(bytesOf("HH:mm:ss", kSecond), std::nullopt) << "not kept";
+  EXPECT_EQ(bytesOf("HH:mm:ss", kSecond + 1000), "11:48:56");
+  EXPECT_EQ(bytesOf("HH:mm:ss", kSecond + 60'000), "10:49:55") << "a change at the full second";
 }
 
 TEST_F(HeldDatesTest, TheSameSecondFollowsTheLocaleOfTheCall) {

@@ -9,6 +9,7 @@
 #include <unicode/messagepattern.h>
 #include <unicode/msgfmt.h>
 
+#include "QlxPatternNesting.h"
 #include "util/CxUStringBuff.h"
 #include "util/CxUnits.h"
 
@@ -38,6 +39,7 @@ class Parser {
       : pattern_(pattern), out_(out), parts_(status_) {}
 
   bool parse() {
+    if (qlxNestsTooDeep(pattern_)) return false;
     const icu::UnicodeString text(false, pattern_.data(), static_cast<int32_t>(pattern_.size()));
     parts_.parse(text, nullptr, status_);
     if (U_FAILURE(status_)) return false;

@@ -16,6 +16,7 @@
 #include <qlx/ustring.h>
 
 #include "QlxComposed.h"
+#include "QlxPatternNesting.h"
 #include "util/CxOwned.h"
 #include "util/CxUnits.h"
 
@@ -136,7 +137,7 @@ static bool isSafe(std::u16string_view pattern, const char *locale, const char *
   const bool hasTypes = pattern.find(u',') != pattern.npos;
   const bool usesRules = usesZone || mayUsePluralRules(pattern);
   return (!hasTypes || qlxIntlIsGoodLocale(defaultLocale)) &&
-         (!usesRules || qlxIntlIsGoodLocale(locale));
+         (!usesRules || qlxIntlIsGoodLocale(locale)) && !qlxNestsTooDeep(pattern);
 }
 
 // The default locale is the one that was checked: ICU, asked for no locale, would take the one of a

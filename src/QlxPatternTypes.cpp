@@ -5,6 +5,9 @@
 
 #include <unicode/uchar.h>
 
+#include "QlxPatternNesting.h"
+#include "util/CxUnits.h"
+
 namespace {
 
 // A part of an argument. One that is longer than any word or index reads as empty.
@@ -115,5 +118,6 @@ class Scanner {
 
 bool qlxScanPatternTypes(const UChar *pattern, ArgTypes *types) {
   types->fill(ArgType::kNone);
+  if (qlxNestsTooDeep({pattern, cxUnitsLength(pattern)})) return false;
   return Scanner(pattern).scan(types);
 }

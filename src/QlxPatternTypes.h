@@ -10,8 +10,9 @@ enum class ArgType : uint8_t { kNone, kString, kInteger, kDouble };
 
 using ArgTypes = std::array<ArgType, 10>;  // by argument index
 
-/** Scans a pattern; false when it cannot be read. Deliberate: one apostrophe toggles quoting, also
- *  where ICU prints it. The last type seen for an index counts; indexes above 9 are ignored. */
+/** Scans a pattern; false when it cannot be read or nests too deep. Deliberate: one apostrophe
+ * toggles quoting, also where ICU prints it. The last type seen for an index counts; indexes above
+ * 9 are ignored. */
 bool qlxScanPatternTypes(const UChar *pattern, ArgTypes *types);
 
 #endif

@@ -7,6 +7,7 @@
 
 #include <unicode/messagepattern.h>
 
+#include "QlxPatternNesting.h"
 #include "QlxPatternTypes.h"
 
 static void require(bool holds) {
@@ -64,7 +65,7 @@ static ArgType typeByIcu(const icu::MessagePattern &pattern, int32_t start) {
 static void compareWithIcu(const std::u16string &text, const Scan &found) {
   UErrorCode status = U_ZERO_ERROR;
   const icu::MessagePattern pattern(icu::UnicodeString(text.c_str()), nullptr, status);
-  if (U_FAILURE(status) || pattern.hasNamedArguments()) return;
+  if (U_FAILURE(status) || pattern.hasNamedArguments() || qlxNestsTooDeep(text)) return;
   ArgTypes types;
   types.fill(ArgType::kNone);
   for (int32_t i = 1; i < pattern.countParts(); i = pattern.getLimitPartIndex(i) + 1) {

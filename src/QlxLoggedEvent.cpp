@@ -9,7 +9,9 @@
 #include <qlx/memory.h>
 #include <qlx/system.h>
 
+#include "QlxProps.h"
 #include "util/CxDecimal.h"
+#include "util/CxStatus.h"
 #include "util/CxUnits.h"
 #include "util/QlxMapTemplate.h"
 
@@ -85,6 +87,10 @@ static void takeBack(Char **kept, Char **from) {
   *from = nullptr;
 }
 
+void qlxMissMemory(Event *event) {
+  event->status = cxFailure(ENOMEM);
+}
+
 // ---- Properties
 
 // The first kept node, with that key and value; null when there is none or memory ran out.
@@ -99,13 +105,19 @@ static StringToStringMapNode *refillNode(const char *key, std::string_view value
   return node;
 }
 
+// A map may have kept the key without its value.
+static void stampAnew(Event *event, const char *key, const char *value) {
+  if (QlxSetEventProp(event, key, value) && qlxPeekMapProp(event->props, key)) return;
+  qlxMissMemory(event);
+}
+
 void qlxStampEvent(Event *event, const char *key, std::string_view value) {
   if (!event->props) std::swap(event->props, gKept.props);
   StringToStringMap *props = event->props;
   StringToStringMapNode *node = nullptr;
   const bool isNew = props && (!props->head || !qlxIntlStringToStringMapHasKey(props, key));
   if (isNew) node = refillNode(key, value);
-  if (!node) return (void)QlxSetEventProp(event, key, value.data());
+  if (!node) return stampAnew(event, key, value.data());
   node->owner = props;
   Nodes::linkAtTail(node);
 }
@@ -120,7 +132,9 @@ void qlxStampEventInt(Event *event, const char *key, int32_t value) {
 }
 
 void qlxStampEventMessageId(Event *event, std::string_view messageId) {
-  lend(&event->messageId, &gKept.messageId, messageId.data(), messageId.size());
+  const bool stamped =
+      lend(&event->messageId, &gKept.messageId, messageId.data(), messageId.size());
+  if (!stamped) qlxMissMemory(event);
 }
 
 // ---- Where an event comes from
@@ -213,6 +227,7 @@ LoggedEvent::LoggedEvent(int32_t level, const char *bundle, const char *key, con
   if (gKept.event) event_ = refillEvent(bundle, key, text);
   if (!event_) {
     event_ = QlxVaAllocUEvent(level, bundle, key, text);
+    if (event_ && !event_->message) qlxMissMemory(event_);
     return;
   }
   event_->time = CxSystemGetTimestamp();

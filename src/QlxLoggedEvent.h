@@ -29,12 +29,16 @@ void qlxSettleEvent(Event *event);
 // gets no event (a header, a trailer): it may log too, and reuse the caller's texts for that.
 void qlxSettleNotedEvent(void);
 
+// Makes it the event's status that memory ran out, so that the log call's result tells it.
+void qlxMissMemory(Event *event);
+
 // Sets a property as QlxSetEventProp() does, in a kept block where there is one.
-// The event is settled.
+// The event is settled. It is its status when memory ran out.
 void qlxStampEvent(Event *event, const char *key, std::string_view value);
 void qlxStampEventInt(Event *event, const char *key, int32_t value);
 
-// Sets the message identifier, of an event that has none, in the same way.
+// Sets the message identifier, of an event that has none, in the same way. For want of memory it
+// stays without one.
 void qlxStampEventMessageId(Event *event, std::string_view messageId);
 
 // Frees what is kept.
@@ -42,7 +46,8 @@ void qlxDropKeptEvent(void);
 
 QLX_END_DECLS
 
-// An event as QlxVaAllocUEvent() makes it. The API lock is held.
+// An event as QlxVaAllocUEvent() makes it; its status tells when it has no message for want of
+// memory. The API lock is held.
 class LoggedEvent {
  public:
   LoggedEvent(int32_t level, const char *bundle, const char *key, const UChar *text);

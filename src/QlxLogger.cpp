@@ -2,6 +2,8 @@
 // an event, hands it to the logger's class, and answers with the event's status.
 #include <qlx/logger.h>
 
+#include <cerrno>
+
 #include <qlx/class/event.h>
 #include <qlx/class/logger.h>
 #include <qlx/class/message.h>
@@ -17,6 +19,7 @@
 #include "QlxProps.h"
 
 static constexpr QlxLogResult kNothingLogged = {'-', 0, 0};
+static constexpr QlxLogResult kNoMemory = {'p', ENOMEM, 0};
 
 // Deliberate: tests whatever object it is given, by the fields of a logger.
 static inline bool isLoggable(const QlxObject *logger, int32_t level) {
@@ -57,7 +60,7 @@ void qlxLogUMessageEntry(QlxLogResult *result, QlxObject *logger, int32_t level,
   const fLog log = qlxIntlLoggerGetFLog(logger);
   if (!log) return;
   const LoggedEvent event{level, bundle, key, nullptr};
-  if (!event.get()) return;
+  if (!event.get()) return report(result, kNoMemory);
   event->isMessage = 1;
   passToLogger(result, logger, log, event.get(), args);
 }
@@ -68,7 +71,7 @@ void qlxLogUDebugEntry(QlxLogResult *result, QlxObject *logger, int32_t level, c
   const fLog log = qlxIntlLoggerGetFLog(logger);
   if (!log) return;
   const LoggedEvent event{level, nullptr, nullptr, text};
-  if (!event.get()) return;
+  if (!event.get()) return report(result, kNoMemory);
   event->isMessage = 0;
   event.noteSource({file, function, line});
   passToLogger(result, logger, log, event.get(), args);

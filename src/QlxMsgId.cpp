@@ -53,5 +53,6 @@ char *qlxPDXMLUGetMessageID(const UChar *text) {
 void qlxPDXMLUFormatterCacheMessageID(QlxObject *, Event *event, va_list *args) {
   if (!event || event->messageId) return;
   const BoundText text{event, args};
+  if (event->message && event->message->error == U_MEMORY_ALLOCATION_ERROR) qlxMissMemory(event);
   qlxStampEventMessageId(event, qlxMessageIdOfText(text.get()).text);
 }

@@ -11,6 +11,7 @@
 namespace {
 
 constexpr QlxLogResult kNothing = {'-', 0, 0};
+constexpr QlxLogResult kNoMemory = {'p', ENOMEM, 0};
 constexpr QlxLogResult kNotTouched = {'x', 7, 7};
 
 // Calls with a started list in the place of the parameters.
@@ -319,14 +320,60 @@ TEST_F(LoggerTest, AHandlerIsNoLogger) {
   EXPECT_EQ(recorder->records.size(), 0u);
 }
 
-TEST_F(LoggerTest, ACallThatFindsNoMemoryLogsNothing) {
+TEST_F(LoggerTest, ACallThatFindsNoMemoryTellsIt) {
   FailingMemory memory;
   memory.failOnce(1);
-  EXPECT_EQ(QlxLogUText(logger.get(), u"x"), kNothing);
+  EXPECT_EQ(QlxLogUText(logger.get(), u"x"), kNoMemory);
   EXPECT_EQ(recorder->records.size(), 0u);
   memory.failOnce(2);  // the event has no message
-  EXPECT_EQ(QlxLogUText(logger.get(), u"x"), kNothing);
+  EXPECT_EQ(QlxLogUText(logger.get(), u"x"), kNoMemory);
   EXPECT_RECORDED(u"<null>|");
+  EXPECT_EQ(recorder->records[0].status, failure(ENOMEM)) << "listeners see it too";
+}
+
+TEST_F(LoggerTest, EveryFormTellsThatItFoundNoMemory) {
+  setLevel("ALL");
+  QlxObject *l = logger.get();
+  FailingMemory memory;
+  memory.failFrom(1);
+  for (const auto call : {QlxLogUMsg, QlxLogInfo, QlxLogWarn, QlxLogError, QlxLogFatal}) {
+    EXPECT_EQ(call(l, "b", "k"), kNoMemory);
+  }
+  for (const auto call : {QlxLogUMsgVA, QlxLogInfoVA, QlxLogWarnVA, QlxLogErrorVA, QlxLogFatalVA}) {
+    EXPECT_EQ(callVA(call, l, "b", "k"), kNoMemory);
+  }
+  for (const auto call : {QlxLogDebugMax, QlxLogDebugMid, QlxLogDebugMin}) {
+    EXPECT_EQ(call(l, "f", "g", 1, u"x"), kNoMemory);
+  }
+  for (const auto call : {QlxLogDebugMaxVA, QlxLogDebugMidVA, QlxLogDebugMinVA}) {
+    EXPECT_EQ(callVA(call, l, "f", "g", 1, u"x"), kNoMemory);
+  }
+  EXPECT_EQ(QlxLogUText(l, u"x"), kNoMemory);
+  EXPECT_EQ(callVA(QlxLogUTextVA, l, u"x"), kNoMemory);
+}
+
+TEST_F(LoggerTest, AnEventThatIsNotMadeWholeAgainIsToldToo) {
+  QlxLogInfo(logger.get(), "b", "k");  // its blocks are kept for the next
+  FailingMemory memory;
+  memory.failOnce(1);
+  const std::string longKey(1000, 'k');
+  EXPECT_EQ(QlxLogInfo(logger.get(), "b", longKey.c_str()).statusKind, '-') << "made anew";
+  memory.failFrom(1);
+  EXPECT_EQ(QlxLogInfo(logger.get(), "b", (longKey + longKey).c_str()), kNoMemory);
+}
+
+TEST_F(LoggerTest, TheEntriesTellThatThereIsNoMemory) {
+  const ApiLock lock;
+  FailingMemory memory;
+  memory.failFrom(1);
+  QlxLogResult result = kNotTouched;
+  qlxLogUMessageEntry(&result, logger.get(), INFO, "b", "k", nullptr);
+  EXPECT_EQ(result, kNoMemory);
+  result = kNotTouched;
+  qlxLogUDebugEntry(&result, logger.get(), INFO, "f", "g", 1, u"x", nullptr);
+  EXPECT_EQ(result, kNoMemory);
+  qlxLogUMessageEntry(nullptr, logger.get(), INFO, "b", "k", nullptr);
+  qlxLogUDebugEntry(nullptr, logger.get(), INFO, "f", "g", 1, u"x", nullptr);
 }
 
 // ---- The entries

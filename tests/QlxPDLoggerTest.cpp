@@ -7,8 +7,11 @@
 #include <array>
 #include <cstring>
 #include <map>
+#include <optional>
+#include <utility>
 
 #include "QlxFormatted.h"
+#include "QlxHeldFormats.h"
 #include "QlxLoggedEvent.h"
 #include "support/HostName.h"
 #include "support/ChainTest.h"
@@ -362,6 +365,63 @@ TEST_F(PDLoggerTest, WithoutVariablesItStampsWhereItRunsAndLogsOn) {
   EXPECT_EQ(logged(u"ABC0001E wrong").all, whereItRuns());
   EXPECT_EQ(seen.messageId, "ABC0001E");
   logger->vars = own;
+}
+
+// ---- Without memory
+
+// A first listener: what the event was when it came.
+struct Arrival {
+  static constexpr const char *kClass = "test_arrival";
+  static inline std::optional<CxStatus> status;  // nothing: no event came
+  static inline std::string event;
+
+  static void process(QlxObject *, Event *arrived, va_list *) {
+    status = arrived->status;
+    event = arrived->messageId ? arrived->messageId : "<null>";
+    event += arrived->message && arrived->message->text ? " text|" : " no text|";
+    for (const auto *it = arrived->props ? arrived->props->head : nullptr; it; it = it->next) {
+      event += std::string(it->key) + "=" + (it->value ? it->value : "<null>") + "|";
+    }
+  }
+};
+
+TEST_F(PDLoggerTest, WhateverFindsNoMemoryBeforeTheFirstListenerIsTold) {
+  QlxAddHandlerClass(Arrival::kClass, nullptr, nullptr, nullptr, nullptr, Arrival::process, nullptr,
+                     nullptr);
+  const Handle first = get("pd first", "qlx_pdlogger"), handler = get("arrival", Arrival::kClass);
+  QlxAddListener(first.get(), handler.get());
+  for (const char *key : kStamped) QlxSetObjProp(first.get(), key, "some value of its own");
+  const auto log = [&first] {
+    Arrival::status.reset();
+    const QlxLogResult result =
+        QlxLogDebugMin(first.get(), "file", "function", 1, u"ABC0001E '{'wrong'}'");
+    return CxStatus{result.statusKind, result.statusCode};
+  };
+  FailingMemory memory;
+  int told = 0;
+  for (const bool isFirstCall : {true, false})
+    for (const auto fail : {&FailingMemory::failOnce, &FailingMemory::failFrom})
+      for (uint64_t nth = 1, failures = 1; failures > 0; ++nth) {
+        EXPECT_EQ(log(), kSuccess);
+        const std::string whole = Arrival::event;
+        if (isFirstCall) qlxDropKeptEvent();
+        qlxDropHeldFormats();
+        qlxDropFormatted();
+        (memory.*fail)(nth);
+        const CxStatus status = log();
+        failures = memory.failures();
+        memory.failNone();
+        if (status == failure(ENOMEM)) {
+          ++told;
+          EXPECT_EQ(Arrival::status.value_or(status), status) << nth;
+          EXPECT_GT(failures, 0U);
+        } else {
+          EXPECT_EQ(status, kSuccess);
+          EXPECT_EQ(Arrival::status, kSuccess) << nth;
+          EXPECT_EQ(Arrival::event, whole) << nth;
+        }
+      }
+  EXPECT_GT(told, 40);
 }
 
 // ---- The formatter that all loggers of the class share

@@ -77,10 +77,11 @@ void QlxPDLoggerFFreeVars(void *block) {
 }
 
 void QlxPDLoggerFCfgChange(QlxObject *logger, const char *key) {
+  if (!key) return;
   PDLoggerVars *vars = varsOf(logger);
-  if (!vars || !key) return;
   for (const Stamp &stamp : kStamps) {
     if (OslStringCmp(stamp.key, key) != 0) continue;
+    if (!vars) return;
     OslMemoryFree(vars->*stamp.value);
     vars->*stamp.value = qlxIntlGetObjProp(logger, key, nullptr);
     return;

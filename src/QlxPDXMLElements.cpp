@@ -90,17 +90,33 @@ static void appendValue(RecordText &out, ArgType type, va_list *args) {
   }
 }
 
+// Without a list a number is zero, as in the text.
+static void appendZero(RecordText &out, ArgType type, va_list *) {
+  if (type == ArgType::kInteger) return appendSigned(out, 0);
+  out.number(kHeldFraction, 0);
+}
+
 // Deliberate: ends at the first index without a type, whatever comes after it.
-static void appendParameters(RecordText &out, const ArgTypes &types, va_list *args) {
-  va_list copy;
-  va_copy(copy, *args);
+static void appendParametersBy(decltype(appendValue) *append, RecordText &out,
+                               const ArgTypes &types, va_list *args) {
   for (const ArgType type : types) {
     if (type == ArgType::kNone) break;
     out << "<Param><![CDATA["sv;
-    appendValue(out, type, &copy);
+    append(out, type, args);
     out << "]]></Param>"sv;
   }
-  va_end(copy);
+}
+
+// Deliberate: without a list a pattern with a string has no text, and no parameters.
+static void appendParameters(RecordText &out, const ArgTypes &types, va_list *args) {
+  if (args) {
+    va_list copy;
+    va_copy(copy, *args);
+    appendParametersBy(appendValue, out, types, &copy);
+    va_end(copy);
+  } else if (std::ranges::find(types, ArgType::kString) == types.end()) {
+    appendParametersBy(appendZero, out, types, nullptr);
+  }
 }
 
 void qlxPDXMLAppendTranslation(RecordText &out, const Event *event, const char *bundle,
@@ -113,7 +129,7 @@ void qlxPDXMLAppendTranslation(RecordText &out, const Event *event, const char *
   ArgTypes types;
   const bool known =
       bundle && qlxScanBundlePattern({bundle, message->key, message->locale}, &types);
-  if (known && args) appendParameters(out, types, args);
+  if (known) appendParameters(out, types, args);
   out << "</TranslationInfo>\n"sv;
 }
 

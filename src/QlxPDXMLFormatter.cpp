@@ -48,7 +48,8 @@ void QlxPDXMLFormatterFFreeVars(void *vars) {
 
 template <uint8_t PDXMLVars::*Flag>
 static void applyFlag(QlxObject *formatter, const char *key) {
-  varsOf(formatter)->*Flag = qlxIntlGetObjPropBool(formatter, key, nullptr);  // absent: 0
+  if (PDXMLVars *vars = varsOf(formatter))
+    vars->*Flag = qlxIntlGetObjPropBool(formatter, key, nullptr);  // absent: 0
 }
 
 static constexpr ConfigKey kXmlFormatterKeys[] = {
@@ -61,7 +62,7 @@ static constexpr ConfigKey kXmlFormatterKeys[] = {
 };
 
 void QlxPDXMLFormatterFCfgChange(QlxObject *formatter, const char *key) {
-  if (!key || !varsOf(formatter)) return;
+  if (!formatter || !key) return;
   if (!qlxApplyConfigKey(kXmlFormatterKeys, formatter, key)) {
     QlxBasicFormatterFCfgChange(formatter, key);
   }

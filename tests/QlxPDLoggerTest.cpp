@@ -367,6 +367,15 @@ TEST_F(PDLoggerTest, WithoutVariablesItStampsWhereItRunsAndLogsOn) {
   logger->vars = own;
 }
 
+TEST_F(PDLoggerTest, WithoutVariablesTheKeysOfTheBasicLoggerStillCount) {
+  void *own = std::exchange(logger->vars, nullptr);
+  set("level", "WARN");
+  EXPECT_EQ(logger->kind1.level, WARN);
+  set("logging", "off");
+  EXPECT_EQ(QlxIsObjectEnabled(logger.get()), 0);
+  logger->vars = own;
+}
+
 // ---- Without memory
 
 // A first listener: what the event was when it came.

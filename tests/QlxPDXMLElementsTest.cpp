@@ -275,11 +275,25 @@ TEST_F(PDXMLTranslationTest, TheArgumentsStayUnread) {
   twice("k", u"text", 7);
 }
 
-TEST_F(PDXMLTranslationTest, WithoutAnArgumentListThereAreNoParameters) {
-  add(R"(k { "{0}" })");
-  use("k");
-  EXPECT_EQ(elementOf(event_->message->bundle, nullptr),
-            startOf(bundles_.path(), "k") + u"</TranslationInfo>\n");
+TEST_F(PDXMLTranslationTest, WithoutAnArgumentListNumbersAreZero) {
+  add(R"(k { "{0,number,integer} {1,number} {2,choice,0#a|1#b} {4,number}" }
+         date { "{0,number} {1,date} {2,number}" } )");
+  const auto unlisted = [this](const char *key) {
+    use(key);
+    return elementOf(event_->message->bundle, nullptr).substr(startOf(bundles_.path(), key).size());
+  };
+  EXPECT_EQ(unlisted("k"), param(u"0") + param(u"0") + param(u"0") + u"</TranslationInfo>\n");
+  EXPECT_EQ(unlisted("date"), param(u"0") + u"</TranslationInfo>\n");
+}
+
+// Deliberate: the text cannot be bound then, so there is nothing that it shows.
+TEST_F(PDXMLTranslationTest, WithoutAnArgumentListAPatternWithAStringHasNoParameters) {
+  add(R"(k { "{0}" } mixed { "{0,number} {1}" } behind { "{0,number} {2}" })");
+  for (const char *key : {"k", "mixed", "behind"}) {
+    use(key);
+    EXPECT_EQ(elementOf(event_->message->bundle, nullptr),
+              startOf(bundles_.path(), key) + u"</TranslationInfo>\n");
+  }
 }
 
 TEST_F(PDXMLTranslationTest, AnUnknownKeyOrBundleHasNoParameters) {

@@ -260,6 +260,24 @@ TEST_F(PDXMLFormatterTest, OtherKeysAreThoseOfTheBasicFormatter) {
   QlxPDXMLFormatterFCfgChange(nullptr, "forceAsTrace");
 }
 
+TEST_F(PDXMLFormatterTest, WithoutVariablesTheKeysOfTheBasicFormatterStillCount) {
+  void *own = std::exchange(formatter_->vars, nullptr);
+  configureTo("dateTimeFormat", "HH");
+  EXPECT_STREQ(formatter_->kind2.dateTimeFormat, "HH");
+  configureTo("logging", "false");
+  EXPECT_EQ(QlxIsObjectEnabled(formatter_.get()), 0);
+  configureTo("forceAsTrace", "true");
+  formatter_->vars = own;
+}
+
+TEST_F(PDXMLFormatterTest, WithoutArgumentsTextAndParametersAreTheSameZeros) {
+  const ResourceBundles bundles{"zeros"};
+  ASSERT_TRUE(bundles.add("root", R"(k { "{0,number,integer} of {1,number}" } )"));
+  const std::u16string all = record(makeMessage(bundles.path(), "k"));
+  EXPECT_TRUE(has(all, u"<LogText><![CDATA[0 of 0]]></LogText>"));
+  EXPECT_TRUE(has(all, u"<Param><![CDATA[0]]></Param><Param><![CDATA[0]]></Param></Tr"));
+}
+
 TEST_F(PDXMLFormatterTest, AnObjectOfAnotherKindKeepsItsVariables) {
   const Handle handler = get("handler", "qlx_filehandler");
   QlxSetObjProp(handler.get(), "singleComponent", "true");

@@ -17,7 +17,8 @@ QLX_BEGIN_DECLS
 
 /**
  * @param bundle, key, text  of the event's message; each may be null
- * @return a new event, stamped with the time, for QlxFreeEvent(); null when memory ran out
+ * @return a new event, stamped with the time, for QlxFreeEvent(); null when memory ran out. When it
+ *         runs out for the message alone, an event without one, which binds to nothing
  */
 QLX_API Event *QlxVaAllocUEvent(int32_t level, const char *bundle, const char *key,
                                 const UChar *text);
@@ -33,14 +34,18 @@ QLX_API int32_t QlxGetEventLevel(Event *event);
 
 /** @return a copy of the message identifier, or null */
 QLX_API char *QlxGetEventMessageId(Event *event);
+/** Replaces the identifier; null takes it away, and so does a lack of memory. */
 QLX_API void QlxSetEventMessageId(Event *event, const char *messageId);
 
-/** @return 1 for a bundle's message, 0 for plain or debug text and for null */
+/** @return 1 for a message, 0 for plain or debug text and for null. At first 1 for an event with a
+ *          bundle; the log calls set it, to 1 for every call that takes a bundle, be it null */
 QLX_API uint8_t QlxGetEventIsMessage(Event *event);
+/** Any other value than 0 is a message too, and is handed out as it is. */
 QLX_API void QlxSetEventIsMessage(Event *event, uint8_t flag);
 
 /**
  * Binds the event's message in the event's locale, or the message's own when the event has none.
+ * The event's locale becomes the message's and stays there.
  *
  * @param bind  a formatter's fBindMsg, normally qlxIntlBindUI18Msg(); null gives null
  * @param args  the log call's arguments; null is an empty list
@@ -50,7 +55,8 @@ QLX_API UChar *QlxBindEventUMsg(Event *event, fBindMsg bind, va_list *args);
 
 /*
  * Named values. A getter's `found` (optional) becomes 1 when a value came back (for a typed getter:
- * was converted by the rules of qlx/props.h), otherwise 0. A setter replaces.
+ * was converted by the rules of qlx/props.h), otherwise 0. A setter replaces. When memory runs out
+ * the key is not set, or stays without a value.
  */
 QLX_API char *QlxGetEventProp(Event *event, const char *key, uint8_t *found);
 QLX_API uint8_t QlxGetEventPropBool(Event *event, const char *key, uint8_t *found);
@@ -60,9 +66,9 @@ QLX_API int32_t QlxGetEventPropLong(Event *event, const char *key, uint8_t *foun
 QLX_API float QlxGetEventPropFloat(Event *event, const char *key, uint8_t *found);
 QLX_API double QlxGetEventPropDouble(Event *event, const char *key, uint8_t *found);
 
-/** @return 1 when stored */
+/** @return 1 when the key is set, 0 for a null key and when memory ran out for it */
 QLX_API uint8_t QlxSetEventProp(Event *event, const char *key, const char *value);
-/** @return 1 when stored */
+/** @return as QlxSetEventProp() */
 QLX_API uint8_t QlxSetEventPropBool(Event *event, const char *key, uint8_t value);
 QLX_API void QlxSetEventPropInt(Event *event, const char *key, int32_t value);
 /** Deliberate: 32 bits wide here; objects keep 64. */

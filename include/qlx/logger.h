@@ -5,8 +5,10 @@
  * A call tests the logger's enabled flag and threshold first, without the lock; a suppressed call
  * costs nothing more. Then it takes the API lock, makes an event and hands it to the logger's
  * listeners. All arguments are borrowed; a null logger logs nothing. The result starts as
- * {'-', 0, 0} and stays so when nothing was logged; else it tells the event's status (a handler
- * that could not write stores the system's error there) and ICU's code of the last failed bind.
+ * {'-', 0, 0} and stays so when there was nothing to log; else it tells the event's status (a
+ * handler that could not write stores the system's error there) and ICU's code of the last failed
+ * bind. When memory runs out before the first listener has the event, the status is {'p', ENOMEM}:
+ * nothing was logged then, or an event that lacks what there was no memory for.
  *
  * The message parameters follow as ICU reads them for the pattern: a string is a `const UChar *`, a
  * {0,number,integer} an int32_t, a {0,number} a double, a {0,date} a UDate (double). Each call has
@@ -48,7 +50,8 @@ QLX_API QlxLogResult QlxLogUMsgVA(QlxObject *logger, const char *bundle, const c
 /*
  * Debug texts with their source location, at DEBUG_MIN, DEBUG_MID, DEBUG_MAX. The text is a message
  * PATTERN: an apostrophe or a brace means there what it means to ICU; log foreign text as {0} with
- * the text as argument. Null file, function or text: left out; a line without a file is dropped.
+ * the text as argument. One that nests deeper than 8 levels is not formatted (qlx/message.h). Null
+ * file, function or text: left out; a line without a file is dropped.
  */
 QLX_API QlxLogResult QlxLogDebugMin(QlxObject *logger, const char *file, const char *function,
                                     int32_t line, const UChar *text, ...);

@@ -38,7 +38,16 @@ QLX_API void QlxFreeI18Msg(I18Msg *message);
  *
  * @param args  borrowed and left as it was; of the types that the pattern reads, as for
  *              u_vformatMessage(). Null is an empty list: the pattern's arguments then read as
- *              zeros, and one that is a text fails with U_ILLEGAL_ARGUMENT_ERROR
+ *              zeros, and one that is a text, or has a number above 63, fails with
+ *              U_ILLEGAL_ARGUMENT_ERROR
+ *
+ * The same error has a pattern whose messages nest deeper than 8 levels (those of choice, plural
+ * and select below the pattern itself), so that every pattern can be formatted on a stack of 64
+ * KiB. Dates, times, plurals and worded numbers have it when the locale's name is none: one that
+ * ICU's parser cannot read or that is longer than ULOC_FULLNAME_CAPACITY, or its keywords than
+ * ULOC_KEYWORD_AND_VALUES_CAPACITY. Where the default locale has such a name, so have all arguments
+ * with a type, and bundles.
+ *
  * @return the text, or null: on a failure, whose ICU code is then in message->error (a success does
  *         not clear it), and when the text is empty
  */

@@ -42,6 +42,9 @@ QLX_API uint8_t QlxCmpParms(const Parm *a, const Parm *b);
  * type: Bool     "true" or "false" in any case, nothing else Char     any value; its first byte, 0
  * for an empty value Int, Long, Float, Double  what sscanf() reads with "%d", "%lld", "%f", "%lf":
  * blanks may come before, anything may follow Otherwise the result is 0.
+ *
+ * A whole number that its type has no room for counts as read and is another one: of an Int the low
+ * 32 bits, so that "3000000000" is -1294967296; beyond 64 bits, the low bits of the nearest Long.
  */
 
 /** @return a copy of the value, or null */

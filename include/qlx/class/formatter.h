@@ -17,10 +17,11 @@ QLX_API void QlxBasicFormatterFCfgChange(QlxObject *formatter, const char *key);
 /**
  * The event as one line: its time, source location, product properties and message, with the
  * formatter's separator after each but the message, and a line feed. Deliberate: the formatter's
- * locale is set on the event and stays there.
+ * locale is set on the event and stays there. What cannot be appended, for want of memory, is left
+ * out of the line, and so is a message that cannot be bound.
  *
  * @return the line; null for a null event, for an object that is no formatter or whose class has no
- *         fBindMsg, and when memory ran out
+ *         fBindMsg, and when there was no memory for any of it
  */
 QLX_API UChar *QlxBasicUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args);
 
@@ -39,7 +40,8 @@ QLX_API char *QlxBasicFormatterFGetTrailer(QlxObject *formatter);
  * it: -330 minutes are "-05:-30", -30 are "+00:-30".
  *
  * @param time  milliseconds since 1970-01-01 UTC
- * @return the text, empty for an empty pattern; null when memory ran out
+ * @return the text, empty for an empty pattern; null when memory ran out, and when ICU has no date
+ *         format for the default locale (as for "de@numbers=nonsense")
  */
 QLX_API UChar *QlxBasicUFormatterFormatDate(QlxObject *formatter, double time);
 
@@ -51,7 +53,7 @@ QLX_API UChar *QlxBasicUFormatterFormatDate(QlxObject *formatter, double time);
 QLX_API void *QlxPDXMLFormatterFAllocVars(void);
 /** Null is ignored. */
 QLX_API void QlxPDXMLFormatterFFreeVars(void *vars);
-/** The six flags, and the basic formatter's keys. */
+/** The six flags, and the basic formatter's keys. Without variables the flags have no effect. */
 QLX_API void QlxPDXMLFormatterFCfgChange(QlxObject *formatter, const char *key);
 /** @return the record; null for a null event, for a formatter without variables or of another kind,
  *          and when memory ran out */
@@ -69,7 +71,8 @@ QLX_API char *QlxPDXMLFormatterFGetTrailer(QlxObject *formatter);
  * Deliberate: the class has no fCfgChange, so no key reaches its objects, not even "logging". The
  * date pattern and the locale of a formatter that has them all the same do count.
  *
- * @return the line; null when the formatter or the event is null, and when memory ran out
+ * @return the line; null when the formatter or the event is null, for an object that is no
+ * formatter, and when memory ran out
  */
 QLX_API UChar *QlxVexTraceUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args);
 

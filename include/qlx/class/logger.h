@@ -2,7 +2,7 @@
  * @file
  * The way of a log call below the lock, for class operations and for code that takes the lock
  * itself (qlx/class/toolkit.h). None of these takes the lock or tests the threshold, unless it says
- * so. `result` and `args` may be null.
+ * so. `result` and `args` may be null; what the result tells is said in qlx/logger.h.
  */
 #ifndef QLX_CLASS_LOGGER_H
 #define QLX_CLASS_LOGGER_H
@@ -47,7 +47,8 @@ QLX_API void *QlxPDLoggerFAllocVars(void);
 QLX_API void QlxPDLoggerFFreeVars(void *vars);
 
 /** The seven values that are stamped, and the basic logger's keys. Deliberate: an absent value is
- *  not stamped, also not "server" and "serverFormat", which have a value at first. */
+ *  not stamped, also not "server" and "serverFormat", which have a value at first. Without
+ * variables the seven have no effect and the others do. */
 QLX_API void QlxPDLoggerFCfgChange(QlxObject *logger, const char *key);
 
 /** Sets the values, "processId" and "threadId" as properties of the event, over those it has, and,

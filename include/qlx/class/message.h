@@ -20,7 +20,8 @@ QLX_API UChar *qlxIntlBindUI18Msg(I18Msg *message, va_list *args);
 /** @return the message's parameter list, owned by it and made on first use; null for null */
 QLX_API ParmList *qlxGetI18MsgParmList(I18Msg *message);
 
-/** Replaces the locale by a copy (null clears it), for a message that has no copy. Null ignored. */
+/** Replaces the locale by a copy (null clears it, and so does a lack of memory), for a message that
+ *  has no copy. Null ignored. */
 QLX_API void qlxSetI18MsgLocale(I18Msg *message, const char *locale);
 
 /** Writes the text and a line feed in the default code page; null stream or text: nothing. */

@@ -242,6 +242,25 @@ TYPED_TEST(LongContainerTest, LosesFromEveryPlaceOnlyWhatIsRemoved) {
   }
 }
 
+// Between the sizes at which an index ends and is made: those with one have all their nodes in it.
+TYPED_TEST(LongContainerTest, FindsWhatIsAddedAfterItHasShrunk) {
+  for (int left = 0; left < kIndexedFrom; ++left) {
+    TypeParam container;
+    std::swap(container.head, this->container.head);
+    this->fill(kIndexedFrom);
+    std::vector<int> gone;
+    for (int i = left; i < kIndexedFrom; ++i) {
+      this->container.remove(i);
+      gone.push_back(i);
+    }
+    for (int i = kIndexedFrom; i < 2 * kIndexedFrom; ++i) {
+      ASSERT_EQ(this->container.put(i, 0), 1);
+      this->expect(i + 1, gone);
+    }
+    std::swap(container.head, this->container.head);
+  }
+}
+
 // What the random changes should lead to.
 class Expected {
  public:

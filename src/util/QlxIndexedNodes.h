@@ -30,7 +30,7 @@ struct QlxIndexedNodes : QlxNodes<Head, Node> {
   static void linkAtTail(Node *node) {
     Nodes::linkAtTail(node);
     QlxIndex &index = indexOf(node->owner);
-    if (++index.count < kIndexedFrom) return;
+    if (++index.count < kIndexedFrom && !index.slots) return;
     const bool fresh = !index.slots;
     if (!qlxIndexReserve(&index)) return;
     for (Node *each = fresh ? node->owner->head : node; each; each = each->next) {

@@ -2,8 +2,6 @@
 // passing an event on and reacting to the common configuration keys.
 #include "QlxObject.h"
 
-#include <array>
-
 #include <qlx/class/containers.h>
 #include <qlx/class/filter.h>
 #include <qlx/class/handler.h>
@@ -16,6 +14,7 @@
 #include "QlxLocked.h"
 #include "QlxLoggedEvent.h"
 #include "QlxProps.h"
+#include "util/QlxGroupWalk.h"
 
 static ListenerGroup **groupField(QlxObject *object) {
   if (!object || !object->objClass) return nullptr;
@@ -60,61 +59,6 @@ ListenerGroupNode *qlxIntlGetListeners(QlxObject *object) {
 
 // ---- Passing an event on
 
-namespace {
-
-// Counted references to a group's members, so that an operation may change the group meanwhile.
-// Without memory for all of them: to the first few.
-class Snapshot {
- public:
-  Snapshot(const ListenerGroupNode *head, size_t needed) {
-    if (needed > few_.size()) {
-      many_.reset(static_cast<QlxObject **>(
-          OslMemoryMalloc(static_cast<uint32_t>(needed * sizeof(QlxObject *)))));
-      if (many_) members_ = many_.get();
-    }
-    const size_t room = many_ ? needed : few_.size();
-    for (; head && count_ < room; head = head->next) {
-      members_[count_++] = qlxIntlAcquireObject(head->value);
-    }
-  }
-  ~Snapshot() {
-    for (QlxObject *member : *this) qlxIntlReleaseObject(member);
-  }
-  Snapshot(const Snapshot &) = delete;
-  Snapshot &operator=(const Snapshot &) = delete;
-
-  QlxObject **begin() const { return members_; }
-  QlxObject **end() const { return members_ + count_; }
-  size_t size() const { return count_; }
-
- private:
-  std::array<QlxObject *, 16> few_;
-  Owned<QlxObject *, OslMemoryFree> many_;
-  QlxObject **members_ = few_.data();
-  size_t count_ = 0;
-};
-
-}  // namespace
-
-static size_t countFrom(const ListenerGroupNode *node) {
-  size_t count = 0;
-  for (; node; node = node->next) ++count;
-  return count;
-}
-
-static ListenerGroupNode *nodeOf(QlxObject *listener, QlxObject *object) {
-  return QlxListenerGroupGetLink(qlxFetchListenerGroup(object, 0), listener);
-}
-
-// The listener after the last of these that is still there.
-static QlxObject *listenerAfter(const Snapshot &listeners, QlxObject *object) {
-  for (QlxObject **last = listeners.end(); last != listeners.begin();) {
-    const ListenerGroupNode *node = nodeOf(*--last, object);
-    if (node) return node->next ? node->next->value : nullptr;
-  }
-  return nullptr;
-}
-
 // The operations that take an event whose source is only noted, and settle it where they have to.
 static bool asksForNotedSource(fProcess process) {
   return process == QlxFileUHandlerFProcess || process == QlxMultiProcFileUHandlerFProcess ||
@@ -129,35 +73,25 @@ static void passTo(QlxObject *listener, Event *event, va_list *args) {
   objClass->op1.fProcess(listener, event, args);
 }
 
-// Passes an event to the listeners from a node on, to no more than `left`. Returns the one that is
-// next where memory was short for all of them.
-static ObjectRef passToSome(const ListenerGroupNode *node, size_t &left, QlxObject *object,
-                            Event *event, va_list *args) {
-  const Snapshot listeners(node, left);
-  for (QlxObject *listener : listeners) passTo(listener, event, args);
-  left -= listeners.size();
-  return ObjectRef{left > 0 ? qlxIntlAcquireObject(listenerAfter(listeners, object)) : nullptr};
-}
-
-static void passToAll(const ListenerGroupNode *head, QlxObject *object, Event *event,
-                      va_list *args) {
-  size_t left = countFrom(head);
-  ObjectRef next = passToSome(head, left, object, event, args);
-  while (next) next = passToSome(nodeOf(next.get(), object), left, object, event, args);
+// One that is removed before its turn is left out, one that is added gets the event at the end, and
+// none gets it twice. Those that had it and are removed are released when all have it.
+static void passToAll(QlxObject *object, Event *event, va_list *args) {
+  QlxGroupWalk<ListenerGroup, ListenerGroupNode> walk;
+  while (const ListenerGroupNode *node = walk.step(qlxFetchListenerGroup(object, 0))) {
+    const ObjectRef listener{qlxIntlAcquireObject(node->value)};
+    passTo(listener.get(), event, args);
+  }
+  while (const auto removed = walk.takePassed()) qlxIntlReleaseObject(removed->value);
 }
 
 void QlxBasicObjectFLog(QlxObject *object, Event *event, va_list *args) {
   if (!object || !loadEnabled(object)) return;
-  ListenerGroupNode *head = qlxIntlGetListeners(object);
   // A chain that leads back to an object on the current path ends there; an object that two
   // branches reach gets the event twice.
-  if (!head || (object->marks & kMarkPassing)) return;
+  if (!qlxIntlGetListeners(object) || (object->marks & kMarkPassing)) return;
   object->marks |= kMarkPassing;
   const ObjectRef held{qlxIntlAcquireObject(object)};
-  if (head->next)
-    passToAll(head, object, event, args);
-  else
-    passTo(ObjectRef{qlxIntlAcquireObject(head->value)}.get(), event, args);
+  passToAll(object, event, args);
   object->marks &= static_cast<uint8_t>(~kMarkPassing);
 }
 

@@ -6,22 +6,28 @@
 #ifndef QLX_SRC_QLXGROUPTEMPLATE_H
 #define QLX_SRC_QLXGROUPTEMPLATE_H
 
-#include "QlxIndexedNodes.h"
+#include "QlxGroupWalk.h"
+
+template <typename Container, typename Elements,
+          typename Walk = QlxGroupWalk<typename Elements::Head, typename Elements::Node>>
+using QlxGroupNodes = QlxIndexedNodes<Container, typename Elements::Head, typename Elements::Node,
+                                      typename Walk::HeadBlock, typename Walk::NodeBlock>;
 
 template <typename Elements>
-struct QlxGroupTemplate : QlxIndexedNodes<QlxGroupTemplate<Elements>, typename Elements::Head,
-                                          typename Elements::Node> {
+struct QlxGroupTemplate : QlxGroupNodes<QlxGroupTemplate<Elements>, Elements> {
   using Head = typename Elements::Head;
   using Node = typename Elements::Node;
   using Element = typename Elements::Element;
   using Parameter = typename Elements::Parameter;
-  using Nodes = QlxIndexedNodes<QlxGroupTemplate, Head, Node>;
+  using Nodes = QlxGroupNodes<QlxGroupTemplate, Elements>;
+  using Walk = QlxGroupWalk<Head, Node>;
 
   static Head *alloc() { return Nodes::newHead(); }
 
   static void free(Head *group) {
     if (!group) return;
     while (group->head) removeNode(group->head);
+    Walk::freed(group);
     OslMemoryFree(group);
   }
 
@@ -33,6 +39,7 @@ struct QlxGroupTemplate : QlxIndexedNodes<QlxGroupTemplate<Elements>, typename E
     if (!node) return 0;
     node->value = Elements::copyIn(element);
     if (!node->value) return 0;
+    Walk::linked(node.get());
     Nodes::linkAtTail(node.release());
     return 1;
   }
@@ -59,10 +66,12 @@ struct QlxGroupTemplate : QlxIndexedNodes<QlxGroupTemplate<Elements>, typename E
   static bool equal(Parameter a, Parameter b) { return Elements::match(a, b); }
 
  private:
-  // Out of the chain first: disposing of an element may come back to the group.
+  // Out of the chain first: disposing of an element may come back to the group. A walk that has
+  // passed the node disposes of it at its end.
   static void removeNode(Node *node) {
-    const auto removed = Nodes::unlink(node);
-    Elements::dispose(removed->value);
+    auto removed = Nodes::unlink(node);
+    Walk::unlinked(removed);
+    if (removed) Elements::dispose(removed->value);
   }
 };
 

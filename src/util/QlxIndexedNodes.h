@@ -1,19 +1,27 @@
 // A chain of nodes that are found by a key: short ones are walked, long ones have an index, which
 // stands behind the head in the head's own block. `Container` says what a node's key is and how
 // keys compare: Key keyOf(Node *), uint32_t hashOf(Key), bool equal(Key, Key); no key is null.
+// HeadBlock and NodeBlock are what heads and nodes are allocated as; a head's has the index.
 #ifndef QLX_SRC_QLXINDEXEDNODES_H
 #define QLX_SRC_QLXINDEXEDNODES_H
 
 #include "QlxIndex.h"
 #include "QlxNodes.h"
 
-template <typename Container, typename Head, typename Node>
-struct QlxIndexedNodes : QlxNodes<Head, Node> {
-  using Nodes = QlxNodes<Head, Node>;
+template <typename Head>
+struct QlxIndexedHead {
+  Head head;
+  QlxIndex index;
+};
+
+template <typename Container, typename Head, typename Node,
+          typename HeadBlock = QlxIndexedHead<Head>, typename NodeBlock = Node>
+struct QlxIndexedNodes : QlxNodes<Head, Node, NodeBlock> {
+  using Nodes = QlxNodes<Head, Node, NodeBlock>;
 
   static Head *newHead() {
     return reinterpret_cast<Head *>(
-        static_cast<HeadAndIndex *>(OslMemoryCalloc(1, sizeof(HeadAndIndex))));
+        static_cast<HeadBlock *>(OslMemoryCalloc(1, sizeof(HeadBlock))));
   }
 
   // The chain's first node with that key. One who writes into nodes behind the back of a long
@@ -49,12 +57,7 @@ struct QlxIndexedNodes : QlxNodes<Head, Node> {
  private:
   static constexpr uint32_t kIndexedFrom = 17;  // nodes; fewer are walked as fast
 
-  struct HeadAndIndex {
-    Head head;
-    QlxIndex index;
-  };
-
-  static QlxIndex &indexOf(Head *head) { return reinterpret_cast<HeadAndIndex *>(head)->index; }
+  static QlxIndex &indexOf(Head *head) { return reinterpret_cast<HeadBlock *>(head)->index; }
 
   static auto keyOf(const void *node) { return Container::keyOf(static_cast<const Node *>(node)); }
   static uint32_t hashOf(const void *node) { return Container::hashOf(keyOf(node)); }

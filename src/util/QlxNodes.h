@@ -8,7 +8,8 @@
 
 #include "CxOwned.h"
 
-template <typename Head, typename Node>
+// Block is what a node is allocated as: the node, and behind it what hosts do not see.
+template <typename Head, typename Node, typename Block = Node>
 struct QlxNodes {
   using OwnedNode = Owned<Node, OslMemoryFree>;
 
@@ -16,7 +17,7 @@ struct QlxNodes {
 
   // A node of that owner, not linked yet.
   static OwnedNode newNode(Head *owner) {
-    OwnedNode node{static_cast<Node *>(OslMemoryCalloc(1, sizeof(Node)))};
+    OwnedNode node{static_cast<Node *>(OslMemoryCalloc(1, sizeof(Block)))};
     if (node) node->owner = owner;
     return node;
   }

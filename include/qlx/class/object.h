@@ -74,8 +74,14 @@ QLX_API ObjClass *qlxInitObjectClass(const char *className, int32_t kind, I18Msg
 /** Frees a record that is not registered; null is ignored. */
 QLX_API void qlxFreeObjClass(ObjClass *objClass);
 
-/** Passes the event to the listeners that are filters or handlers, in order; none if disabled. A
- *  listener that is added or removed meanwhile counts from the next event on. */
+/**
+ * Passes the event to the listeners that are filters or handlers, in order; none if disabled.
+ *
+ * The operation of a listener may change the listeners. One that is removed before its turn does
+ * not get the event; one that is added gets it at the end, up to ten thousand of them. None gets it
+ * twice, also when it is removed and added again, or the group is replaced ("listenerNames"). The
+ * group's reference to a listener that had the event and is removed is given back after the pass.
+ */
 QLX_API void QlxBasicObjectFLog(QlxObject *object, Event *event, va_list *args);
 
 /**

@@ -2,6 +2,10 @@
  * @file
  * The groups, lists and maps of the library: doubly linked nodes in the order of insertion. A group
  * holds no element twice, a list may and counts its nodes, a map finds values by name.
+ *
+ * Heads and nodes are read only, and both are made by the functions here alone: the functions keep
+ * more behind their fields than a caller sees. A head of another origin, one on a stack or a copied
+ * record, is written past; one who writes into a node hides its element from lookups.
  */
 #ifndef QLX_CONTAINERS_H
 #define QLX_CONTAINERS_H

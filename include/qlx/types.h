@@ -1,8 +1,8 @@
 /**
  * @file
  * The plain types that the subsystems share. Records are open: hosts and host classes read and
- * write their fields. A field says unit, owner, initial value and who changes it where that is not
- * plain.
+ * write their fields, but only read those of containers. A field says unit, owner, initial value
+ * and who changes it where that is not plain.
  *
  * "Owned" means: allocated with OslMemoryMalloc() and freed together with the record.
  */

@@ -23,14 +23,17 @@
 
 QLX_BEGIN_DECLS
 
-/** A list; head is null exactly when tail is null. */
+/**
+ * A list; head is null exactly when tail is null. Read only. More lies behind these fields, so a
+ * list is made by QlxAllocParmList() and QlxCopyParmList() alone.
+ */
 struct ParmList {
   ParmListNode *head, *tail;
   /** Number of nodes. */
   int32_t count;
 };
 
-/** One element of a list. */
+/** One element of a list; made by the list alone. Read only. */
 struct ParmListNode {
   ParmListNode *next, *prev;
   /** As stored, disposed of with the node. */

@@ -23,12 +23,15 @@
 
 QLX_BEGIN_DECLS
 
-/** A group; head is null exactly when tail is null. */
+/**
+ * A group; head is null exactly when tail is null. Read only. More lies behind these fields, so a
+ * group is made by QlxAllocStringGroup() alone.
+ */
 struct StringGroup {
   StringGroupNode *head, *tail;
 };
 
-/** One element of a group. */
+/** One element of a group; made by the group alone. Read only. */
 struct StringGroupNode {
   StringGroupNode *next, *prev;
   /** As stored, disposed of with the node. */

@@ -23,12 +23,15 @@
 
 QLX_BEGIN_DECLS
 
-/** A map; head is null exactly when tail is null. */
+/**
+ * A map; head is null exactly when tail is null. Read only. More lies behind these fields, so a
+ * map is made by QlxAllocStringToObjMap() and QlxCopyStringToObjMap() alone.
+ */
 struct StringToObjMap {
   StringToObjMapNode *head, *tail;
 };
 
-/** One key of a map and its value. */
+/** One key of a map and its value; made by the map alone. Read only. */
 struct StringToObjMapNode {
   StringToObjMapNode *next, *prev;
   /** Owned, never null. */

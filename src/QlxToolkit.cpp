@@ -54,17 +54,22 @@ static StringGroup *namesOfKind(int32_t kind) {
   return kind >= Logger && kind < Logger + kKinds ? gToolkit.names[kind - Logger] : nullptr;
 }
 
+// A record may stand there under several names.
+static bool isListedFrom(const StringToObjClassMapNode *node, const ObjClass *objClass) {
+  while (node && node->value != objClass) node = node->next;
+  return node;
+}
+
 void qlxToolkitAddClassDef(const char *className, ObjClass *objClass) {
   if (!objClass) return;
   qlxToolkitInitObjClasses();
-  if (qlxToolkitGetClassDef(objClass->name) == objClass) return;
-  // Under its own name only: each record is freed once. The first of a name stays; it may be a
-  // built-in class that was registered just now.
-  if (OslStringCmp(objClass->name, className) != 0 || qlxToolkitGetClassDef(className) ||
-      !qlxIntlStringToObjClassMapPut(gToolkit.classes, className, objClass)) {
-    return qlxFreeObjClass(objClass);
+  // The first of a name stays; it may be a built-in class that was registered just now.
+  if (!qlxToolkitGetClassDef(className) &&
+      qlxIntlStringToObjClassMapPut(gToolkit.classes, className, objClass)) {
+    qlxIntlStringGroupAdd(namesOfKind(objClass->kind), className);
+  } else if (!isListedFrom(qlxIntlStringToObjClassMapIterator(gToolkit.classes), objClass)) {
+    qlxFreeObjClass(objClass);
   }
-  qlxIntlStringGroupAdd(namesOfKind(objClass->kind), className);
 }
 
 ObjClass *qlxToolkitGetClassDef(const char *className) {
@@ -78,7 +83,7 @@ StringGroupNode *qlxToolkitFetchClassnames(int32_t kind) {
 static void freeClasses() {
   for (StringToObjClassMapNode *it = qlxIntlStringToObjClassMapIterator(gToolkit.classes); it;
        it = it->next) {
-    qlxFreeObjClass(it->value);
+    if (!isListedFrom(it->next, it->value)) qlxFreeObjClass(it->value);
   }
   qlxIntlFreeStringToObjClassMap(gToolkit.classes);
   gToolkit.classes = nullptr;

@@ -196,20 +196,47 @@ TEST_F(ToolkitLifeTest, ASecondRecordOfANameIsFreed) {
   EXPECT_EQ(qlxToolkitGetClassDef("twice"), first);
 }
 
-TEST_F(ToolkitLifeTest, ARecordIsRegisteredUnderItsOwnNameOnly) {
+TEST_F(ToolkitLifeTest, ARecordIsRegisteredUnderTheGivenName) {
+  open();
+  {
+    const ApiLock lock;
+    ObjClass *record = qlxInitObjectClass("own", Logger, nullptr, nullptr, nullptr, nullptr);
+    qlxToolkitAddClassDef("other", record);
+    EXPECT_EQ(qlxToolkitGetClassDef("other"), record);
+    EXPECT_EQ(qlxToolkitGetClassDef("own"), nullptr);
+  }
+  EXPECT_EQ(classNames(101), "qlx_basiclogger|qlx_pdlogger|other|");
+}
+
+TEST_F(ToolkitLifeTest, ARecordOfSeveralNamesIsFreedOnce) {
+  open();
+  const FailingMemory memory;
+  {
+    const ApiLock lock;
+    ObjClass *record = qlxInitObjectClass("own", Logger, nullptr, nullptr, nullptr, nullptr);
+    for (const char *name : {"own", "second", "own", "second"}) qlxToolkitAddClassDef(name, record);
+    qlxToolkitAddClassDef("qlx_pdlogger", record);  // taken: the record is the registry's already
+    qlxToolkitAddClassDef(nullptr, record);
+    EXPECT_EQ(qlxToolkitGetClassDef("own"), record);
+    EXPECT_EQ(qlxToolkitGetClassDef("second"), record);
+    EXPECT_NE(qlxToolkitGetClassDef("qlx_pdlogger"), record);
+  }
+  EXPECT_EQ(classNames(101), "qlx_basiclogger|qlx_pdlogger|own|second|");
+  const int64_t held = memory.live();
+  EXPECT_GT(held, 0);
+  QlxCloseToolkit();
+  EXPECT_LE(memory.live(), 0);
+}
+
+TEST_F(ToolkitLifeTest, ARecordThatIsNotRegisteredIsFreed) {
   open();
   const ApiLock lock;
   const FailingMemory memory;
-  ObjClass *own = qlxInitObjectClass("own", Logger, nullptr, nullptr, nullptr, nullptr);
-  qlxToolkitAddClassDef("own", own);
-  const int64_t held = memory.live();
-  qlxToolkitAddClassDef("other", own);
-  ObjClass *free = qlxInitObjectClass("free", Logger, nullptr, nullptr, nullptr, nullptr);
-  qlxToolkitAddClassDef("other", free);
-  EXPECT_EQ(qlxToolkitGetClassDef("other"), nullptr);
-  EXPECT_EQ(qlxToolkitGetClassDef("free"), nullptr);
-  EXPECT_EQ(qlxToolkitGetClassDef("own"), own);
-  EXPECT_EQ(memory.live(), held);
+  for (const char *name : {"qlx_basiclogger", static_cast<const char *>(nullptr)}) {
+    ObjClass *record = qlxInitObjectClass("own", Logger, nullptr, nullptr, nullptr, nullptr);
+    qlxToolkitAddClassDef(name, record);
+    EXPECT_EQ(memory.live(), 0);
+  }
 }
 
 TEST_F(ToolkitLifeTest, InitialisingTheClassesAgainDoesNothing) {

@@ -27,9 +27,9 @@ QLX_API QlxObject *qlxToolkitLogger(void);
 /** @return the registered class, borrowed, or null; null for a null name */
 QLX_API ObjClass *qlxToolkitGetClassDef(const char *className);
 
-/** Hands a class record to the registry, which owns it from then on; the first one of a name stays
- *  and another is freed, as is one whose own name is not `className`. A null record and one that is
- *  registered already are ignored. */
+/** Registers a class record under a name, its own or another; the registry owns it from then on.
+ *  The first one of a name stays, and a record that is registered nowhere is freed. A null record
+ * is ignored. */
 QLX_API void qlxToolkitAddClassDef(const char *className, ObjClass *objClass);
 
 /** Makes the registries and registers the built-in classes, once. */

@@ -163,12 +163,12 @@ void qlxIntlLogMgrRemCfg(ObjCfg *cfg) {
   if (!cfg || !qlxIntlLogMgrHasCfg(cfg->name)) return;
   const ObjCfgRef removed{qlxIntlStringToObjCfgMapGet(gLogMgr.configs, cfg->name)};
   qlxIntlStringToObjCfgMapRem(gLogMgr.configs, removed->name);
-  if (removed->parentName) {
-    if (const ObjCfgRef parent{fetchParent(removed.get())}) {
-      qlxIntlObjCfgRemChild(parent.get(), removed.get());
-      forEachChild(removed.get(),
-                   [&](ObjCfg *child) { moveChild(removed.get(), parent.get(), child); });
+  if (const ObjCfgRef parent{fetchParent(removed.get())}) {
+    for (ObjCfg *lister : {parent.get(), removed.get()}) {
+      qlxIntlObjCfgRemChild(lister, removed.get());
     }
+    forEachChild(removed.get(),
+                 [&](ObjCfg *child) { moveChild(removed.get(), parent.get(), child); });
   }
   qlxIntlStringGroupRem(gLogMgr.configNames, removed->name);
 }

@@ -52,12 +52,18 @@ void qlxIntlObjCfgSetFromFile(ObjCfg *cfg, uint8_t flag) {
   if (cfg) cfg->fromFile = flag;
 }
 
+static bool isParentNamed(const ObjCfg *cfg, const char *name) {
+  return OslStringCmp(cfg->parentName, name) == 0;
+}
+
+// One that names itself as its parent makes no namesake.
 ObjCfg *qlxIntlObjCfgGetParent(ObjCfg *cfg) {
-  return cfg ? qlxIntlLogMgrGetCfg(cfg->parentName) : nullptr;
+  if (!cfg || (isParentNamed(cfg, cfg->name) && !qlxIntlLogMgrHasCfg(cfg->name))) return nullptr;
+  return qlxIntlLogMgrGetCfg(cfg->parentName);
 }
 
 void qlxSetParentName(ObjCfg *cfg, const char *parentName) {
-  if (OslStringCmp(cfg->parentName, parentName) == 0) return;
+  if (isParentNamed(cfg, parentName)) return;
   char *copy = OslStringDup(parentName);
   if (!copy) return;
   const OwnedStr old{cfg->parentName};
@@ -97,8 +103,8 @@ StringToStringMapNode *qlxIntlObjCfgProperties(ObjCfg *cfg) {
 // the log manager keeps that configuration.
 static const char *peekInherited(ObjCfg *cfg, const char *key) {
   ObjCfgRef current{qlxIntlAcquireObjCfg(cfg)};
-  // Brent's cycle test: `mark` moves up to the walker at every power of two, so a chain of parents
-  // that comes back to itself meets it.
+  // A chain of parents may come back to itself: to the first one, which need not be registered, by
+  // its name; to another one by Brent's test: `mark` moves up to the walker at every power of two.
   const ObjCfg *mark = nullptr;
   for (uint32_t steps = 0, limit = 1; current && current.get() != mark; ++steps) {
     if (const char *value = qlxPeekMapProp(current->props, key)) return value;
@@ -106,6 +112,7 @@ static const char *peekInherited(ObjCfg *cfg, const char *key) {
       limit *= 2;
       mark = current.get();
     }
+    if (isParentNamed(current.get(), cfg->name)) break;
     current.reset(qlxIntlObjCfgGetParent(current.get()));
   }
   return nullptr;

@@ -289,12 +289,33 @@ TEST_F(LogManagerTest, RemovingATopLevelOneMovesNothing) {
   EXPECT_EQ(QlxLogMgrHasCfg("a.b"), 1);
 }
 
-TEST_F(LogManagerTest, RemovingOneWithoutAStoredParentComputesNone) {
+TEST_F(LogManagerTest, RemovingOneWithoutAStoredParentMovesTheChildrenToTheNearestPrefix) {
   const Config abc = registered("a.b.c"), abcd = registered("a.b.c.d"), a = registered("a");
-  QlxLogMgrRemCfg(abc.get());
   EXPECT_EQ(parentNameOf(abc), "<null>");
-  EXPECT_EQ(parentNameOf(abcd), "a.b.c");
-  EXPECT_EQ(childrenOf(a), "");
+  QlxLogMgrRemCfg(abc.get());
+  EXPECT_EQ(parentNameOf(abc), "a");
+  EXPECT_EQ(parentNameOf(abcd), "a");
+  EXPECT_EQ(childrenOf(a), "a.b.c.d|");
+  EXPECT_EQ(childrenOf(abc), "");
+}
+
+TEST_F(LogManagerTest, RemovingOneThatNamesItselfMakesNoNamesakeAndMovesNothing) {
+  const Config a = registered("a"), ab = registered("a.b");
+  QlxObjCfgSetParent(a.get(), a.get());
+  QlxLogMgrRemCfg(a.get());
+  EXPECT_EQ(QlxLogMgrHasCfg("a"), 0);
+  EXPECT_EQ(parentNameOf(ab), "a");
+  EXPECT_EQ(childrenOf(a), "a.b|");
+}
+
+TEST_F(LogManagerTest, RemovingOneThatIsItsOwnChildMakesNoNamesake) {
+  const Config p = registered("p"), a = registered("a"), child = registered("c");
+  link(a, a);
+  link(a, child);
+  QlxObjCfgSetParent(a.get(), p.get());
+  QlxLogMgrRemCfg(a.get());
+  EXPECT_EQ(QlxLogMgrHasCfg("a"), 0);
+  EXPECT_EQ(childrenOf(p), "c|");
 }
 
 TEST_F(LogManagerTest, RemovingReleasesTheRegistrysReference) {

@@ -303,12 +303,36 @@ TEST_F(ObjConfigTest, ALookupEndsWhereAParentChainComesBack) {
   for (const Config *cfg : {&a, &b, &c, &d}) EXPECT_EQ(inherited(*cfg, "key"), "value");
 }
 
-TEST_F(ObjConfigTest, AnUnregisteredOneThatNamesItselfFindsTheRegisteredOne) {
+TEST_F(ObjConfigTest, ALookupEndsAtOneThatNamesItself) {
   const Config known = registered("a"), unregistered = make("a");
   QlxObjCfgSetParent(unregistered.get(), known.get());
-  EXPECT_EQ(inherited(unregistered, "key"), "<null>");
   QlxSetObjCfgProp(known.get(), "key", "value");
-  EXPECT_EQ(inherited(unregistered, "key"), "value");
+  EXPECT_EQ(inherited(unregistered, "key"), "<null>");
+  QlxSetObjCfgProp(unregistered.get(), "key", "own");
+  EXPECT_EQ(inherited(unregistered, "key"), "own");
+}
+
+TEST_F(ObjConfigTest, OneThatNamesItselfMakesNoNamesake) {
+  const Config cfg = make("a"), copy = make("a");
+  QlxObjCfgSetParent(cfg.get(), copy.get());
+  EXPECT_EQ(inherited(cfg, "key"), "<null>");
+  EXPECT_EQ(QlxGetObjCfgPropInt(cfg.get(), "key", nullptr), 0);
+  EXPECT_EQ(QlxObjCfgGetParent(cfg.get()), nullptr);
+  EXPECT_EQ(QlxLogMgrHasCfg("a"), 0);
+  const Config known = registered("a");
+  QlxObjCfgSetParent(known.get(), cfg.get());
+  const Config parent{QlxObjCfgGetParent(known.get())};
+  EXPECT_EQ(parent, known);
+}
+
+TEST_F(ObjConfigTest, AChainThatComesBackToAnUnregisteredOneMakesNoNamesake) {
+  const Config a = make("a"), b = registered("b"), c = registered("c");
+  QlxObjCfgSetParent(a.get(), b.get());
+  QlxObjCfgSetParent(b.get(), c.get());
+  QlxObjCfgSetParent(c.get(), a.get());
+  EXPECT_EQ(inherited(a, "key"), "<null>");
+  EXPECT_EQ(QlxLogMgrHasCfg("a"), 0);
+  EXPECT_EQ(configNames().find("|a|"), std::string::npos);
 }
 
 // ---- The typed family

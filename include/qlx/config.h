@@ -35,7 +35,8 @@ QLX_API char *QlxObjCfgGetName(ObjCfg *cfg);
 QLX_API uint8_t QlxObjCfgIsFromFile(ObjCfg *cfg);
 QLX_API void QlxObjCfgSetFromFile(ObjCfg *cfg, uint8_t flag);
 
-/** @return the parent, which the log manager makes when it is missing; null directly under "/" */
+/** @return the parent, which the log manager makes when it is missing; null directly under "/", and
+ *  for an unregistered one that names itself */
 QLX_API ObjCfg *QlxObjCfgGetParent(ObjCfg *cfg);
 
 /** Records the parent's name. Does not make `cfg` a child of it: see QlxObjCfgAddChild(). */

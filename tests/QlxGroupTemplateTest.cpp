@@ -2,32 +2,15 @@
 #include <string>
 #include <thread>
 
+#include "support/ContainerApis.h"
 #include "support/ContainerTest.h"
 
 namespace {
 
-#define GROUP_API(Prefix, Name, Kind)                          \
-  struct Prefix##Name##Api {                                   \
-    static constexpr char kName[] = #Prefix #Name;             \
-    using Twins = struct qlxIntl##Name##Api;                   \
-    using Head = Name;                                         \
-    using Elements = Kind;                                     \
-    static constexpr auto alloc = Prefix##Alloc##Name;         \
-    static constexpr auto free = Prefix##Free##Name;           \
-    static constexpr auto add = Prefix##Name##Add;             \
-    static constexpr auto rem = Prefix##Name##Rem;             \
-    static constexpr auto iterator = Prefix##Name##Iterator;   \
-    static constexpr auto hasNext = Prefix##Name##IterHasNext; \
-    static constexpr auto next = Prefix##Name##IterNext;       \
-    static constexpr auto get = Prefix##Name##IterGet;         \
-    static constexpr auto iterRem = Prefix##Name##IterRem;     \
-    static constexpr auto getLink = Qlx##Name##GetLink;        \
-  }
 GROUP_API(Qlx, StringGroup, Strings);
 GROUP_API(qlxIntl, StringGroup, Strings);
 GROUP_API(Qlx, ListenerGroup, Objects);
 GROUP_API(qlxIntl, ListenerGroup, Objects);
-#undef GROUP_API
 
 using PublicGroups = ::testing::Types<QlxStringGroupApi, QlxListenerGroupApi>;
 using AllGroups = ::testing::Types<QlxStringGroupApi, qlxIntlStringGroupApi, QlxListenerGroupApi,

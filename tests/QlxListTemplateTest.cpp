@@ -4,6 +4,7 @@
 #include <vector>
 
 #include "QlxLocked.h"
+#include "support/ContainerApis.h"
 #include "support/ContainerTest.h"
 #include "support/WantedLeak.h"
 
@@ -24,31 +25,10 @@ struct SortedParms : Parms {
   const std::vector<int> sorted = {0, 2, 1};
 };
 
-#define LIST_API(Prefix, Name, Kind)                           \
-  struct Prefix##Name##Api {                                   \
-    static constexpr char kName[] = #Prefix #Name;             \
-    using Twins = struct qlxIntl##Name##Api;                   \
-    using Elements = Kind;                                     \
-    using Head = Name;                                         \
-    static constexpr auto alloc = Prefix##Alloc##Name;         \
-    static constexpr auto free = Prefix##Free##Name;           \
-    static constexpr auto copy = Prefix##Copy##Name;           \
-    static constexpr auto append = Prefix##Name##Append;       \
-    static constexpr auto sort = QlxSort##Name;                \
-    static constexpr auto iterator = Prefix##Name##Iterator;   \
-    static constexpr auto hasNext = Prefix##Name##IterHasNext; \
-    static constexpr auto next = Prefix##Name##IterNext;       \
-    static constexpr auto get = Prefix##Name##IterGet;         \
-    static constexpr auto iterRem = Prefix##Name##IterRem;     \
-    static constexpr auto getLink = Qlx##Name##GetLink;        \
-    static constexpr auto getIndex = Qlx##Name##GetIndex;      \
-    static constexpr auto remLink = Qlx##Name##RemLink;        \
-  }
 LIST_API(Qlx, StringList, SortedStrings);
 LIST_API(qlxIntl, StringList, SortedStrings);
 LIST_API(Qlx, ParmList, SortedParms);
 LIST_API(qlxIntl, ParmList, SortedParms);
-#undef LIST_API
 
 using PublicLists = ::testing::Types<QlxStringListApi, QlxParmListApi>;
 using AllLists =

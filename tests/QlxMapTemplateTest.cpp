@@ -2,31 +2,11 @@
 #include <functional>
 #include <thread>
 
+#include "support/ContainerApis.h"
 #include "support/ContainerTest.h"
 
 namespace {
 
-#define MAP_API(Prefix, Name, Kind)                            \
-  struct Prefix##Name##Api {                                   \
-    static constexpr char kName[] = #Prefix #Name;             \
-    using Twins = struct qlxIntl##Name##Api;                   \
-    using Elements = Kind;                                     \
-    using Head = Name;                                         \
-    static constexpr auto alloc = Prefix##Alloc##Name;         \
-    static constexpr auto free = Prefix##Free##Name;           \
-    static constexpr auto copy = Prefix##Copy##Name;           \
-    static constexpr auto put = Prefix##Name##Put;             \
-    static constexpr auto get = Prefix##Name##Get;             \
-    static constexpr auto rem = Prefix##Name##Rem;             \
-    static constexpr auto hasKey = Prefix##Name##HasKey;       \
-    static constexpr auto iterator = Prefix##Name##Iterator;   \
-    static constexpr auto hasNext = Prefix##Name##IterHasNext; \
-    static constexpr auto next = Prefix##Name##IterNext;       \
-    static constexpr auto getKey = Prefix##Name##IterGetKey;   \
-    static constexpr auto getVal = Prefix##Name##IterGetVal;   \
-    static constexpr auto getNode = qlxIntl##Name##GetNode;    \
-    static constexpr auto remNode = qlxIntl##Name##RemNode;    \
-  }
 MAP_API(Qlx, StringToStringMap, Strings);
 MAP_API(qlxIntl, StringToStringMap, Strings);
 MAP_API(Qlx, StringToObjMap, Objects);
@@ -35,7 +15,6 @@ MAP_API(Qlx, StringToObjCfgMap, Configs);
 MAP_API(qlxIntl, StringToObjCfgMap, Configs);
 MAP_API(Qlx, StringToObjClassMap, Classes);
 MAP_API(qlxIntl, StringToObjClassMap, Classes);
-#undef MAP_API
 
 using PublicMaps = ::testing::Types<QlxStringToStringMapApi, QlxStringToObjMapApi,
                                     QlxStringToObjCfgMapApi, QlxStringToObjClassMapApi>;

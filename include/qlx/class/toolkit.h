@@ -29,7 +29,7 @@ QLX_API ObjClass *qlxToolkitGetClassDef(const char *className);
 
 /** Registers a class record under a name, its own or another; the registry owns it from then on.
  *  The first one of a name stays, and a record that is registered nowhere is freed. A null record
- * is ignored. */
+ *  is ignored. */
 QLX_API void qlxToolkitAddClassDef(const char *className, ObjClass *objClass);
 
 /** Makes the registries and registers the built-in classes, once. */

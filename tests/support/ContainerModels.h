@@ -1,0 +1,558 @@
+// Every container against a simple model: a std::vector of the numbers of its elements. Each check
+// makes a walk of random operations and compares the whole chain after each of them.
+#ifndef QLX_TESTS_CONTAINERMODELS_H
+#define QLX_TESTS_CONTAINERMODELS_H
+
+#include <algorithm>
+#include <array>
+#include <cstdlib>
+#include <cstring>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include <qlx/class/object.h>
+#include <qlx/memory.h>
+#include <qlx/props.h>
+
+#include "QlxObjConfig.h"
+#include "support/Choices.h"
+#include "support/ContainerApis.h"
+#include "support/FailingMemory.h"
+#include "support/Take.h"
+#include "support/WantedLeak.h"
+
+namespace models {
+
+// ---- Elements: of each kind kCount different ones, by number. `references` counts what containers
+// and callers hold of one.
+
+constexpr int kCount = 80;
+constexpr int kNull = -1;    // the number of a null value
+constexpr int kRarely = 16;  // steps between looks at everything
+
+inline const char *text(int i) {
+  static const auto texts = [] {
+    // Two of them have the same hash.
+    std::vector<std::string> all = {"", "costarring", "liquid", "a", "A"};
+    while (all.size() < kCount) all.push_back("key" + std::to_string(all.size()));
+    return all;
+  }();
+  return texts[static_cast<size_t>(i)].c_str();
+}
+
+struct Strings {
+  static constexpr int kCopyAllocations = 1;
+  const char *at(int i) const { return text(i); }
+  bool is(const char *stored, int i) const { return stored && strcmp(stored, at(i)) == 0; }
+  void discard(char *handedOut) const { OslMemoryFree(handedOut); }
+  int references(int) const { return 0; }
+  static constexpr bool kCounted = false;
+  static int compare(const void *a, const void *b) {
+    return strcmp(*static_cast<char *const *>(a), *static_cast<char *const *>(b));
+  }
+  bool isBefore(int a, int b) const { return strcmp(at(a), at(b)) < 0; }
+};
+
+struct Parms {
+  Parms() {
+    for (int i = 0; i < kCount; ++i) {
+      parms[static_cast<size_t>(i)].type = ParmInt32;
+      parms[static_cast<size_t>(i)].value.i = i * 7 % kCount;
+    }
+  }
+  const Parm *at(int i) const { return &parms[static_cast<size_t>(i)]; }
+  bool is(const Parm *stored, int i) const { return stored && QlxCmpParms(stored, at(i)) == 1; }
+  void discard(Parm *handedOut) const { QlxFreeParm(handedOut); }
+  int references(int) const { return 0; }
+  static constexpr bool kCounted = false;
+  static constexpr int kCopyAllocations = 1;
+  static int compare(const void *a, const void *b) {
+    return (*static_cast<Parm *const *>(a))->value.i - (*static_cast<Parm *const *>(b))->value.i;
+  }
+  bool isBefore(int a, int b) const { return at(a)->value.i < at(b)->value.i; }
+
+  std::array<Parm, kCount> parms = {};
+};
+
+// Every fifth one is retired; all are held so often by somebody else that no release is the last.
+struct Objects {
+  Objects() {
+    for (int i = 0; i < kCount; ++i) {
+      at(i)->objClass = i % 5 ? &objClass : nullptr;
+      at(i)->refCount = kHeld;
+    }
+  }
+  QlxObject *at(int i) { return &objects[static_cast<size_t>(i)]; }
+  bool is(QlxObject *stored, int i) { return stored == at(i); }
+  void discard(QlxObject *handedOut) const { qlxIntlReleaseObject(handedOut); }
+  int references(int i) { return static_cast<int>(at(i)->refCount) - kHeld; }
+  static constexpr bool kCounted = true;
+  static constexpr int kCopyAllocations = 0;
+
+  static constexpr int kHeld = 10;
+  ObjClass objClass = {};
+  std::array<QlxObject, kCount> objects = {};
+};
+
+struct Configs {
+  Configs() {
+    for (int i = 0; i < kCount; ++i) configs[static_cast<size_t>(i)].reset(qlxIntlAllocObjCfg("a"));
+  }
+  ObjCfg *at(int i) const { return configs[static_cast<size_t>(i)].get(); }
+  bool is(ObjCfg *stored, int i) const { return stored == at(i); }
+  void discard(ObjCfg *handedOut) const { qlxIntlReleaseObjCfg(handedOut); }
+  int references(int i) const { return static_cast<int>(at(i)->refCount) - 1; }
+  static constexpr bool kCounted = true;
+  static constexpr int kCopyAllocations = 0;
+
+  std::array<ObjCfgRef, kCount> configs;
+};
+
+struct Classes {
+  ObjClass *at(int i) { return &classes[static_cast<size_t>(i)]; }
+  bool is(ObjClass *stored, int i) { return stored == at(i); }
+  void discard(ObjClass *) const {}
+  int references(int) const { return 0; }
+  static constexpr bool kCounted = false;
+  static constexpr int kCopyAllocations = 0;
+
+  std::array<ObjClass, kCount> classes = {};
+};
+
+GROUP_API(Qlx, StringGroup, Strings);
+GROUP_API(Qlx, ListenerGroup, Objects);
+LIST_API(Qlx, StringList, Strings);
+LIST_API(Qlx, ParmList, Parms);
+MAP_API(Qlx, StringToStringMap, Strings);
+MAP_API(Qlx, StringToObjMap, Objects);
+MAP_API(Qlx, StringToObjCfgMap, Configs);
+MAP_API(Qlx, StringToObjClassMap, Classes);
+
+// ---- What the three have in common
+
+// Frees a container at the end of the walk, also of one that ended by a mismatch.
+template <typename Api>
+struct Free {
+  void operator()(typename Api::Head *container) const { Api::free(container); }
+};
+template <typename Api>
+using Container = std::unique_ptr<typename Api::Head, Free<Api>>;
+
+// The chain, compared with the numbers; `matches` compares a node.
+template <typename Head, typename Entries, typename Matches>
+void requireChain(Head *container, const Entries &entries, Matches matches) {
+  const decltype(container->head) none = nullptr;
+  auto *node = container->head, *last = none;
+  for (const auto &entry : entries) {
+    require(node);
+    require(node->owner == container);
+    require(node->prev == last);
+    require(matches(node, entry));
+    last = node;
+    node = node->next;
+  }
+  require(!node);
+  require(container->tail == last);
+}
+
+template <typename Api, typename Iterator = decltype(Api::iterator(nullptr))>
+Iterator iteratorAt(typename Api::Head *container, size_t place) {
+  Iterator it = Api::iterator(container);
+  while (place-- > 0) {
+    require(Api::hasNext(it) == 1);
+    it = Api::next(it);
+  }
+  require(Api::hasNext(it) == 1);
+  return it;
+}
+
+// Now and then the memory runs out, at some allocation or from there on. True when the operation
+// had to fail, which needs as many allocations itself; an index that cannot be made does no harm.
+class Shortage {
+ public:
+  Shortage(Choices &choices, bool rare) {
+    if (!choices.one(rare ? 64 : 8)) return;
+    nth_ = 1 + choices.below(4);
+    choices.one(2) ? memory_.failFrom(nth_) : memory_.failOnce(nth_);
+  }
+  bool fails(uint32_t needed) const { return nth_ > 0 && nth_ <= needed; }
+
+ private:
+  FailingMemory memory_;
+  uint32_t nth_ = 0;
+};
+
+inline bool contains(const std::vector<int> &numbers, int i) {
+  return std::find(numbers.begin(), numbers.end(), i) != numbers.end();
+}
+
+template <typename Elements, typename Numbers>
+void requireReferences(Elements &elements, const Numbers &held) {
+  if (!Elements::kCounted) return;
+  std::array<int, kCount> expected = {};
+  for (const int i : held) ++expected[static_cast<size_t>(i)];
+  for (int i = 0; i < kCount; ++i) {
+    require(elements.references(i) == expected[static_cast<size_t>(i)]);
+  }
+}
+
+// ---- Groups
+
+template <typename Api>
+class GroupModel {
+ public:
+  static constexpr auto &kName = Api::kName;
+
+  explicit GroupModel(Choices &choices) : choices_(choices) {
+    while (choices_.next()) {
+      const uint32_t kind = choices_.below(64);
+      if (kind == 0)
+        startAgain();
+      else if (kind == 1)
+        removeSome();
+      else if (kind < 8)
+        refuseNull();
+      else if (sizes_.grows(choices_, model_.size()))
+        add(static_cast<int>(choices_.below(kCount)));
+      else
+        remove();
+      check();
+    }
+    group_.reset();
+    requireReferences(elements_, std::vector<int>{});
+  }
+
+ private:
+  void add(int i) {
+    const Shortage shortage(choices_, false);
+    const bool isNew = !contains(model_, i);
+    const bool added = isNew && !shortage.fails(1 + Api::Elements::kCopyAllocations);
+    require(Api::add(group_.get(), elements_.at(i)) == added);
+    if (added) model_.push_back(i);
+  }
+
+  void remove() {
+    if (model_.empty() || choices_.one(4)) {
+      const int i = static_cast<int>(choices_.below(kCount));
+      require(Api::rem(group_.get(), elements_.at(i)) == contains(model_, i));
+      std::erase(model_, i);
+    } else {
+      removeAt(choices_.below(static_cast<uint32_t>(model_.size())));
+    }
+  }
+
+  void removeAt(size_t place) {
+    auto *it = iteratorAt<Api>(group_.get(), place);
+    auto *successor = it->next;
+    require(Api::iterRem(it) == successor);
+    model_.erase(model_.begin() + static_cast<std::ptrdiff_t>(place));
+  }
+
+  // In one go over the iterator.
+  void removeSome() {
+    const uint32_t one = 1 + choices_.below(3);
+    size_t place = 0;
+    for (auto *it = Api::iterator(group_.get()); Api::hasNext(it);) {
+      if (!choices_.one(one)) {
+        it = Api::next(it);
+        ++place;
+      } else {
+        it = Api::iterRem(it);
+        model_.erase(model_.begin() + static_cast<std::ptrdiff_t>(place));
+      }
+    }
+    require(place == model_.size());
+  }
+
+  void refuseNull() {
+    require(Api::add(group_.get(), nullptr) == 0);
+    require(Api::rem(group_.get(), nullptr) == 0);
+    require(Api::getLink(group_.get(), nullptr) == nullptr);
+    require(Api::iterRem(nullptr) == nullptr);
+  }
+
+  void startAgain() {
+    group_.reset(Api::alloc());
+    model_.clear();
+  }
+
+  void check() {
+    requireChain(group_.get(), model_,
+                 [&](const auto *node, int i) { return elements_.is(node->value, i); });
+    auto *node = group_->head;
+    for (const int i : model_) {
+      require(Api::getLink(group_.get(), elements_.at(i)) == node);
+      node = node->next;
+    }
+    const int other = static_cast<int>(choices_.below(kCount));
+    require((Api::getLink(group_.get(), elements_.at(other)) != nullptr) ==
+            contains(model_, other));
+    requireReferences(elements_, model_);
+    if (model_.empty()) return;
+    const size_t place = choices_.below(static_cast<uint32_t>(model_.size()));
+    auto *element = Api::get(iteratorAt<Api>(group_.get(), place));
+    require(elements_.is(element, model_[place]));
+    elements_.discard(element);
+  }
+
+  void lookEachUp() {
+    auto *node = group_->head;
+    for (const int i : model_) {
+      require(Api::getLink(group_.get(), elements_.at(i)) == node);
+      node = node->next;
+    }
+    requireReferences(elements_, model_);
+  }
+
+  Choices &choices_;
+  Sizes sizes_;
+  typename Api::Elements elements_;
+  Container<Api> group_{Api::alloc()};
+  std::vector<int> model_;
+};
+
+// ---- Lists
+
+template <typename Api>
+class ListModel {
+ public:
+  static constexpr auto &kName = Api::kName;
+
+  explicit ListModel(Choices &choices) : choices_(choices) {
+    while (choices_.next()) {
+      const uint32_t kind = choices_.below(64);
+      if (kind == 0)
+        startAgain();
+      else if (kind == 1)
+        sort();
+      else if (kind == 2)
+        copy();
+      else if (kind < 8)
+        refuse();
+      else if (sizes_.grows(choices_, model_.size()))
+        append(static_cast<int>(choices_.below(kCount)));
+      else
+        remove();
+      check();
+    }
+  }
+
+ private:
+  void append(int i) {
+    const Shortage shortage(choices_, false);
+    const bool added = !shortage.fails(1 + Api::Elements::kCopyAllocations);
+    require(Api::append(list_.get(), elements_.at(i)) == added);
+    if (added) model_.push_back(i);
+  }
+
+  void remove() {
+    if (model_.empty()) return;
+    const size_t place = choices_.below(static_cast<uint32_t>(model_.size()));
+    auto *it = iteratorAt<Api>(list_.get(), place);
+    auto *successor = it->next;
+    if (choices_.one(2))
+      require(Api::iterRem(it) == successor);
+    else
+      Api::remLink(list_.get(), it);
+    model_.erase(model_.begin() + static_cast<std::ptrdiff_t>(place));
+  }
+
+  void sort() {
+    const WantedLeak kept;
+    Api::sort(list_.get(), &Api::Elements::compare);
+    std::stable_sort(model_.begin(), model_.end(),
+                     [&](int a, int b) { return elements_.isBefore(a, b); });
+  }
+
+  // The copy goes on, or the original.
+  void copy() {
+    Container<Api> copied{Api::copy(list_.get())};
+    if (choices_.one(2)) std::swap(copied, list_);
+    requireChain(copied.get(), model_,
+                 [&](const auto *node, int i) { return elements_.is(node->value, i); });
+    Api::remLink(list_.get(), copied->head);  // another list's: left alone
+  }
+
+  void refuse() {
+    require(Api::append(list_.get(), nullptr) == 0);
+    require(Api::getLink(list_.get(), nullptr) == nullptr);
+    require(Api::getIndex(list_.get(), -1) == nullptr);
+    require(Api::getIndex(list_.get(), list_->count) == nullptr);
+    Api::sort(list_.get(), nullptr);
+    Api::remLink(list_.get(), nullptr);
+  }
+
+  void startAgain() {
+    list_.reset(Api::alloc());
+    model_.clear();
+  }
+
+  void check() {
+    require(list_->count == static_cast<int32_t>(model_.size()));
+    requireChain(list_.get(), model_,
+                 [&](const auto *node, int i) { return elements_.is(node->value, i); });
+    const int i = static_cast<int>(choices_.below(kCount));
+    auto *link = Api::getLink(list_.get(), elements_.at(i));
+    const auto first = std::find(model_.begin(), model_.end(), i);
+    require((link != nullptr) == (first != model_.end()));
+    if (link) require(link == iteratorAt<Api>(list_.get(), size_t(first - model_.begin())));
+    if (model_.empty()) return;
+    const size_t place = choices_.below(static_cast<uint32_t>(model_.size()));
+    auto *it = iteratorAt<Api>(list_.get(), place);
+    require(Api::getIndex(list_.get(), static_cast<int32_t>(place)) == it->value);
+    auto *element = Api::get(it);
+    require(elements_.is(element, model_[place]));
+    elements_.discard(element);
+  }
+
+  Choices &choices_;
+  Sizes sizes_;
+  typename Api::Elements elements_;
+  Container<Api> list_{Api::alloc()};
+  std::vector<int> model_;
+};
+
+// ---- Maps
+
+template <typename Api>
+class MapModel {
+ public:
+  static constexpr auto &kName = Api::kName;
+
+  explicit MapModel(Choices &choices) : choices_(choices) {
+    while (choices_.next()) {
+      const uint32_t kind = choices_.below(64);
+      if (kind == 0)
+        startAgain();
+      else if (kind == 1)
+        copy();
+      else if (kind < 6)
+        refuse();
+      else if (sizes_.grows(choices_, model_.size()))
+        put(static_cast<int>(choices_.below(kCount)), static_cast<int>(choices_.below(kCount)));
+      else
+        remove();
+      check();
+    }
+    map_.reset();
+    requireReferences(elements_, std::vector<int>{});
+  }
+
+ private:
+  struct Entry {
+    int key, value;
+  };
+  using Place = typename std::vector<Entry>::iterator;
+  static constexpr bool kCopies = Api::Elements::kCopyAllocations > 0;
+
+  Place placeOf(int key) {
+    return std::find_if(model_.begin(), model_.end(), [&](Entry e) { return e.key == key; });
+  }
+
+  void put(int key, int value) {
+    if (choices_.one(16)) value = kNull;
+    const Shortage shortage(choices_, false);
+    const Place there = placeOf(key);
+    const bool isNew = there == model_.end();
+    // A new one needs a node and a key. A value that cannot be copied is stored as null.
+    const bool stored = !isNew || !shortage.fails(2);
+    const bool copied = !kCopies || value == kNull || isMade(shortage, isNew ? 3 : 1);
+    require(Api::put(map_.get(), text(key), valueAt(value)) == stored);
+    if (!stored) return;
+    if (!copied) value = kNull;
+    if (isNew)
+      model_.push_back({key, value});
+    else
+      there->value = value;
+  }
+
+  // Whether that allocation of the operation succeeds.
+  static bool isMade(const Shortage &shortage, uint32_t nth) { return !shortage.fails(nth); }
+
+  auto valueAt(int value) -> decltype(std::declval<typename Api::Elements &>().at(0)) {
+    return value == kNull ? nullptr : elements_.at(value);
+  }
+
+  bool isValue(decltype(Api::getVal(nullptr)) stored, int value) {
+    return value == kNull ? stored == nullptr : elements_.is(stored, value);
+  }
+
+  void remove() {
+    if (model_.empty() || choices_.one(4)) {
+      const int key = static_cast<int>(choices_.below(kCount));
+      Api::rem(map_.get(), text(key));
+      if (const Place there = placeOf(key); there != model_.end()) model_.erase(there);
+    } else {
+      const size_t place = choices_.below(static_cast<uint32_t>(model_.size()));
+      Api::remNode(map_.get(), iteratorAt<Api>(map_.get(), place));
+      model_.erase(model_.begin() + static_cast<std::ptrdiff_t>(place));
+    }
+  }
+
+  // The copy goes on, or the original.
+  void copy() {
+    Container<Api> copied{Api::copy(map_.get())};
+    if (choices_.one(2)) std::swap(copied, map_);
+    checkChain(copied.get());
+    Api::remNode(map_.get(), copied->head);  // another map's: left alone
+  }
+
+  void refuse() {
+    require(Api::put(map_.get(), nullptr, nullptr) == 0);
+    require(Api::get(map_.get(), nullptr) == nullptr);
+    require(Api::hasKey(map_.get(), nullptr) == 0);
+    Api::rem(map_.get(), nullptr);
+    Api::remNode(map_.get(), nullptr);
+  }
+
+  void startAgain() {
+    map_.reset(Api::alloc());
+    model_.clear();
+  }
+
+  void checkChain(typename Api::Head *map) {
+    requireChain(map, model_, [&](const auto *node, Entry entry) {
+      return strcmp(text(entry.key), node->key) == 0 && isValue(node->value, entry.value);
+    });
+  }
+
+  void check() {
+    checkChain(map_.get());
+    if (choices_.step() % kRarely == 0) lookEachUp();
+    const int key = static_cast<int>(choices_.below(kCount));
+    const Place there = placeOf(key);
+    require(Api::hasKey(map_.get(), text(key)) == (there != model_.end()));
+    auto *value = Api::get(map_.get(), text(key));
+    require(isValue(value, there == model_.end() ? kNull : there->value));
+    elements_.discard(value);
+    if (model_.empty()) return;
+    const size_t place = choices_.below(static_cast<uint32_t>(model_.size()));
+    auto *it = iteratorAt<Api>(map_.get(), place);
+    require(take(Api::getKey(it)) == text(model_[place].key));
+    value = Api::getVal(it);
+    require(isValue(value, model_[place].value));
+    elements_.discard(value);
+  }
+
+  void lookEachUp() {
+    auto *node = map_->head;
+    std::vector<int> values;
+    for (const Entry entry : model_) {
+      require(Api::getNode(map_.get(), text(entry.key)) == node);
+      node = node->next;
+      if (entry.value != kNull) values.push_back(entry.value);
+    }
+    requireReferences(elements_, values);
+  }
+
+  Choices &choices_;
+  Sizes sizes_;
+  typename Api::Elements elements_;
+  Container<Api> map_{Api::alloc()};
+  std::vector<Entry> model_;
+};
+
+}  // namespace models
+
+#endif

@@ -8,6 +8,8 @@
 #include <qlx/proplist.h>
 
 #include "support/FailingMemory.h"
+#include "support/ModelTest.h"
+#include "support/PropListModel.h"
 #include "support/Take.h"
 
 namespace {
@@ -212,6 +214,10 @@ TEST_F(CxPropListTest, AnIteratorWithoutAnEntryGivesNothing) {
   EXPECT_EQ(CxPropListIterCopyVal(nullptr), nullptr);
   EXPECT_EQ(CxPropListIterHasNext(nullptr), 0);
   CxPropListIterNext(nullptr);
+}
+
+TEST(CxPropListModelTest, IsLikeTheModelThroughRandomOperations) {
+  walk<models::PropListModel>(100000);
 }
 
 class CxListUtilTest : public ::testing::Test {

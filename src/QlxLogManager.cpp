@@ -156,7 +156,8 @@ ObjCfg *qlxIntlLogMgrGetCfg(const char *name) {
   if (ObjCfg *known = qlxIntlStringToObjCfgMapGet(gLogMgr.configs, name)) return known;
   ObjCfgRef made{qlxIntlAllocObjCfg(name)};
   qlxIntlLogMgrAddCfg(made.get());
-  return qlxIntlLogMgrHasCfg(name) ? made.release() : nullptr;
+  // Adding may have changed the parent name that was asked for.
+  return made && qlxIntlLogMgrHasCfg(made->name) ? made.release() : nullptr;
 }
 
 void qlxIntlLogMgrRemCfg(ObjCfg *cfg) {

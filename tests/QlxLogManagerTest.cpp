@@ -186,6 +186,20 @@ TEST_F(LogManagerTest, MakesASiblingAnewThatIsNotRegisteredAnyMore) {
   EXPECT_EQ(QlxLogMgrHasCfg("p.ghost"), 1);
 }
 
+// Making "b.p" walks the children of "b"; making the one that is missing there moves the asker,
+// whose parent name is the one that was asked for.
+TEST_F(LogManagerTest, MakesAMissingParentWhoseChildGetsAnotherOneMeanwhile) {
+  const Config a = registered("a"), b = registered("b"), asker = registered("c");
+  const Config missing = make("a.x"), named = make("b.p");
+  link(a, asker);
+  link(b, missing);
+  QlxObjCfgSetParent(asker.get(), named.get());
+  const Config parent{QlxObjCfgGetParent(asker.get())};
+  ASSERT_NE(parent, nullptr);
+  EXPECT_STREQ(parent->name, "b.p");
+  EXPECT_EQ(parentNameOf(asker), "a.x");
+}
+
 // Random changes by a small host, once as it is and once with every child looked at each time: the
 // configurations must be linked alike.
 class LinkingTest : public LogManagerTest {

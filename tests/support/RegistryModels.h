@@ -471,7 +471,8 @@ class PlainLogManager {
     return cfg.parent && *cfg.parent != cfg.name ? get(*cfg.parent) : nullptr;
   }
 
-  Ref get(const std::string &name) {
+  // By value: what it adds may change the parent whose name was given.
+  Ref get(std::string name) {
     if (!known(name)) add(std::make_shared<Cfg>(Cfg{name}));
     return configs.at(name);
   }
@@ -490,7 +491,7 @@ class PlainLogManager {
     addOnce(names, cfg->name);
   }
 
-  void remove(const std::string &name) {
+  void remove(std::string name) {
     if (!known(name)) return;
     const Ref cfg = configs.at(name);
     configs.erase(name);
@@ -525,13 +526,20 @@ class PlainLogManager {
     return nullptr;
   }
 
-  // "<null>" for none.
+  // "<null>" for none. Where making a missing parent changes a chain that comes back, it counts how
+  // far the walk goes before it notices: the mark moves at every power of two.
   std::string inherited(const Ref &cfg, const std::string &key) {
-    std::set<std::string> seen = {cfg->name};
-    for (Ref at = cfg;; at = get(*at->parent)) {
+    Ref at = cfg, mark;
+    for (uint32_t steps = 0, limit = 1; at != mark; ++steps) {
       if (const std::string *value = ownValue(*at, key)) return *value;
-      if (!at->parent || !seen.insert(*at->parent).second) return "<null>";
+      if (steps == limit) {
+        limit *= 2;
+        mark = at;
+      }
+      if (!at->parent || *at->parent == cfg->name) break;
+      at = get(*at->parent);
     }
+    return "<null>";
   }
 
   // What the object has of a key that none of its own set.

@@ -1,6 +1,8 @@
 // The API lock: one plain, non-recursive mutex around all of the library's state. It is made by the
 // first call that needs it and then stays for the life of the process: closing the toolkit must not
 // free it under a thread that still waits. A child forked while other threads log finds it free.
+// A thread cannot be cancelled while it has the lock: it would leave it, and all that it guards,
+// as they are.
 #include "QlxLocked.h"
 
 #include <atomic>
@@ -10,6 +12,7 @@
 
 #include "QlxHeldFormats.h"
 #include "QlxLook.h"
+#include "util/CxThread.h"
 
 namespace {
 
@@ -17,6 +20,7 @@ std::atomic<CxMutex> gMutex;     // set once
 std::atomic<bool> gForkHandled;  // the fork handlers are registered, or about to be
 std::atomic<pthread_t> gHolder;  // who holds gMutex; only the holder itself relies on it
 bool gTakenForFork;              // written and read only by the thread that holds gMutex
+int gCancelState;                // of the thread that holds gMutex, as it was before
 
 bool heldByThisThread() {
   return gHolder.load(std::memory_order_relaxed) == pthread_self();
@@ -59,12 +63,21 @@ bool succeeded(CxStatus status) {
   return false;
 }
 
+bool take() {
+  if (!gMutex.load(std::memory_order_acquire) && !succeeded(makeMutex())) return false;
+  CxMutex mutex = gMutex.load(std::memory_order_acquire);
+  return succeeded(CxMutexLock(&mutex));
+}
+
 }  // namespace
 
 uint8_t qlxAPIMutexLock(void) {
-  if (!gMutex.load(std::memory_order_acquire) && !succeeded(makeMutex())) return 0;
-  CxMutex mutex = gMutex.load(std::memory_order_acquire);
-  if (!succeeded(CxMutexLock(&mutex))) return 0;
+  const int cancelState = cxThreadDisableCancel();
+  if (!take()) {
+    cxThreadRestoreCancel(cancelState);
+    return 0;
+  }
+  gCancelState = cancelState;
   gHolder.store(pthread_self(), std::memory_order_relaxed);
   return 1;
 }
@@ -72,6 +85,9 @@ uint8_t qlxAPIMutexLock(void) {
 void qlxAPIMutexUnlock(void) {
   CxMutex mutex = gMutex.load(std::memory_order_acquire);
   if (!mutex) return;
+  const bool isHolder = heldByThisThread();
+  const int cancelState = gCancelState;
   gHolder.store(pthread_t{}, std::memory_order_relaxed);
   succeeded(CxMutexUnlock(&mutex));
+  if (isHolder) cxThreadRestoreCancel(cancelState);
 }

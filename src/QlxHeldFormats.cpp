@@ -12,7 +12,10 @@
 #include <unicode/ucnv.h>
 #include <unicode/uloc.h>
 
+#include "util/CxThread.h"
+
 static pthread_mutex_t gLock = PTHREAD_MUTEX_INITIALIZER;
+static int gCancelState;  // of the thread that holds gLock, as it was before
 
 // What the held formats were made under. A name that does not fit is kept cut, and so never found
 // the same: nothing is then held for longer than a call.
@@ -79,9 +82,13 @@ void qlxDropHeldFormats(void) {
 }
 
 void qlxHeldFormatsLock(void) {
+  const int cancelState = cxThreadDisableCancel();
   pthread_mutex_lock(&gLock);
+  gCancelState = cancelState;
 }
 
 void qlxHeldFormatsUnlock(void) {
+  const int cancelState = gCancelState;
   pthread_mutex_unlock(&gLock);
+  cxThreadRestoreCancel(cancelState);
 }

@@ -4,7 +4,8 @@
  *
  * One global lock, the API lock, guards all of the library's state. Public functions take it unless
  * their header says otherwise; it is not recursive, so a class operation, which runs with the lock
- * held, calls only what takes no lock (qlx/class.h).
+ * held, calls only what takes no lock (qlx/class.h). A thread cannot be cancelled while it has the
+ * lock, or waits for it.
  */
 #ifndef QLX_TOOLKIT_H
 #define QLX_TOOLKIT_H

@@ -12,13 +12,15 @@ QLX_BEGIN_DECLS
 
 /**
  * Takes the API lock, made by the first call. The lock is not recursive: the thread that holds it
- * must call nothing that takes it.
+ * must call nothing that takes it. While it holds the lock, the thread cannot be cancelled
+ * (pthread_cancel()), whichever its type of cancellation.
  *
  * @return 1 when the lock is held, 0 when it cannot be made or taken
  */
 QLX_API uint8_t qlxAPIMutexLock(void);
 
-/** Releases the API lock; without one does nothing. */
+/** Releases the API lock, and sets the thread's cancellation state as it was before the lock was
+ *  taken. By the thread that took it; before the first call of the library it does nothing. */
 QLX_API void qlxAPIMutexUnlock(void);
 
 /** @return the toolkit logger, borrowed; null while the toolkit is closed */

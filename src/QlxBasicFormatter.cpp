@@ -18,6 +18,7 @@
 #include "QlxI18Msg.h"
 #include "QlxLoggedEvent.h"
 #include "QlxObject.h"
+#include "QlxOperation.h"
 #include "util/CxDecimal.h"
 #include "util/CxUStringBuff.h"
 #include "util/CxUnits.h"
@@ -80,10 +81,12 @@ class WideLine {
   bool appendNumber(uint64_t number) { return CxUStringBuffAppendUInt64(text_, number) || true; }
 
   // The library's own binder writes straight into the line.
-  bool appendMessage(Event *event, fBindMsg bind, va_list *args) {
+  bool appendMessage(Event *event, const ObjClass *binder, va_list *args) {
+    const fBindMsg bind = binder->op4.fBindMsg;
     if (bind != qlxIntlBindUI18Msg) {
       qlxSettleEvent(event);
-      const OwnedUStr text{QlxBindEventUMsg(event, bind, args)};
+      qlxUseEventLocale(event);
+      const OwnedUStr text{qlxCall({binder, "fBindMsg"}, bind, event->message, args)};
       if (text) CxUStringBuffAppendUStr(text_, text.get());
       return true;
     }
@@ -113,8 +116,8 @@ class AsciiLine {
     return line_->append({first, static_cast<size_t>(end - first)});
   }
 
-  bool appendMessage(Event *event, fBindMsg bind, va_list *args) {
-    if (bind != qlxIntlBindUI18Msg) return false;
+  bool appendMessage(Event *event, const ObjClass *binder, va_list *args) {
+    if (binder->op4.fBindMsg != qlxIntlBindUI18Msg) return false;
     I18Msg *message = event->message;
     qlxUseEventLocale(event);
     if (message && !message->bundle && message->text) {
@@ -156,14 +159,14 @@ static const char *datePatternOf(const QlxObject *formatter) {
 template <typename Line>
 static bool appendEvent(Line line, QlxObject *formatter, Event *event, va_list *args) {
   if (!event || !isKind(formatter, Formatter)) return false;
-  const fBindMsg bind = formatter->objClass->op4.fBindMsg;
-  if (!bind) return false;
+  const ObjClass *binder = formatter->objClass;
+  if (!binder->op4.fBindMsg) return false;
   const char *own = separatorOf(formatter);
   const std::string_view separator = own ? std::string_view{own} : kDefaultSeparator;
   // Deliberate: the locale stays on the event, and what formats the event later binds in it too.
   if (localeOf(formatter)) qlxSetEventLocale(event, localeOf(formatter));
   return line.appendDate(datePatternOf(formatter), event->time) && line.append(separator) &&
-         appendProperties(line, event, separator) && line.appendMessage(event, bind, args) &&
+         appendProperties(line, event, separator) && line.appendMessage(event, binder, args) &&
          line.append("\n");
 }
 

@@ -9,6 +9,7 @@
 #include "QlxLocked.h"
 #include "QlxLoggedEvent.h"
 #include "QlxObject.h"
+#include "QlxOperation.h"
 
 QlxObject *qlxIntlHandlerGetFormatter(QlxObject *handler) {
   return isKind(handler, Handler) ? qlxIntlAcquireObject(handler->kind2.formatter) : nullptr;
@@ -31,20 +32,21 @@ char *qlxIntlHandlerGetFmtHeader(QlxObject *handler) {
   const ObjClass *formatter = formatterClass(handler);
   if (!formatter || !formatter->op2.fGetHeader) return nullptr;
   qlxSettleNotedEvent();
-  return formatter->op2.fGetHeader(handler->kind2.formatter);
+  return qlxCall({formatter, "fGetHeader"}, formatter->op2.fGetHeader, handler->kind2.formatter);
 }
 
 char *qlxIntlHandlerGetFmtTrailer(QlxObject *handler) {
   const ObjClass *formatter = formatterClass(handler);
   if (!formatter || !formatter->op3.fGetTrailer) return nullptr;
   qlxSettleNotedEvent();
-  return formatter->op3.fGetTrailer(handler->kind2.formatter);
+  return qlxCall({formatter, "fGetTrailer"}, formatter->op3.fGetTrailer, handler->kind2.formatter);
 }
 
 UChar *qlxIntlUHandlerDoFmt(QlxObject *handler, Event *event, va_list *args) {
   const ObjClass *formatter = formatterClass(handler);
   if (!formatter || !formatter->op1.fFormat) return nullptr;
-  return formatter->op1.fFormat(handler->kind2.formatter, event, args);
+  return qlxCall({formatter, "fFormat"}, formatter->op1.fFormat, handler->kind2.formatter, event,
+                 args);
 }
 
 // Deliberate: a name that no object has leaves the handler without a formatter.

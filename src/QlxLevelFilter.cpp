@@ -11,6 +11,7 @@
 #include "QlxConfigKeys.h"
 #include "QlxLoggedEvent.h"
 #include "QlxObject.h"
+#include "QlxOperation.h"
 #include "QlxProps.h"
 
 void QlxBasicFilterFProcess(QlxObject *filter, Event *event, va_list *args) {
@@ -20,7 +21,8 @@ void QlxBasicFilterFProcess(QlxObject *filter, Event *event, va_list *args) {
   const bool isHosts = objClass->op2.fIsLoggable != QlxLevelFilterFIsLoggable ||
                        objClass->op3.fLog != QlxBasicObjectFLog;
   if (isHosts) qlxSettleEvent(event);
-  if (objClass->op2.fIsLoggable(filter, event, args) == 1) objClass->op3.fLog(filter, event, args);
+  if (qlxCall({objClass, "fIsLoggable"}, objClass->op2.fIsLoggable, filter, event, args) == 1)
+    qlxCall({objClass, "fLog"}, objClass->op3.fLog, filter, event, args);
 }
 
 // Deliberate: a key without a value, like a misspelt one, leaves no threshold that drops anything.

@@ -13,6 +13,7 @@
 #include "QlxConfigKeys.h"
 #include "QlxLocked.h"
 #include "QlxLoggedEvent.h"
+#include "QlxOperation.h"
 #include "QlxProps.h"
 #include "util/QlxGroupWalk.h"
 
@@ -70,7 +71,7 @@ static void passTo(QlxObject *listener, Event *event, va_list *args) {
   const bool processes = isKind(listener, Filter) || isKind(listener, Handler);
   if (!processes || !objClass->op1.fProcess || (listener->marks & kMarkPassing)) return;
   if (!asksForNotedSource(objClass->op1.fProcess)) qlxSettleEvent(event);
-  objClass->op1.fProcess(listener, event, args);
+  qlxCall({objClass, "fProcess"}, objClass->op1.fProcess, listener, event, args);
 }
 
 // One that is removed before its turn is left out, one that is added gets the event at the end, and

@@ -16,6 +16,7 @@
 #include "QlxLocked.h"
 #include "QlxLoggedEvent.h"
 #include "QlxObject.h"
+#include "QlxOperation.h"
 #include "QlxProps.h"
 
 static constexpr QlxLogResult kNothingLogged = {'-', 0, 0};
@@ -49,7 +50,7 @@ static void report(QlxLogResult *result, const QlxLogResult &what) {
 static void passToLogger(QlxLogResult *result, QlxObject *logger, fLog log, Event *event,
                          va_list *args) {
   if (log != QlxBasicObjectFLog) qlxSettleEvent(event);
-  log(logger, event, args);
+  qlxCall({logger->objClass, "fLog"}, log, logger, event, args);
   const int32_t bindError = event->message ? event->message->error : 0;
   report(result, {event->status.kind, event->status.code, bindError});
 }

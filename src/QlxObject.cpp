@@ -11,6 +11,7 @@
 
 #include "QlxLocked.h"
 #include "QlxLogManager.h"
+#include "QlxOperation.h"
 #include "QlxToolkit.h"
 
 static constexpr const char *kDefaultFormatterName = "quill.defaultFormatter";
@@ -49,7 +50,7 @@ static QlxObject *makeObject(const char *objectName, ObjClass *objClass) {
   object->name = OslStringDup(objectName);
   storeEnabled(object, 1);
   initKindFields(object);
-  if (objClass->fAllocVars) object->vars = objClass->fAllocVars();
+  if (objClass->fAllocVars) object->vars = qlxCall({objClass, "fAllocVars"}, objClass->fAllocVars);
 
   // The class's own operations may have made an object of this name meanwhile: that one stays.
   const ObjectRef other{qlxToolkitGetObjInstance(objectName)};
@@ -86,7 +87,12 @@ QlxObject *qlxIntlAcquireObject(QlxObject *object) {
 void qlxCloseHandlerOnce(QlxObject *object) {
   if (!isKind(object, Handler) || (object->marks & kMarkClosed)) return;
   object->marks |= kMarkClosed;
-  if (object->objClass->op3.fClose) object->objClass->op3.fClose(object);
+  const ObjClass *objClass = object->objClass;
+  if (objClass->op3.fClose) qlxCall({objClass, "fClose"}, objClass->op3.fClose, object);
+}
+
+void qlxFreeVars(const ObjClass *objClass, void *vars) {
+  if (objClass->fFreeVars) qlxCall({objClass, "fFreeVars"}, objClass->fFreeVars, vars);
 }
 
 static void freeContents(QlxObject *contents) {
@@ -94,7 +100,7 @@ static void freeContents(QlxObject *contents) {
   qlxFreeListeners(contents);
   OslMemoryFree(contents->name);
   const ObjClass *objClass = contents->objClass;
-  if (objClass->fFreeVars) objClass->fFreeVars(contents->vars);
+  qlxFreeVars(objClass, contents->vars);
   if (objClass->kind == Handler) qlxIntlReleaseObject(contents->kind2.formatter);
   if (objClass->kind == Formatter) {
     OslMemoryFree(contents->kind1.separator);
@@ -163,7 +169,8 @@ void qlxIntlSetObjectEnabled(QlxObject *object, uint32_t flag) {
 
 uint8_t qlxIntlIsLoggableByFilter(QlxObject *filter, Event *event, va_list *args) {
   if (!event || !isKind(filter, Filter) || !filter->objClass->op2.fIsLoggable) return 0;
-  return filter->objClass->op2.fIsLoggable(filter, event, args);
+  const ObjClass *objClass = filter->objClass;
+  return qlxCall({objClass, "fIsLoggable"}, objClass->op2.fIsLoggable, filter, event, args);
 }
 
 uint8_t QlxAreObjectsEqual(QlxObject *a, QlxObject *b) {

@@ -51,6 +51,9 @@ inline void storeLevel(QlxObject *object, int32_t level) {
 /** Closes a handler for good: its class's fClose runs once, whoever asks first. */
 void qlxCloseHandlerOnce(QlxObject *object);
 
+/** Has a class free the variables of an object of its; they may be null. */
+void qlxFreeVars(const ObjClass *objClass, void *vars);
+
 /** Frees an object's listener group, which releases the listeners. */
 void qlxFreeListeners(QlxObject *object);
 

@@ -7,6 +7,7 @@
 #include <qlx/props.h>
 
 #include "QlxLocked.h"
+#include "QlxOperation.h"
 
 static StringToStringMap *propsOf(QlxObject *object) {
   return object ? object->props : nullptr;
@@ -19,8 +20,9 @@ StringToStringMap *qlxFetchObjPropMap(QlxObject *object) {
 }
 
 void qlxNotifyObjCfgChange(QlxObject *object, const char *key) {
-  if (!object || !object->objClass || !object->objClass->fCfgChange) return;
-  object->objClass->fCfgChange(object, key);
+  const ObjClass *objClass = object ? object->objClass : nullptr;
+  if (!objClass || !objClass->fCfgChange) return;
+  qlxCall({objClass, "fCfgChange"}, objClass->fCfgChange, object, key);
 }
 
 char *qlxIntlGetObjProp(QlxObject *object, const char *key, uint8_t *found) {

@@ -128,7 +128,7 @@ static void freeVariables(QlxObject *object) {
   if (!object->objClass) return;
   if (void *vars = object->vars; vars && object->objClass->fFreeVars) {
     object->vars = nullptr;
-    object->objClass->fFreeVars(vars);
+    qlxFreeVars(object->objClass, vars);
   }
   if (object->objClass->kind == Handler) {
     const ObjectRef formatter{object->kind2.formatter};

@@ -5,6 +5,12 @@
  * operations of the built-in classes (Qlx<Class>F<Operation>) declared here, besides the platform
  * layer and the functions whose headers say that they take no lock.
  *
+ * No C++ exception may leave an operation, for nobody would give the lock back: one that does ends
+ * the process (abort()) after a line on standard error, as in "qlx: an exception left the operation
+ * fProcess of the class my_handler". So does an operation that ends its thread by pthread_exit().
+ * While an operation runs, its thread cannot be cancelled; it is when the call that took the lock
+ * returns.
+ *
  * An operation of a built-in class takes the object's variables for those that the same class's
  * fAllocVars makes: a host's class with QlxPDLoggerFLog() has QlxPDLoggerFAllocVars() and
  * QlxPDLoggerFFreeVars() too, or operations that call them, and no variables of its own.

@@ -22,7 +22,9 @@ QLX_BEGIN_DECLS
  * Registers a class. The first registration of a name wins, a later one and a null name are
  * ignored. A null kind operation gets the library's default; a null fAllocVars, fFreeVars or
  * fCfgChange stays null and is skipped (a class without fCfgChange is told of no key). fFreeVars is
- * also called with null, for an object whose fAllocVars gave null. The description may be null.
+ * also called with null, for an object whose fAllocVars gave null. The description may be null. A
+ * C++ exception that leaves an operation ends the process with a line on standard error
+ * (qlx/class.h).
  */
 QLX_API void QlxAddLoggerClass(const char *className, I18Msg *description, fAllocVars allocVars,
                                fFreeVars freeVars, fCfgChange cfgChange, fLog log);

@@ -151,7 +151,8 @@ typedef enum ObjKind { Logger = 101, Filter = 102, Handler = 103, Formatter = 10
 
 /*
  * Operations of a class. They run with the API lock held and may call only functions that take no
- * lock: the qlxIntl... twins, the qlx... helpers and the Qlx<Class>F<Operation> operations. `args`
+ * lock: the qlxIntl... twins, the qlx... helpers and the Qlx<Class>F<Operation> operations. An
+ * exception that leaves one ends the process (qlx/class.h). `args`
  * is the argument list of the log call, may be null, and is consumed only through a va_copy.
  */
 typedef void *(*fAllocVars)(void);     /**< variables of a new object, or null */
@@ -160,7 +161,7 @@ typedef void (*fCfgChange)(QlxObject *object, const char *key);
 typedef void (*fLog)(QlxObject *object, Event *event, va_list *args);
 typedef void (*fProcess)(QlxObject *object, Event *event, va_list *args);
 typedef uint8_t (*fIsLoggable)(QlxObject *filter, Event *event, va_list *args);
-typedef void (*fOpen)(QlxObject *handler);
+typedef void (*fOpen)(QlxObject *handler); /**< for the class itself: the library calls none */
 typedef void (*fClose)(QlxObject *handler);
 typedef UChar *(*fFormat)(QlxObject *formatter, Event *event, va_list *args); /**< caller frees */
 typedef char *(*fGetHeader)(QlxObject *formatter);                            /**< caller frees */

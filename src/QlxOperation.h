@@ -1,0 +1,22 @@
+// The one way to an operation of a class. A host's operation may be C++ that throws: an exception
+// that left it would leave the API lock held for ever, so it ends the process, with a line that
+// names the operation. What does not throw pays a call for this, nothing else.
+#ifndef QLX_SRC_QLXOPERATION_H
+#define QLX_SRC_QLXOPERATION_H
+
+#include <type_traits>
+
+#include <qlx/types.h>
+
+struct QlxOperationName {
+  const ObjClass *objClass;
+  const char *operation;
+};
+
+// Calls an operation, which is not null. Defined where exceptions are compiled, for the signatures
+// that operations have.
+template <typename Result, typename... Args>
+Result qlxCall(QlxOperationName name, Result (*operation)(Args...),
+               std::type_identity_t<Args>... args) noexcept;
+
+#endif

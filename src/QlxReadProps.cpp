@@ -1,13 +1,9 @@
-// The properties file reader. The file is read in blocks; the machine sees one byte after the
-// other.
+// The properties file reader: the machine sees one byte of the file after the other.
 #include "QlxReadProps.h"
 
-#include <array>
-
-#include <fcntl.h>
+#include <cstring>
 
 #include <qlx/buffers.h>
-#include <qlx/files.h>
 #include <qlx/memory.h>
 
 #include "QlxLogManager.h"
@@ -15,15 +11,6 @@
 namespace {
 
 enum class ByteClass { kBlank, kLineEnd, kComment, kSeparator, kEscape, kOther };
-
-constexpr uint32_t kBlockBytes = 8192;
-
-// The bytes of an open file, one after the other.
-struct ByteSource {
-  CxFile *file;
-  int32_t filled = 0, next = 0;
-  std::array<uint8_t, kBlockBytes> block;
-};
 
 }  // namespace
 
@@ -273,20 +260,6 @@ const ReadPropsStateFunction qlxRdprSTATE_HANDLER_FUNCS[kDone] = {
     qlxRdprDoUU3State,
 };
 
-// Fetches the next byte; answers 1, 0 at the end of the file, or -1 with the failure in `status`.
-static int32_t nextByte(ByteSource &source, uint8_t *byte, CxStatus *status) {
-  if (source.next == source.filled) {
-    source.next = source.filled = 0;
-    int32_t count = 0;
-    *status = CxFileRead(source.file, source.block.data(), kBlockBytes, &count);
-    if (status->kind != '-') return -1;
-    if (count == 0) return 0;
-    source.filled = count;
-  }
-  *byte = source.block[static_cast<size_t>(source.next++)];
-  return 1;
-}
-
 // Deliberate: a key in the buffer is delivered whatever the state. A pair whose line ended and that
 // no further line replaced is delivered once more.
 static int32_t atEndOfFile(ReadPropsContext *context) {
@@ -303,40 +276,38 @@ static int32_t step(ReadPropsContext *context, uint8_t byte) {
   return function ? function(byte, context) : kError;
 }
 
-static void readAll(ReadPropsContext *context, CxStatus *status) {
-  ByteSource source{.file = &context->file, .block = {}};
-  while (context->state >= kStartLine && context->state < kDone) {
-    uint8_t byte = 0;
-    const int32_t count = nextByte(source, &byte, &context->status);
-    if (count < 0) *status = context->status;
-    if (count > 0)
-      context->state = step(context, byte);
-    else
-      context->state = count == 0 ? atEndOfFile(context) : kError;
-  }
+// A byte order mark, as some editors put it before UTF-8, is no part of the first key.
+static std::span<const uint8_t> withoutMark(std::span<const uint8_t> bytes) {
+  static constexpr uint8_t kMark[] = {0xEF, 0xBB, 0xBF};
+  const bool isMarked =
+      bytes.size() >= sizeof kMark && std::memcmp(bytes.data(), kMark, sizeof kMark) == 0;
+  return isMarked ? bytes.subspan(sizeof kMark) : bytes;
 }
 
-uint8_t qlxDoReadProps(const char *path, CxPropList *propList, CxStatus *status) {
-  CxStatus ignored;
-  if (!status) status = &ignored;
+static bool isReading(const ReadPropsContext &context) {
+  return context.state >= kStartLine && context.state < kDone;
+}
+
+uint8_t qlxDeliverProps(const QlxPropsFile &file, CxPropList *propList, CxStatus *status) {
   ReadPropsContext context{};
   context.propList = propList;
   context.state = kStartLine;
-  context.status = CxFileOpen(&context.file, path, O_RDONLY);
-  if (context.status.kind != '-') {
-    *status = context.status;
-    return 0;
+  for (const uint8_t byte : withoutMark(file.bytes())) {
+    if (!isReading(context)) break;
+    context.state = step(&context, byte);
   }
-  readAll(&context, status);
+  const bool gotThere = isReading(context);
+  if (gotThere) context.state = file.isWhole ? atEndOfFile(&context) : kError;
   CxStringBuffDiscard(&context.keyBuf);
   CxStringBuffDiscard(&context.valBuf);
   cxPropIndexDiscard(&context.index);
-  context.status = CxFileClose(&context.file);
-  if (context.status.kind != '-') {
-    *status = context.status;
-    context.state = kError;
-  }
-  return context.state == kDone;
+  const bool failed = file.status.kind != '-' && (gotThere || file.isWhole);
+  if (failed && status) *status = file.status;
+  return context.state == kDone && !failed;
+}
+
+uint8_t qlxDoReadProps(const char *path, CxPropList *propList, CxStatus *status) {
+  return qlxDeliverProps(qlxLoadProps(path), propList, status);
 }
 
 uint8_t CxPropListRead(const char *path, CxPropList *list, CxStatus *status) {

@@ -3,6 +3,7 @@
 #ifndef QLX_SRC_QLXREADPROPS_H
 #define QLX_SRC_QLXREADPROPS_H
 
+#include "QlxPropsFile.h"
 #include "util/CxPropList.h"
 
 QLX_BEGIN_DECLS
@@ -29,8 +30,6 @@ enum ReadPropsState : int32_t {
 
 // One read, on the reader's own stack.
 typedef struct ReadPropsContext {
-  CxFile file;
-  CxStatus status;       // of the last operation on the file
   CxStringBuff keyBuf;   // the current key ...
   CxStringBuff valBuf;   // ... and value; cleared only where the next line starts
   uint32_t uAcc;         // sum of the \u digits of the whole file: never cleared
@@ -75,5 +74,8 @@ int32_t qlxRdprDoUU2State(uint8_t byte, ReadPropsContext *context);
 int32_t qlxRdprDoUU3State(uint8_t byte, ReadPropsContext *context);
 
 QLX_END_DECLS
+
+// The second half of qlxDoReadProps(), and the only one that wants the lock.
+uint8_t qlxDeliverProps(const QlxPropsFile &file, CxPropList *propList, CxStatus *status);
 
 #endif

@@ -212,12 +212,17 @@ static void initToolkitLogger() {
   gToolkit.logger = logger;
 }
 
-static uint8_t openToolkit(const char *configFileName, CxStatus *status) {
+static uint8_t isOpen() {
+  return gToolkit.open;
+}
+
+// Another thread may have opened it while this one read its file, which counts for nothing then.
+static uint8_t openToolkit(const QlxPropsFile *config, CxStatus *status) {
   if (gToolkit.open) return 1;
   qlxInitLogMgr();
   qlxToolkitInitObjClasses();
   CxStatus readStatus = {'-', 0};
-  if (configFileName && !qlxDoReadProps(configFileName, nullptr, &readStatus)) {
+  if (config && !qlxDeliverProps(*config, nullptr, &readStatus)) {
     if (status) *status = readStatus;
     closeToolkit();
     return 0;
@@ -229,8 +234,12 @@ static uint8_t openToolkit(const char *configFileName, CxStatus *status) {
 
 // Public functions
 
+// Reads the file between two looks, without the lock: it may be a pipe that somebody fills.
 uint8_t QlxOpenToolkit(const char *configFileName, CxStatus *status) {
-  return qlxLocked<openToolkit>(configFileName, status);
+  if (qlxLocked<isOpen>()) return 1;
+  if (!configFileName) return qlxLocked<openToolkit>(nullptr, status);
+  const QlxPropsFile config = qlxLoadProps(configFileName);
+  return qlxLocked<openToolkit>(&config, status);
 }
 
 void QlxCloseToolkit(void) {

@@ -8,7 +8,13 @@
 #include <map>
 #include <regex>
 #include <set>
+#include <sstream>
 #include <string>
+#include <vector>
+
+#include <qlx/proplist.h>
+
+#include "support/TempDir.h"
 
 namespace {
 
@@ -92,6 +98,42 @@ TEST(ConfigurationPage, HasNoKeysBesideThem) {
     if (told.contains(section)) continue;
     EXPECT_EQ(keys, std::set<std::string>{}) << section;
   }
+}
+
+// A table's cells in code type; "" for other ones.
+std::vector<std::string> cellsOf(const std::string &row) {
+  static const std::regex cell(R"(\| (?:`([^`]*)`|[^|]*?) ?(?=\|))");
+  std::vector<std::string> cells;
+  for (std::sregex_iterator it(row.begin(), row.end(), cell), end; it != end; ++it) {
+    cells.push_back((*it)[1]);
+  }
+  return cells;
+}
+
+// The pair that a line gives, as a row of the page has it.
+std::vector<std::string> readLine(const std::string &line) {
+  const TempDir dir;
+  CxPropList list{};
+  const bool good = CxPropListRead(dir.write("file", line).c_str(), &list, nullptr) == 1;
+  std::vector<std::string> cells = {line, "", ""};
+  if (good) cells = {line, list.entries[0].key, list.entries[0].value};
+  CxPropListDiscard(&list);
+  return cells;
+}
+
+TEST(ConfigurationPage, ShowsWhatLinesOfAFileGive) {
+  const std::string page = contents(projectFile("docs/configuration.md"));
+  std::istringstream table(page.substr(page.find("| Line | Left side | Value |\n|---")));
+  int rows = 0;
+  std::string row;
+  std::getline(table, row), std::getline(table, row);
+  while (std::getline(table, row) && !row.empty()) {
+    const std::vector<std::string> cells = cellsOf(row);
+    ASSERT_EQ(cells.size(), 3u) << row;
+    EXPECT_EQ(readLine(cells[0]), cells);
+    ++rows;
+  }
+  EXPECT_GT(rows, 15);
 }
 
 }  // namespace

@@ -388,6 +388,18 @@ TEST_F(ObjectTest, WhatIsDestroyedFindsTheOneThatHeldItInert) {
   EXPECT_EQ(host->takeCalls(), "close outer|close inner|free|free|");
 }
 
+TEST_F(ObjectTest, TakingANameFromTheRegistryDestroysWhenOneHolderIsLeft) {
+  const Handle object = get("a", HostClasses::kHandler);
+  Handle other = get("a");
+  {
+    const ApiLock lock;
+    qlxToolkitRemObjInstance("a");
+  }
+  EXPECT_NE(object->objClass, nullptr);
+  other.reset();
+  EXPECT_EQ(object->objClass, nullptr);
+}
+
 TEST_F(ObjectTest, TakingANameFromTheRegistryLeavesTheHandleInert) {
   const Handle object = get("a", HostClasses::kHandler);
   host->calls.clear();

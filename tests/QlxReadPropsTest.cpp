@@ -66,6 +66,13 @@ INSTANTIATE_TEST_SUITE_P(Lines, QlxReadPropsFileTest,
                          ::testing::Values(File{"", 1, ""},                                  //
                                            File{"a.b=1\r\nc.d : 2\n", 1, "[a.b|1][c.d|2]"},  //
                                            File{"\n\r\n \n# x\n! y\n", 1, ""},               //
+                                           File{"\xEF\xBB\xBFx=1\n# y\n", 1, "[x|1]"},       //
+                                           File{"\xEF\xBB\xBF# x\n", 1, ""},                 //
+                                           File{"\xEF\xBB\xBF", 1, ""},                      //
+                                           File{"\xEF\xBBx=1\n", 1, "[\xEF\xBBx|1]"},        //
+                                           File{"\xEF\xBB\xBF\xEF\xBB\xBFx=1\n", 1,
+                                                "[\xEF\xBB\xBFx|1]"},                        //
+                                           File{"x=\xEF\xBB\xBF\n", 1, "[x|\xEF\xBB\xBF]"},  //
                                            File{"  # note\nx=1\n", 1, "[x|1]"},              //
                                            File{"x.y value\n", 1, "[x.y|value]"},            //
                                            File{"x.y\tvalue\n", 1, "[x.y|value]"},           //

@@ -16,7 +16,8 @@ QLX_BEGIN_DECLS
 /** @return the formatter with a reference for the caller, or null */
 QLX_API QlxObject *QlxHandlerGetFormatter(QlxObject *handler);
 
-/** Makes the handler hold a reference to another formatter; null leaves it without one. */
+/** Makes the handler hold a reference to another formatter; null leaves it without one, an inert
+ *  handle changes nothing. */
 QLX_API void QlxHandlerSetFormatter(QlxObject *handler, QlxObject *formatter);
 
 /** @return what the formatter writes when a destination is opened, or null */

@@ -22,9 +22,9 @@ QLX_BEGIN_DECLS
  * Registers a class. The first registration of a name wins, a later one and a null name are
  * ignored. A null kind operation gets the library's default; a null fAllocVars, fFreeVars or
  * fCfgChange stays null and is skipped (a class without fCfgChange is told of no key). fFreeVars is
- * also called with null, for an object whose fAllocVars gave null. The description may be null. A
- * C++ exception that leaves an operation ends the process with a line on standard error
- * (qlx/class.h).
+ * also called with null: for an object whose fAllocVars gave null, and a second time for one that
+ * the toolkit's closing ends. The description may be null. A C++ exception that leaves an operation
+ * ends the process with a line on standard error (qlx/class.h).
  */
 QLX_API void QlxAddLoggerClass(const char *className, I18Msg *description, fAllocVars allocVars,
                                fFreeVars freeVars, fCfgChange cfgChange, fLog log);
@@ -78,7 +78,8 @@ QLX_API uint8_t QlxIsObjectEnabled(QlxObject *object);
 /** A disabled object (flag 0; only the low 8 bits count) passes no events on. */
 QLX_API void QlxSetObjectEnabled(QlxObject *object, uint32_t flag);
 
-/** Asks a filter; 1 or 0, and 0 for a null event or an object that is no filter. */
+/** Asks a filter. @return what its class's fIsLoggable answers, of the built-in classes 1 or 0; 0
+ *  for a null event or an object that is no filter */
 QLX_API uint8_t QlxIsLoggableByFilter(QlxObject *filter, Event *event, va_list *args);
 
 /* ---- Properties ---- */
@@ -97,7 +98,8 @@ QLX_API double QlxGetObjPropDouble(QlxObject *object, const char *key, uint8_t *
 
 /*
  * Sets a property and tells the object's class of the key, also when storing failed. The string and
- * the bool setter answer 1 when the value was stored.
+ * the bool setter answer 1 when the value was stored. A null key is never stored, and the class's
+ * fCfgChange is called with null: a host's tests for it, the built-in ones ignore it.
  */
 QLX_API uint8_t QlxSetObjProp(QlxObject *object, const char *key, const char *value);
 QLX_API uint8_t QlxSetObjPropBool(QlxObject *object, const char *key, uint8_t value);
@@ -112,7 +114,8 @@ QLX_API void QlxSetObjPropDouble(QlxObject *object, const char *key, double valu
  * Makes `listener` get the events of `object`, after those added before; the object holds a
  * reference to it.
  *
- * @return 1 when added, 0 for one already there, a null one, or an object that has no listeners
+ * @return 1 when added, 0 for one already there, a null or inert one, an object that has no
+ *         listeners, and when memory ran out
  */
 QLX_API uint8_t QlxAddListener(QlxObject *object, QlxObject *listener);
 

@@ -20,7 +20,8 @@ QLX_BEGIN_DECLS
  * Reads a properties file into a list, whose earlier entries stay. Entries read before a failure
  * stay too.
  *
- * @param path    the file's name; backslashes separate as "/" does
+ * @param path    the file's name, of at most 256 bytes; backslashes separate as "/" does. What it
+ *                may lead to, and the failures, are those of QlxOpenToolkit()
  * @param status  optional; written only when the system fails, never for a syntax error
  * @return 1 when the whole file was read; 0 for a null list, a syntax error, a failure of the
  * system or exhausted memory

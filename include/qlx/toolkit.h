@@ -19,10 +19,19 @@ QLX_BEGIN_DECLS
  * file, and the logger "quill.errorLogger" with its console handler. Opening an open toolkit does
  * nothing (its file is not read), and opens are not counted: one close undoes any number of them.
  *
- * @param configFileName  path of a properties file, or null
+ * The file is read before anything is opened and without the API lock, so a pipe that somebody
+ * fills late keeps no other thread waiting. When another thread has opened the toolkit meanwhile,
+ * the file counts for nothing, also when it failed. The thread is not cancelled before the file is
+ * read to its end.
+ *
+ * @param configFileName  path of a properties file, or null: at most 256 bytes, backslashes
+ *                        separate as "/" does; a regular file, or a pipe that ends ("/dev/fd/3"),
+ *                        of at most 64 MiB
  * @param status          borrowed, may be null; written only when the file cannot be read or is
  *                        refused: {'p', error number} for a system error, {'-', 0} for a file that
- *                        was refused (a syntax error, a key without a dot)
+ *                        was refused (a syntax error, a key without a dot). A longer path gives
+ *                        {'p', ENAMETOOLONG}, a longer file {'p', EFBIG}, a folder {'p', EISDIR},
+ *                        a device {'p', EINVAL}
  * @return 1 when the toolkit is open; 0 when the file failed (the toolkit is closed again) or the
  *         API lock cannot be taken
  */

@@ -151,13 +151,13 @@ typedef enum ObjKind { Logger = 101, Filter = 102, Handler = 103, Formatter = 10
 
 /*
  * Operations of a class. They run with the API lock held and may call only functions that take no
- * lock: the qlxIntl... twins, the qlx... helpers and the Qlx<Class>F<Operation> operations. An
- * exception that leaves one ends the process (qlx/class.h). `args`
- * is the argument list of the log call, may be null, and is consumed only through a va_copy.
+ * lock: the qlxIntl... twins, the qlx... helpers and the Qlx<Class>F<Operation> operations. `args`
+ * is the argument list of the log call, may be null, and is consumed only through a va_copy. A C++
+ * exception that leaves an operation ends the process (qlx/class.h).
  */
 typedef void *(*fAllocVars)(void);     /**< variables of a new object, or null */
 typedef void (*fFreeVars)(void *vars); /**< frees them; also called with null */
-typedef void (*fCfgChange)(QlxObject *object, const char *key);
+typedef void (*fCfgChange)(QlxObject *object, const char *key); /**< the key may be null */
 typedef void (*fLog)(QlxObject *object, Event *event, va_list *args);
 typedef void (*fProcess)(QlxObject *object, Event *event, va_list *args);
 typedef uint8_t (*fIsLoggable)(QlxObject *filter, Event *event, va_list *args);

@@ -28,6 +28,7 @@ QLX_API void QlxBasicHandlerFClose(QlxObject *handler);
 /*
  * The console handler: writes to the standard output stream, each text with a line feed of its own.
  * The first event, or an explicit open, writes the formatter's header; closing writes its trailer.
+ * A disabled handler does nothing with an event, and a null one is ignored.
  */
 QLX_API void *QlxConsoleHandlerFAllocVars(void);
 QLX_API void QlxConsoleHandlerFFreeVars(void *vars);
@@ -69,7 +70,8 @@ QLX_API void QlxFileHandlerFClose(QlxObject *handler);
  * changes its name: at rollover it is copied to generation 1 and truncated.
  */
 /** Opens the file, and writes under the semaphore. Deliberate: while the file cannot be opened the
- *  event is not passed on; when the semaphore fails it is, but its record is dropped. */
+ *  event is not passed on; when the semaphore fails it is, but its record is dropped. A disabled
+ *  handler does nothing, and a null event is ignored. */
 QLX_API void QlxMultiProcFileUHandlerFProcess(QlxObject *handler, Event *event, va_list *args);
 /** QlxMultiProcFileHandlerFOpenWithErr() without its answer. */
 QLX_API void QlxMultiProcFileHandlerFOpen(QlxObject *handler);

@@ -53,7 +53,8 @@ QLX_API uint8_t qlxIntlAddListener(QlxObject *object, QlxObject *listener);
 QLX_API uint8_t qlxIntlRemListener(QlxObject *object, QlxObject *listener);
 QLX_API ListenerGroupNode *qlxIntlGetListeners(QlxObject *object);
 
-/** @return the object's property map, owned by it and made on first use; null for null */
+/** @return the object's property map, owned by it and made on first use; null for null, for an
+ * object without class, and when memory ran out */
 QLX_API StringToStringMap *qlxFetchObjPropMap(QlxObject *object);
 
 /**
@@ -63,10 +64,12 @@ QLX_API StringToStringMap *qlxFetchObjPropMap(QlxObject *object);
  */
 QLX_API ListenerGroup *qlxFetchListenerGroup(QlxObject *object, uint8_t create);
 
-/** Calls the class's fCfgChange, when object, class and operation are there. */
+/** Calls the class's fCfgChange, when object, class and operation are there; with null for a null
+ *  key. */
 QLX_API void qlxNotifyObjCfgChange(QlxObject *object, const char *key);
 
-/** Makes an unregistered class record without kind operations; null for a null or known name. */
+/** Makes an unregistered class record without kind operations; null for a null or known name, and
+ *  when memory ran out. */
 QLX_API ObjClass *qlxInitObjectClass(const char *className, int32_t kind, I18Msg *description,
                                      fAllocVars allocVars, fFreeVars freeVars,
                                      fCfgChange cfgChange);
@@ -86,7 +89,8 @@ QLX_API void QlxBasicObjectFLog(QlxObject *object, Event *event, va_list *args);
 
 /**
  * Reacts to the keys that all classes share: "logging" and "listenerNames" (and "description...",
- * which have no effect). A class's own fCfgChange hands the keys it does not know to this.
+ * which have no effect); a null key is ignored. A class's own fCfgChange hands the keys it does not
+ * know to this.
  */
 QLX_API void QlxBasicObjectFCfgChange(QlxObject *object, const char *key);
 

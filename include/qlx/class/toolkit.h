@@ -46,8 +46,12 @@ QLX_API void qlxToolkitAddObjInstance(const char *objectName, QlxObject *object)
 /** @return the object of that name with a reference for the caller, or null */
 QLX_API QlxObject *qlxToolkitGetObjInstance(const char *objectName);
 
-/** Removes a name and releases the registry's reference; an unknown name is ignored. Who holds the
- *  object then gives it back before the toolkit is closed, which ends registered objects only. */
+/**
+ * Removes a name and releases the registry's reference; a null or unknown name is ignored. Like any
+ * release this destroys an object that has one reference left, be it a holder's, whose handle is
+ * inert then: with one holder that is now, with more when all but one have given it back. Who holds
+ * the object then gives it back before the toolkit is closed, which ends registered objects only.
+ */
 QLX_API void qlxToolkitRemObjInstance(const char *objectName);
 
 QLX_END_DECLS

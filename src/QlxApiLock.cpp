@@ -20,7 +20,7 @@ std::atomic<CxMutex> gMutex;     // set once
 std::atomic<bool> gForkHandled;  // the fork handlers are registered, or about to be
 std::atomic<pthread_t> gHolder;  // who holds gMutex; only the holder itself relies on it
 bool gTakenForFork;              // written and read only by the thread that holds gMutex
-int gCancelState;                // of the thread that holds gMutex, as it was before
+CxCancellation gCancellation;    // of the thread that holds gMutex, as it was before
 
 bool heldByThisThread() {
   return gHolder.load(std::memory_order_relaxed) == pthread_self();
@@ -72,12 +72,12 @@ bool take() {
 }  // namespace
 
 uint8_t qlxAPIMutexLock(void) {
-  const int cancelState = cxThreadDisableCancel();
+  const CxCancellation before = cxThreadDisableCancel();
   if (!take()) {
-    cxThreadRestoreCancel(cancelState);
+    cxThreadRestoreCancel(before);
     return 0;
   }
-  gCancelState = cancelState;
+  gCancellation = before;
   gHolder.store(pthread_self(), std::memory_order_relaxed);
   return 1;
 }
@@ -86,8 +86,8 @@ void qlxAPIMutexUnlock(void) {
   CxMutex mutex = gMutex.load(std::memory_order_acquire);
   if (!mutex) return;
   const bool isHolder = heldByThisThread();
-  const int cancelState = gCancelState;
+  const CxCancellation before = gCancellation;
   gHolder.store(pthread_t{}, std::memory_order_relaxed);
   succeeded(CxMutexUnlock(&mutex));
-  if (isHolder) cxThreadRestoreCancel(cancelState);
+  if (isHolder) cxThreadRestoreCancel(before);
 }

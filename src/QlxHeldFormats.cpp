@@ -15,7 +15,7 @@
 #include "util/CxThread.h"
 
 static pthread_mutex_t gLock = PTHREAD_MUTEX_INITIALIZER;
-static int gCancelState;  // of the thread that holds gLock, as it was before
+static CxCancellation gCancellation;  // of the thread that holds gLock, as it was before
 
 // What the held formats were made under. A name that does not fit is kept cut, and so never found
 // the same: nothing is then held for longer than a call.
@@ -82,13 +82,13 @@ void qlxDropHeldFormats(void) {
 }
 
 void qlxHeldFormatsLock(void) {
-  const int cancelState = cxThreadDisableCancel();
+  const CxCancellation before = cxThreadDisableCancel();
   pthread_mutex_lock(&gLock);
-  gCancelState = cancelState;
+  gCancellation = before;
 }
 
 void qlxHeldFormatsUnlock(void) {
-  const int cancelState = gCancelState;
+  const CxCancellation before = gCancellation;
   pthread_mutex_unlock(&gLock);
-  cxThreadRestoreCancel(cancelState);
+  cxThreadRestoreCancel(before);
 }

@@ -160,6 +160,20 @@ TEST(CancellationTest, StaysOffWhereTheHostHasItOff) {
   pthread_setcancelstate(state, &state);
 }
 
+// The C library's signal of an asynchronous cancellation ends a thread that was of that type when
+// it was sent, whatever its state is when it comes.
+TEST(CancellationTest, IsDeferredWhileTheLockIsHeldAndAsBeforeAfterIt) {
+  setType(kAsynchronous);
+  int type = -1;
+  {
+    const ApiLock lock;
+    pthread_setcanceltype(PTHREAD_CANCEL_DEFERRED, &type);
+    EXPECT_EQ(type, PTHREAD_CANCEL_DEFERRED);
+  }
+  pthread_setcanceltype(PTHREAD_CANCEL_DEFERRED, &type);
+  EXPECT_EQ(type, PTHREAD_CANCEL_ASYNCHRONOUS);
+}
+
 TEST(CancellationTest, IsAsBeforeWhenTheLockCannotBeHad) {
   inFreshProcess([] {
     FailingMemory memory;

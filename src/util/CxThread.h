@@ -11,16 +11,24 @@ uint32_t cxIntlSleepSeconds(uint32_t milliseconds);
 
 QLX_END_DECLS
 
-// Keeps the calling thread from being cancelled, of whichever type; returns the state before, for
+// A thread's state and type of cancellation.
+struct CxCancellation {
+  int state, type;
+};
+
+// Keeps the calling thread from being cancelled, of whichever type; returns what holds before, for
 // cxThreadRestoreCancel(), which ends a thread of asynchronous type at once when it was cancelled
-// meanwhile.
-inline int cxThreadDisableCancel() {
-  int before = PTHREAD_CANCEL_ENABLE;
-  pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &before);
+// meanwhile. The state alone is not enough: the signal that cancels such a thread may be on its way
+// already, and ends it also under a state that does not allow it.
+inline CxCancellation cxThreadDisableCancel() {
+  CxCancellation before = {PTHREAD_CANCEL_ENABLE, PTHREAD_CANCEL_DEFERRED};
+  pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &before.state);
+  pthread_setcanceltype(PTHREAD_CANCEL_DEFERRED, &before.type);
   return before;
 }
-inline void cxThreadRestoreCancel(int before) {
-  pthread_setcancelstate(before, nullptr);
+inline void cxThreadRestoreCancel(CxCancellation before) {
+  pthread_setcancelstate(before.state, nullptr);
+  pthread_setcanceltype(before.type, nullptr);
 }
 
 // Keeps it from being cancelled for a scope.
@@ -32,7 +40,7 @@ class CxNoCancel {
   CxNoCancel &operator=(const CxNoCancel &) = delete;
 
  private:
-  int before_;
+  CxCancellation before_;
 };
 
 #endif

@@ -19,8 +19,9 @@ QLX_BEGIN_DECLS
  */
 QLX_API uint8_t qlxAPIMutexLock(void);
 
-/** Releases the API lock, and sets the thread's cancellation state as it was before the lock was
- *  taken. By the thread that took it; before the first call of the library it does nothing. */
+/** Releases the API lock, and sets the thread's cancellation state and type as they were before the
+ *  lock was taken. By the thread that took it; before the first call of the library it does
+ * nothing. */
 QLX_API void qlxAPIMutexUnlock(void);
 
 /** @return the toolkit logger, borrowed; null while the toolkit is closed */

@@ -262,6 +262,7 @@ NULL_GROUP(MultiProcessFileHandlers) {
   HELD(QlxMultiProcFileHandlerFOpen, with(nullptr), nothing);
   HELD(QlxMultiProcFileHandlerFOpenWithErr, with(nullptr), is(kSuccess));
   HELD(QlxMultiProcFileHandlerFClose, with(nullptr), nothing);
+  HELD(qlxIntlGetHandlerProblems, with(nullptr), nothing);
   EXPECT_EQ(event->status, kSuccess);
   EXPECT_EQ(dir.read("app.log"), "' text\n");
   semctl(qlxFileHandlerVars(handler)->semId, 0, IPC_RMID);

@@ -100,14 +100,15 @@ using Directory = Owned<DIR, closedir>;
 
 }  // namespace
 
-// The number of a generation by the name of its file; 0 for a file that is none.
+// The number of a generation by the name of its file; not above 0 for a file that is none. A name
+// that writes a number otherwise, such as app01.log, does no harm: it is not the one that is moved.
 static int32_t numberOf(std::string_view name, std::string_view base, const char *extension) {
   if (!name.starts_with(base)) return 0;
   name.remove_prefix(base.size());
   int32_t number = 0;
   const char *const end = name.data() + name.size();
   const auto [rest, error] = std::from_chars(name.data(), end, number);
-  if (error != std::errc() || number < 1 || name.front() == '0') return 0;
+  if (error != std::errc()) return 0;
   const std::string_view after{rest, static_cast<size_t>(end - rest)};
   const bool isOurs =
       extension ? after.starts_with('.') && after.substr(1) == extension : after.empty();

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <cerrno>
 #include <memory>
 #include <string>
 
@@ -168,8 +169,10 @@ TEST(FileNames, AreAllOrNothingWhenMemoryRunsOut) {
     EXPECT_EQ(vars->basePart, nullptr);
     EXPECT_EQ(vars->extPart, nullptr);
     EXPECT_EQ(vars->generation, 0);
+    EXPECT_EQ(qlxFHCheckNames(vars.get()).code, ENOMEM);
   }
   EXPECT_EQ(show(vars->dirPart), "logs");
+  EXPECT_EQ(qlxFHCheckNames(vars.get()).kind, '-');
 }
 
 // ---- Putting together

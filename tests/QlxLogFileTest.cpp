@@ -168,6 +168,7 @@ TEST_P(LogFileTest, IsEachHandlersOwnAlsoWhenBothWriteTheSameFile) {
     log(u"2");
     QlxAddListener(logger.get(), handler.get());
     set("maxFiles", "4");  // closes what is its own
+    EXPECT_TRUE(isOpen(static_cast<QlxFileHandlerVars *>(second->vars)->file));
     EXPECT_EQ(logged(u"3"), kSuccess);
     EXPECT_NE(vars()->file, static_cast<QlxFileHandlerVars *>(second->vars)->file);
   });

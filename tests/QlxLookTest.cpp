@@ -2,6 +2,7 @@
 #include "QlxLook.h"
 
 #include <filesystem>
+#include <unistd.h>
 #include <fstream>
 
 #include "support/Child.h"
@@ -114,6 +115,14 @@ TEST_F(BurstTest, MeasuresBeforeItRolls) {
   for (int i = 0; i < 30; ++i) log(u"123456789");        // by the count it is full meanwhile
   EXPECT_EQ(dir.read("app.log").size(), 300u);
   EXPECT_FALSE(dir.has("app1.log"));
+}
+
+TEST_F(BurstTest, LosesNoRecordWhenItsDescriptorIsClosed) {
+  burst();
+  ASSERT_EQ(::close(vars()->file), 0);
+  EXPECT_EQ(logged(u"same tick"), kSuccess);
+  const std::string all = dir.read("app.log");
+  EXPECT_EQ(all.substr(all.rfind("looking")), "looking\nsame tick\n");
 }
 
 TEST_F(BurstTest, LooksAtOnceAfterAFailure) {

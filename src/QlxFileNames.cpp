@@ -2,6 +2,7 @@
 // extension, and put together again for each generation.
 #include "QlxFileNames.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
@@ -80,6 +81,7 @@ static int32_t cutNumber(char *stem) {
 static void getCurrentDirectory(char buffer[kMaxNameBytes + 1]) {
   const CxStatus status = CxProcessGetCwd(buffer, kMaxNameBytes + 1);
   if (qlxFailed(status)) QlxReportPlatformErr(status);
+  std::replace(buffer, buffer + OslStringLen(buffer), '\\', '/');  // as in the name
 }
 
 void qlxFHGetFileNameParts(const char *name, QlxFileHandlerVars *vars) {

@@ -14,6 +14,7 @@
 #include "support/FileSizeLimit.h"
 #include "support/SemaphoreKey.h"
 #include "support/SystemCalls.h"
+#include "support/WorkingDir.h"
 
 namespace {
 
@@ -299,7 +300,31 @@ TEST_P(LogFileTest, NeitherMovesNorEmptiesWhatALinkToADescriptorLeadsTo) {  // s
   ::close(file);
 }
 
+TEST_P(LogFileTest, NeitherMovesNorEmptiesWhatALinkToAStandardStreamLeadsTo) {
+  std::filesystem::create_symlink("/dev/stdout", dir.path("app.log"));
+  dir.write("output", "before\n");
+  Child child([&] {
+    ASSERT_EQ(dup2(::open(dir.path("output").c_str(), O_RDWR), STDOUT_FILENO), STDOUT_FILENO);
+    set("maxFileBytes", "1");
+    EXPECT_EQ(logged(u"1"), kSuccess);
+    EXPECT_EQ(logged(u"2"), kSuccess);
+  });
+  EXPECT_EQ(child.end(), 0);
+  EXPECT_EQ(dir.read("output"), "before\n1\n2\n");
+  EXPECT_EQ(dir.list(), (std::vector<std::string>{"app.log", "output"}));
+}
+
 // ---- Names
+
+// What is opened is then looked at, moved and emptied under the very same name.
+TEST_P(LogFileTest, TakesABackslashInTheWorkingDirectoryForASeparator) {
+  std::filesystem::create_directory(dir.path("a\\b"));
+  const WorkingDir here{dir.path("a\\b")};
+  set("fileName", "app.log");
+  set("appending", "false");
+  for (const char16_t *text : {u"1", u"2"}) EXPECT_EQ(logged(text), kSuccess);
+  EXPECT_EQ(dir.read("a/b/app.log"), "1\n2\n");
+}
 
 TEST_P(LogFileTest, RefusesANameThatIsTooLongForAGeneration) {
   set("maxFiles", "100");

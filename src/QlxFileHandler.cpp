@@ -191,8 +191,9 @@ static CxStatus writeAnew(QlxObject *handler, QlxFileHandlerVars *vars,
 // Formatting has effects of its own on the event, so it is done without an open file too.
 static void formatAndWrite(QlxObject *handler, QlxFileHandlerVars *vars, Event *event,
                            va_list *args) {
+  const bool isOpen = vars->opened == 1;  // unless a host's formatter closes it
   const FormattedBytes text{handler, event, args};
-  if (!text || vars->opened != 1) return;
+  if (!text || !isOpen) return;
   CxStatus status = qlxFileHandlerWriteText(vars, text);
   if (status.code == EBADF) status = writeAnew(handler, vars, text);
   qlxKeepLost(event, status);

@@ -135,6 +135,7 @@ static CxStatus note(QlxFileHandlerVars *vars) {
 }
 
 CxStatus qlxLogFileOpen(QlxFileHandlerVars *vars, int32_t existing) {
+  qlxLogFileClose(vars);  // a formatter that logs while it makes the header has opened it, too
   CxFile file = -1;
   CxStatus status = openName(vars, existing, &file);
   if (qlxFailed(status)) return status;

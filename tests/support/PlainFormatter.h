@@ -3,6 +3,7 @@
 #ifndef QLX_TESTS_PLAINFORMATTER_H
 #define QLX_TESTS_PLAINFORMATTER_H
 
+#include <functional>
 #include <optional>
 #include <string>
 
@@ -27,6 +28,8 @@ class PlainFormatter {
   int formatted = 0;                           // calls of format
   int trailersAsked = 0;                       // calls of getTrailer
 
+  std::function<void()> inFormat, inHeader;  // what else these do first
+
  private:
   static PlainFormatter *&current() {
     static PlainFormatter *object;
@@ -35,6 +38,7 @@ class PlainFormatter {
 
   static UChar *format(QlxObject *, Event *event, va_list *args) {
     ++current()->formatted;
+    if (current()->inFormat) current()->inFormat();
     if (current()->silent) return nullptr;
     UChar *bound = QlxBindEventUMsg(event, qlxIntlBindUI18Msg, args);
     const std::u16string line = (bound ? std::u16string(bound) : u"") + u"\n";
@@ -45,7 +49,10 @@ class PlainFormatter {
   static char *duplicate(const std::optional<std::string> &text) {
     return text ? OslStringDup(text->c_str()) : nullptr;
   }
-  static char *getHeader(QlxObject *) { return duplicate(current()->header); }
+  static char *getHeader(QlxObject *) {
+    if (current()->inHeader) current()->inHeader();
+    return duplicate(current()->header);
+  }
   static char *getTrailer(QlxObject *) {
     ++current()->trailersAsked;
     return duplicate(current()->trailer);

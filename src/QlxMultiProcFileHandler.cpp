@@ -102,10 +102,15 @@ static bool copyActiveFile(QlxFileHandlerVars *vars, Event *event, QlxFileName m
          copyToFirstGeneration(vars, event, made);
 }
 
-static void emptyActiveFile(QlxFileHandlerVars *vars, Event *event) {
-  if (!keep(vars, event, qlxLogFileMeasure(vars))) return;  // not ours any more
-  keep(vars, event, cxUntilDone([&] { return CxFileTrunc(&vars->file); }));
+// Who does not wait for the semaphore may have appended again before the new size is seen.
+static bool emptyActiveFile(QlxFileHandlerVars *vars, Event *event) {
+  if (!keep(vars, event, qlxLogFileMeasure(vars))) return false;  // not ours any more
+  const uint64_t before = vars->size;
+  const auto empty = [&] { return cxStatusOfCall(ftruncate(vars->file, 0) == 0); };
+  const bool emptied = keep(vars, event, cxUntilDone(empty));
   keep(vars, event, CxFileSeek(&vars->file, 0, SEEK_SET));
+  const bool isSmaller = !qlxFailed(qlxLogFileMeasure(vars)) && vars->size < before;
+  return emptied || isSmaller;
 }
 
 // False when the file is as full as before; then there is no copy of it either.
@@ -113,10 +118,9 @@ static bool rollActiveFile(QlxFileHandlerVars *vars, Event *event) {
   QlxFileName made = "";
   const bool copied = copyActiveFile(vars, event, made);
   // Deliberate: else whatever became of the copy, so that the file never grows past its limit.
-  if (copied || !vars->keepFullFile) emptyActiveFile(vars, event);
-  const bool isFull = !qlxFailed(qlxLogFileMeasure(vars)) && vars->size > 0;
-  if (isFull && made[0]) unlink(made);
-  return !isFull;
+  const bool emptied = (copied || !vars->keepFullFile) && emptyActiveFile(vars, event);
+  if (!emptied && made[0]) unlink(made);
+  return emptied;
 }
 
 // ---- A file that stays full is copied once a second, and costs no older generation.

@@ -299,6 +299,17 @@ TEST_F(MultiProcFileHandlerTest, KeepsTheCopyOfAFileThatWasEmptiedWithoutAnAnswe
   EXPECT_EQ(generations(), "two| one| - -");
 }
 
+TEST_F(MultiProcFileHandlerTest, KeepsTheCopyWhenSomebodyAppendsToTheEmptiedFileAtOnce) {
+  rollAlways("3");
+  log(u"one");
+  calls.onSeek = [this](int, int) {  // somebody who does not wait for the semaphore
+    if (dir.read("app.log").empty()) dir.write("app.log", "foreign\n");
+    return 0;
+  };
+  EXPECT_EQ(logged(u"two"), kSuccess);
+  EXPECT_EQ(generations(), "foreign|two| one| - -");
+}
+
 TEST_F(MultiProcFileHandlerTest, TriesInterruptedCallsAgain) {
   rollAlways("2");
   log(u"one");

@@ -121,14 +121,18 @@ static CxStatus openName(QlxFileHandlerVars *vars, int32_t existing, CxFile *fil
   return status;
 }
 
+static void takeSize(QlxFileHandlerVars *vars, const Found &found) {
+  vars->size = static_cast<uint64_t>(found.size);
+  if (found.size == 0) vars->log.torn = 0;
+}
+
 static CxStatus note(QlxFileHandlerVars *vars) {
   Found found;
   const CxStatus status = findOpen(vars->file, &found);
   if (qlxFailed(status)) return status;
   vars->log.device = found.device;
   vars->log.inode = found.inode;
-  vars->size = static_cast<uint64_t>(found.size);
-  if (found.size == 0) vars->log.torn = 0;
+  takeSize(vars, found);
   if (found.isRegular) return kCxSuccess;
   vars->log.rolls = 0;
   return cxStatusOfCall(fcntl(vars->file, F_SETFL, O_APPEND | O_NONBLOCK) == 0);
@@ -157,7 +161,7 @@ CxStatus qlxLogFileMeasure(QlxFileHandlerVars *vars) {
   const CxStatus status = findOpen(vars->file, &found);
   if (qlxFailed(status)) return status;
   if (found.device != vars->log.device || found.inode != vars->log.inode) return cxFailure(EBADF);
-  vars->size = static_cast<uint64_t>(found.size);
+  takeSize(vars, found);
   return kCxSuccess;
 }
 

@@ -242,6 +242,18 @@ TEST_P(LogFileTest, StartsAnotherFileWithoutAnEmptyLine) {
   EXPECT_EQ(dir.read("other.log"), "next\n");
 }
 
+TEST_P(LogFileTest, StartsTheFileAfterARolloverWithoutAnEmptyLine) {
+  set("maxFileBytes", "1");
+  calls.onTruncate = [](int) { return EPERM; };
+  {
+    const FileSizeLimit full{3};
+    EXPECT_EQ(logged(u"67890"), failure(EFBIG));
+  }
+  calls.onTruncate = nullptr;
+  EXPECT_EQ(logged(u"next"), kSuccess);
+  EXPECT_EQ(generations(), "next| 678 - -");
+}
+
 // ---- What is no regular file
 
 TEST_P(LogFileTest, NeverWaitsForTheReaderOfAFifo) {

@@ -213,7 +213,8 @@ CxStatus qlxLogFileWrite(QlxFileHandlerVars *vars, const char *bytes, uint32_t l
 
 void qlxLogFileReserve(QlxFileHandlerVars *vars) {
   if (vars->log.reserve >= 0) return;
-  const int number = duplicateFrom(kHighNumber, vars->file);
+  int number = duplicateFrom(kHighNumber, vars->file);
+  if (number == -1) number = duplicateFrom(kFirstFreeNumber, vars->file);
   if (number != -1) claim(vars, number, &vars->log.reserve);
 }
 

@@ -345,16 +345,21 @@ TEST_F(MultiProcFileHandlerTest, RollsStepByStepForItsCallers) {
 // ---- No descriptors left
 
 TEST_F(MultiProcFileHandlerTest, CopiesWithTheNumberThatItHasInReserve) {
-  rollAlways("5");
-  log(u"1");
-  std::vector<int> taken;
-  for (int number; (number = ::open("/dev/null", O_RDONLY | O_CLOEXEC)) != -1;) {
-    taken.push_back(number);
+  for (const rlim_t numbers : {rlim_t{1024}, rlim_t{64}}) {  // high ones, and low ones
+    Child child([&] {
+      const rlimit limit{numbers, numbers};
+      setrlimit(RLIMIT_NOFILE, &limit);
+      rollAlways("5");
+      log(u"1");
+      while (::open("/dev/null", O_RDONLY | O_CLOEXEC) != -1) {
+      }
+      ASSERT_EQ(errno, EMFILE);
+      for (const char16_t *text : {u"2", u"3", u"4"}) EXPECT_EQ(logged(text), kSuccess);
+    });
+    EXPECT_EQ(child.end(), 0);
+    EXPECT_EQ(generations(), "4| 3| 2| 1|");
+    for (const std::string &name : dir.list()) std::filesystem::remove(dir.path(name));
   }
-  ASSERT_EQ(errno, EMFILE);
-  for (const char16_t *text : {u"2", u"3", u"4"}) EXPECT_EQ(logged(text), kSuccess);
-  for (const int number : taken) ::close(number);
-  EXPECT_EQ(generations(), "4| 3| 2| 1|");
 }
 
 // ---- keepFullFile: what could not be copied is not emptied

@@ -57,7 +57,7 @@ bool qlxLeadsToFile(const char *name) {
 // Links to descriptors, such as /dev/stdout: what they lead to is not this name's, so it must
 // neither be renamed nor truncated.
 static bool isDescriptorsName(const char *name) {
-  static constexpr const char *kPlaces[] = {"/proc/", "/dev/fd/"};
+  static constexpr const char *kPlaces[] = {"/proc/", "/dev/fd/", "/dev/std"};
   char target[sizeof "/dev/fd/"] = "";
   const ssize_t length = readlink(name, target, sizeof target - 1);
   for (const char *place : kPlaces) {

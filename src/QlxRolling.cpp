@@ -10,6 +10,7 @@
 #include <dirent.h>
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <qlx/files.h>
 #include <qlx/memory.h>
@@ -168,8 +169,24 @@ bool qlxFreeFirstGeneration(QlxFileHandlerVars *vars, Event *event) {
   return true;
 }
 
+// What the system will say, as far as that can be foretold: else each process of a service that is
+// started again and again would find it out at the cost of a generation.
+static bool mayMoveActiveFile(const QlxFileHandlerVars *vars) {
+  QlxFileName name;
+  qlxFHWriteName(vars, 0, name);
+  struct statx file, directory;
+  const char *const parent = vars->dirPart ? vars->dirPart : ".";
+  if (statx(AT_FDCWD, name, AT_SYMLINK_NOFOLLOW, STATX_UID, &file) != 0) return true;
+  if (file.stx_attributes & (STATX_ATTR_APPEND | STATX_ATTR_IMMUTABLE)) return false;
+  if (statx(AT_FDCWD, parent, 0, STATX_MODE | STATX_UID, &directory) != 0) return true;
+  const uid_t user = geteuid();
+  const bool isOwner = user == 0 || user == file.stx_uid || user == directory.stx_uid;
+  return isOwner || !(directory.stx_mode & S_ISVTX);
+}
+
 bool qlxMoveActiveFile(QlxFileHandlerVars *vars) {
   if (vars->maxFiles < 2) return false;
+  vars->stuck = vars->stuck || !mayMoveActiveFile(vars);
   const auto makeRoom = vars->stuck ? qlxFreeFirstGeneration : qlxShiftGenerations;
   const auto move = vars->stuck ? renameIntoGap : renameOver;
   vars->stuck = !makeRoom(vars, nullptr) || !moveUp(vars, 0, move, nullptr);

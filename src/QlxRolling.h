@@ -3,7 +3,7 @@
 // Nothing here replaces a file that could not be moved. A move that fails ends the moving, and
 // leaves a gap above it; from then on the files below that gap are moved into it, and nothing else,
 // until the active file itself has moved: a rollover that fails again and again costs no older
-// file.
+// file. A process that can foresee it begins that way.
 //
 // The names have been checked (qlxFHCheckNames()). Failures are told as those of a rollover, with
 // the event, which may be null; a missing file is none.

@@ -126,18 +126,26 @@ void becomeNobody() {
   if (geteuid() != 0 || setresuid(65534, 65534, 65534) != 0) _exit(kNotAllowed);
 }
 
-TEST_F(FileHandlerTest, LeavesTheOlderGenerationsWhileTheActiveFileCannotBeMoved) {
+class SharedFolderTest : public FileHandlerTest {
+ protected:
+  void SetUp() override {
+    FileHandlerTest::SetUp();
+    for (const char *name : {"app.log", "app1.log", "app2.log", "app3.log"}) {
+      folder.write(name, std::string(name) + "\n");
+      chmod(folder.path(name).c_str(), 0666);
+      if (name[3] != '.') (void)!chown(folder.path(name).c_str(), 65534, 65534);
+    }
+    ASSERT_EQ(chmod(folder.path().c_str(), 01777), 0);
+    set("fileName", folder.path("app.log"));
+    set("maxFileBytes", "1");
+  }
+
+  const TempDir folder;
+};
+
+TEST_F(SharedFolderTest, LeavesTheOlderGenerationsWhileTheActiveFileCannotBeMoved) {
   formatter->header = "head\n";
   formatter->trailer = "tail\n";
-  const TempDir folder;
-  for (const char *name : {"app.log", "app1.log", "app2.log", "app3.log"}) {
-    folder.write(name, std::string(name) + "\n");
-    chmod(folder.path(name).c_str(), 0666);
-    if (name[3] != '.') (void)!chown(folder.path(name).c_str(), 65534, 65534);
-  }
-  ASSERT_EQ(chmod(folder.path().c_str(), 01777), 0);
-  set("fileName", folder.path("app.log"));
-  set("maxFileBytes", "1");
   set("maxFiles", "5");
   Child child([&] {
     becomeNobody();
@@ -155,6 +163,21 @@ TEST_F(FileHandlerTest, LeavesTheOlderGenerationsWhileTheActiveFileCannotBeMoved
   EXPECT_FALSE(folder.has("app1.log"));
   EXPECT_EQ(folder.read("app2.log"), "app1.log\n");
   EXPECT_EQ(folder.read("app4.log"), "app3.log\n");
+}
+
+TEST_F(SharedFolderTest, LeavesTheOlderGenerationsHoweverOftenItsProcessIsStarted) {
+  set("maxFiles", "4");
+  for (int process = 1; process <= 5; ++process) {
+    Child child([&] {
+      becomeNobody();
+      EXPECT_EQ(logged(u"1"), kSuccess);
+    });
+    const int end = child.end();
+    if (end == kNotAllowed) GTEST_SKIP() << "this process may not become another user";
+    ASSERT_EQ(end, 0);
+    EXPECT_EQ(folder.list(), (std::vector<std::string>{"app.log", "app2.log", "app3.log"}));
+  }
+  EXPECT_EQ(folder.read("app2.log") + folder.read("app3.log"), "app1.log\napp2.log\n");
 }
 
 TEST_F(FileHandlerTest, MovesTheFileOnceItCanBe) {

@@ -128,11 +128,14 @@ static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
   if (qlxFailed(status)) {
     qlxKeepFailure(nullptr, status);
     closeFile(vars);
+    vars->log.taken = 1;
     return false;
   }
   if (!vars->log.rolls) return true;
-  if (!qlxLeadsToFile(vars->fullName)) {
+  const CxStatus there = qlxLeadsToFile(vars->fullName);
+  if (qlxFailed(there)) {
     QlxFileHandlerFClose(handler);
+    vars->log.taken |= there.code != ENOENT;  // it may be there with all that was written
     return false;
   }
   return !qlxFileHandlerIsFull(vars) || !rollOver(handler, vars);

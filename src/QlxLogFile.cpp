@@ -49,9 +49,10 @@ static CxStatus findOpen(CxFile file, Found *found) {
   return file < 0 ? cxFailure(EBADF) : find(file, "", AT_EMPTY_PATH, found);
 }
 
-bool qlxLeadsToFile(const char *name) {
+CxStatus qlxLeadsToFile(const char *name) {
   Found found;
-  return !qlxFailed(find(AT_FDCWD, name, 0, &found)) && found.isRegular;
+  const CxStatus status = find(AT_FDCWD, name, 0, &found);
+  return qlxFailed(status) || found.isRegular ? status : cxFailure(ENOENT);
 }
 
 // Links to descriptors, such as /dev/stdout: what they lead to is not this name's, so it must

@@ -20,7 +20,7 @@ typedef struct QlxLogFile {
   uint64_t device, inode;    // of what was opened
   uint8_t rolls;             // 1: a regular file that may be renamed and truncated
   uint8_t torn;              // 1: ends in a piece of a record
-  uint8_t taken;             // 1: the descriptor was, so what it had written is kept
+  uint8_t taken;             // 1: the descriptor was, or it seems so: what it had written is kept
   CxFile reserve;            // a number to give up when there are none left; -1: none
   QlxLook look;              // at the path and at the descriptor
   QlxFileHandlerVars *next;  // all handlers with an open file, in no order
@@ -49,8 +49,9 @@ CxStatus qlxLogFileClose(QlxFileHandlerVars *vars);
  */
 CxStatus qlxLogFileWrite(QlxFileHandlerVars *vars, const char *bytes, uint32_t length);
 
-/** Whether a name leads to a regular file. */
-bool qlxLeadsToFile(const char *name);
+/** Success for a name that leads to a regular file, ENOENT for one that does not; another error
+ *  leaves it open. */
+CxStatus qlxLeadsToFile(const char *name);
 
 /** Keeps a number to give up when there are none left; qlxLogFileSpend() gives it up, and answers
  *  whether there was one. Closing the file gives it up too. */

@@ -60,8 +60,20 @@ extern "C" off_t lseek(int file, off_t offset, int origin) noexcept {
   return syscall(SYS_lseek, file, offset, origin);
 }
 
+extern "C" int statx(int directory, const char *path, int flags, unsigned mask,
+                     struct statx *info) noexcept {
+  if (fails(&SystemCalls::onLook, path)) return -1;
+  return static_cast<int>(syscall(SYS_statx, directory, path, flags, mask, info));
+}
+
+extern "C" int fstatat(int directory, const char *path, struct stat *info, int flags) noexcept {
+  if (fails(&SystemCalls::onLook, path)) return -1;
+  return static_cast<int>(syscall(SYS_newfstatat, directory, path, info, flags));
+}
+
 extern "C" int lstat(const char *path, struct stat *info) noexcept {
-  const int result = fstatat(AT_FDCWD, path, info, AT_SYMLINK_NOFOLLOW);
+  const int result =
+      static_cast<int>(syscall(SYS_newfstatat, AT_FDCWD, path, info, AT_SYMLINK_NOFOLLOW));
   const int error = errno;
   if (current && current->afterLook) current->afterLook(path);
   errno = error;

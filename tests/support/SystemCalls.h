@@ -1,5 +1,5 @@
-// In place of the C library's sleep, semget, semop, semctl, ftruncate, lseek and lstat, for the
-// whole program of the tests: nothing in it waits by the clock, and a test may answer instead of
+// In place of the C library's sleep, semget, semop, semctl, ftruncate, lseek, statx, fstatat and lstat,
+// for the whole program of the tests: nothing in it waits by the clock, and a test may answer instead of
 // the system.
 #ifndef QLX_TESTS_SYSTEMCALLS_H
 #define QLX_TESTS_SYSTEMCALLS_H
@@ -23,6 +23,7 @@ class SystemCalls {
   std::function<int(int command)> onControl;
   std::function<int(int file)> onTruncate;
   std::function<int(int file, int origin)> onSeek;
+  std::function<int(const char *path)> onLook;      // by statx or fstatat; "" at a descriptor
   std::function<void(const char *path)> afterLook;  // by lstat
   std::vector<unsigned> slept;                      // the seconds of each sleep
 };

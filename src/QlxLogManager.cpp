@@ -160,10 +160,11 @@ ObjCfg *qlxIntlLogMgrGetCfg(const char *name) {
   return made && qlxIntlLogMgrHasCfg(made->name) ? made.release() : nullptr;
 }
 
+// It leaves the registry last: a parent or child that is missing is made here, which looks at other
+// configurations' children by name, and would make one of this name anew.
 void qlxIntlLogMgrRemCfg(ObjCfg *cfg) {
   if (!cfg || !qlxIntlLogMgrHasCfg(cfg->name)) return;
   const ObjCfgRef removed{qlxIntlStringToObjCfgMapGet(gLogMgr.configs, cfg->name)};
-  qlxIntlStringToObjCfgMapRem(gLogMgr.configs, removed->name);
   if (const ObjCfgRef parent{fetchParent(removed.get())}) {
     for (ObjCfg *lister : {parent.get(), removed.get()}) {
       qlxIntlObjCfgRemChild(lister, removed.get());
@@ -171,6 +172,7 @@ void qlxIntlLogMgrRemCfg(ObjCfg *cfg) {
     forEachChild(removed.get(),
                  [&](ObjCfg *child) { moveChild(removed.get(), parent.get(), child); });
   }
+  qlxIntlStringToObjCfgMapRem(gLogMgr.configs, removed->name);
   qlxIntlStringGroupRem(gLogMgr.configNames, removed->name);
 }
 

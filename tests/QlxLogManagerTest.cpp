@@ -332,6 +332,31 @@ TEST_F(LogManagerTest, RemovingOneThatIsItsOwnChildMakesNoNamesake) {
   EXPECT_EQ(childrenOf(p), "c|");
 }
 
+// Making the missing parent walks the children of "q", where the one that goes is listed.
+TEST_F(LogManagerTest, RemovingOneWhoseMissingParentIsMadeMeanwhileMakesNoNamesake) {
+  const std::string before = configNames();
+  const Config q = registered("q"), a = registered("a"), missing = make("q.p");
+  link(q, a);
+  QlxObjCfgSetParent(a.get(), missing.get());
+  QlxLogMgrRemCfg(a.get());
+  EXPECT_EQ(QlxLogMgrHasCfg("a"), 0);
+  EXPECT_EQ(configNames(), before + "q|q.p|");
+  EXPECT_EQ(childrenOf(q), "q.p|");
+  EXPECT_EQ(childrenOf(registered("q.p")), "");
+}
+
+// Making the missing child walks the children of "q" likewise.
+TEST_F(LogManagerTest, RemovingOneWhoseMissingChildIsMadeMeanwhileMakesNoNamesake) {
+  const std::string before = configNames();
+  const Config p = registered("p"), q = registered("q"), a = registered("a"), missing = make("q.c");
+  link(q, a);
+  link(p, a);
+  link(a, missing);
+  QlxLogMgrRemCfg(a.get());
+  EXPECT_EQ(QlxLogMgrHasCfg("a"), 0);
+  EXPECT_EQ(configNames(), before + "p|q|q.c|");
+}
+
 TEST_F(LogManagerTest, RemovingReleasesTheRegistrysReference) {
   const Config cfg = registered("a");
   QlxLogMgrRemCfg(cfg.get());
@@ -384,6 +409,14 @@ TEST_F(LogManagerTest, UpdatingMovesTheChildrenToTheParent) {
   QlxLogMgrUpdateCfg(ab.get());
   EXPECT_EQ(childrenOf(a), "a.b.c|a.b|");
   EXPECT_EQ(parentNameOf(abc), "a");
+}
+
+TEST_F(LogManagerTest, UpdatingKeepsTheOneWhoseMissingParentIsMadeMeanwhile) {
+  const Config q = registered("q"), a = registered("a"), missing = make("q.p");
+  link(q, a);
+  QlxObjCfgSetParent(a.get(), missing.get());
+  QlxLogMgrUpdateCfg(a.get());
+  EXPECT_EQ(registered("a"), a);
 }
 
 TEST_F(LogManagerTest, UpdatesOneThatOnlyTheRegistryHolds) {

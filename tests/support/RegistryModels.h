@@ -494,12 +494,12 @@ class PlainLogManager {
   void remove(std::string name) {
     if (!known(name)) return;
     const Ref cfg = configs.at(name);
-    configs.erase(name);
     if (const Ref parent = parentOf(*cfg)) {
       std::erase(parent->children, name);
       std::erase(cfg->children, name);
       for (const std::string &child : Names(cfg->children)) move(*cfg, *parent, *get(child));
     }
+    configs.erase(name);
     std::erase(names, name);
   }
 
@@ -690,6 +690,8 @@ class ConfigsModel {
 
   void checkNames() {
     require(namesFrom(QlxLogMgrConfigNames()) == plain_.names);
+    require(plain_.names.size() == plain_.configs.size());
+    for (const std::string &name : plain_.names) require(plain_.known(name));
     const std::string name = anyName();
     require(QlxLogMgrHasCfg(name.c_str()) == plain_.known(name));
   }

@@ -421,7 +421,9 @@ TEST_F(ListenersTest, AListenerThatIsAddedAndRemovedAgainDoesNotGetTheEvent) {
 }
 
 TEST_F(ListenersTest, ARemovedListenerThatNobodyElseHoldsEndsAfterItsOperation) {
-  QlxObject *raw = attach(logger, "a", HostClasses::kHandler).get();
+  Handle a = attach(logger, "a", HostClasses::kHandler);
+  QlxObject *raw = a.get();
+  a.reset();
   const Handle b = attach(logger, "b", HostClasses::kHandler);
   host->onEvent = [&](QlxObject *object, Event *) {
     if (object != raw) return;

@@ -30,9 +30,12 @@ QLX_API QlxObject *qlxToolkitLogger(void);
 /** @return the registered class, borrowed, or null; null for a null name */
 QLX_API ObjClass *qlxToolkitGetClassDef(const char *className);
 
-/** Registers a class record under a name, its own or another; the registry owns it from then on.
- *  The first one of a name stays, and a record that is registered nowhere is freed. A null record
- *  is ignored. */
+/**
+ * Registers a class record under a name, its own or another; under several by several calls. The
+ * registry owns it from then on. The first record of a name stays. One that is refused, as the name
+ * is taken or null or memory ran out, is freed unless it is registered under another name. A null
+ * record is ignored.
+ */
 QLX_API void qlxToolkitAddClassDef(const char *className, ObjClass *objClass);
 
 /** Makes the registries and registers the built-in classes, once. */

@@ -1,13 +1,10 @@
 #include <algorithm>
-#include <map>
-#include <random>
-#include <set>
+#include <utility>
 
 #include <qlx/class/containers.h>
 
 #include "support/FailingMemory.h"
 #include "support/HostTest.h"
-#include "support/RandomSeed.h"
 
 namespace {
 
@@ -491,61 +488,6 @@ TEST_F(ListenersTest, AnEventMayPassTheSameListenersOfTwoOwnersThatChange) {
     }
   };
   EXPECT_EQ(passed(logger), "process a|process b|process a|process b|");
-}
-
-// Random changes by every operation, against the plain rule: next is the first one in the group
-// that had nothing yet.
-TEST_F(ListenersTest, EachPassIsTheSameAsThatOfASimpleModel) {
-  const RandomSeed seed;
-  std::mt19937 random(seed);
-  std::vector<Handle> all;
-  std::map<QlxObject *, int> numbers;
-  for (int i = 0; i < 40; ++i) {
-    all.push_back(get(("h" + std::to_string(i)).c_str(), HostClasses::kHandler));
-    numbers[all.back().get()] = i;
-  }
-  std::vector<int> model, passedTo;
-  std::set<int> had;
-  const auto next = [&] {
-    return std::ranges::find_if(model, [&](int i) { return !had.contains(i); });
-  };
-  const auto change = [&](uint32_t largest) {
-    const int i = static_cast<int>(random() % largest);
-    const auto place = std::ranges::find(model, i);
-    QlxObject *object = all[static_cast<size_t>(i)].get();
-    if (random() % 2) {
-      ASSERT_EQ(qlxIntlAddListener(logger.get(), object), place == model.end());
-      if (place == model.end()) model.push_back(i);
-    } else {
-      ASSERT_EQ(qlxIntlRemListener(logger.get(), object), place != model.end());
-      if (place != model.end()) model.erase(place);
-    }
-  };
-  uint32_t largest = 1, changes = 0;
-  host->onEvent = [&](QlxObject *object, Event *) {
-    const int i = numbers.at(object);
-    ASSERT_NE(next(), model.end());
-    ASSERT_EQ(*next(), i);
-    had.insert(i);
-    for (uint32_t n = random() % (1 + changes); n > 0; --n) change(largest);
-    if (random() % 200 == 0) {
-      qlxFreeListeners(logger.get());
-      model.clear();
-    }
-  };
-  for (int round = 0; round < 8000; ++round) {
-    largest = 1 + random() % 40;
-    changes = random() % 6;
-    for (uint32_t n = random() % 20; n > 0; --n) change(largest);
-    had.clear();
-    passed(logger);
-    ASSERT_EQ(next(), model.end()) << seed;
-    std::string expected;
-    for (const int i : model) expected += "h" + std::to_string(i) + "|";
-    ASSERT_EQ(listenersOf(logger), expected) << seed;
-    if (HasFatalFailure()) FAIL() << seed;
-  }
-  for (const int i : model) ASSERT_EQ(all[static_cast<size_t>(i)]->refCount, 3u) << seed;
 }
 
 TEST_F(ListenersTest, AReportOfAListenerThatIsOnTheErrorLoggersPathEndsThere) {

@@ -1,10 +1,12 @@
-// The toolkit's registries under random operations, against simple models: support/RegistryModels.h
-// says which. The fuzz target FuzzRegistries takes the same walks.
-#include "support/RegistryModels.h"
-
+// The toolkit's registries under random operations, against simple models. The fuzz target
+// FuzzRegistries takes the same walks.
 #include <gtest/gtest.h>
 
+#include "support/ClassesModel.h"
+#include "support/ConfigsModel.h"
 #include "support/ModelTest.h"
+#include "support/ObjectsModel.h"
+#include "support/PassesModel.h"
 
 namespace {
 

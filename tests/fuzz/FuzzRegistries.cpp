@@ -1,6 +1,9 @@
 // The toolkit's registries against their models, the walks of RegistryModelsTest.
+#include "support/ClassesModel.h"
+#include "support/ConfigsModel.h"
 #include "support/FuzzModels.h"
-#include "support/RegistryModels.h"
+#include "support/ObjectsModel.h"
+#include "support/PassesModel.h"
 
 using namespace models;
 

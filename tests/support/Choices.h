@@ -9,11 +9,11 @@
 #include <random>
 
 struct Mismatch {
-  const char *expected;
+  const char *expected, *file;
   int line;
 };
 
-#define require(holds) ((holds) ? void() : throw Mismatch{#holds, __LINE__})
+#define require(holds) ((holds) ? void() : throw Mismatch{#holds, __FILE__, __LINE__})
 
 class Choices {
  public:

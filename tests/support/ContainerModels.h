@@ -5,120 +5,18 @@
 
 #include <algorithm>
 #include <array>
-#include <cstdlib>
 #include <cstring>
 #include <memory>
-#include <string>
 #include <vector>
 
-#include <qlx/class/object.h>
-#include <qlx/memory.h>
-#include <qlx/props.h>
-
-#include "QlxObjConfig.h"
 #include "support/Choices.h"
 #include "support/ContainerApis.h"
 #include "support/FailingMemory.h"
+#include "support/ModelElements.h"
 #include "support/Take.h"
 #include "support/WantedLeak.h"
 
 namespace models {
-
-// ---- Elements: of each kind kCount different ones, by number. `references` counts what containers
-// and callers hold of one.
-
-constexpr int kCount = 80;
-constexpr int kNull = -1;    // the number of a null value
-constexpr int kRarely = 16;  // steps between looks at everything
-
-inline const char *text(int i) {
-  static const auto texts = [] {
-    // Two of them have the same hash.
-    std::vector<std::string> all = {"", "costarring", "liquid", "a", "A"};
-    while (all.size() < kCount) all.push_back("key" + std::to_string(all.size()));
-    return all;
-  }();
-  return texts[static_cast<size_t>(i)].c_str();
-}
-
-struct Strings {
-  static constexpr int kCopyAllocations = 1;
-  const char *at(int i) const { return text(i); }
-  bool is(const char *stored, int i) const { return stored && strcmp(stored, at(i)) == 0; }
-  void discard(char *handedOut) const { OslMemoryFree(handedOut); }
-  int references(int) const { return 0; }
-  static constexpr bool kCounted = false;
-  static int compare(const void *a, const void *b) {
-    return strcmp(*static_cast<char *const *>(a), *static_cast<char *const *>(b));
-  }
-  bool isBefore(int a, int b) const { return strcmp(at(a), at(b)) < 0; }
-};
-
-struct Parms {
-  Parms() {
-    for (int i = 0; i < kCount; ++i) {
-      parms[static_cast<size_t>(i)].type = ParmInt32;
-      parms[static_cast<size_t>(i)].value.i = i * 7 % kCount;
-    }
-  }
-  const Parm *at(int i) const { return &parms[static_cast<size_t>(i)]; }
-  bool is(const Parm *stored, int i) const { return stored && QlxCmpParms(stored, at(i)) == 1; }
-  void discard(Parm *handedOut) const { QlxFreeParm(handedOut); }
-  int references(int) const { return 0; }
-  static constexpr bool kCounted = false;
-  static constexpr int kCopyAllocations = 1;
-  static int compare(const void *a, const void *b) {
-    return (*static_cast<Parm *const *>(a))->value.i - (*static_cast<Parm *const *>(b))->value.i;
-  }
-  bool isBefore(int a, int b) const { return at(a)->value.i < at(b)->value.i; }
-
-  std::array<Parm, kCount> parms = {};
-};
-
-// Every fifth one is retired; all are held so often by somebody else that no release is the last.
-struct Objects {
-  Objects() {
-    for (int i = 0; i < kCount; ++i) {
-      at(i)->objClass = i % 5 ? &objClass : nullptr;
-      at(i)->refCount = kHeld;
-    }
-  }
-  QlxObject *at(int i) { return &objects[static_cast<size_t>(i)]; }
-  bool is(QlxObject *stored, int i) { return stored == at(i); }
-  void discard(QlxObject *handedOut) const { qlxIntlReleaseObject(handedOut); }
-  int references(int i) { return static_cast<int>(at(i)->refCount) - kHeld; }
-  static constexpr bool kCounted = true;
-  static constexpr int kCopyAllocations = 0;
-
-  static constexpr int kHeld = 10;
-  ObjClass objClass = {};
-  std::array<QlxObject, kCount> objects = {};
-};
-
-struct Configs {
-  Configs() {
-    for (int i = 0; i < kCount; ++i) configs[static_cast<size_t>(i)].reset(qlxIntlAllocObjCfg("a"));
-  }
-  ObjCfg *at(int i) const { return configs[static_cast<size_t>(i)].get(); }
-  bool is(ObjCfg *stored, int i) const { return stored == at(i); }
-  void discard(ObjCfg *handedOut) const { qlxIntlReleaseObjCfg(handedOut); }
-  int references(int i) const { return static_cast<int>(at(i)->refCount) - 1; }
-  static constexpr bool kCounted = true;
-  static constexpr int kCopyAllocations = 0;
-
-  std::array<ObjCfgRef, kCount> configs;
-};
-
-struct Classes {
-  ObjClass *at(int i) { return &classes[static_cast<size_t>(i)]; }
-  bool is(ObjClass *stored, int i) { return stored == at(i); }
-  void discard(ObjClass *) const {}
-  int references(int) const { return 0; }
-  static constexpr bool kCounted = false;
-  static constexpr int kCopyAllocations = 0;
-
-  std::array<ObjClass, kCount> classes = {};
-};
 
 GROUP_API(Qlx, StringGroup, Strings);
 GROUP_API(Qlx, ListenerGroup, Objects);
@@ -130,6 +28,8 @@ MAP_API(Qlx, StringToObjCfgMap, Configs);
 MAP_API(Qlx, StringToObjClassMap, Classes);
 
 // ---- What the three have in common
+
+constexpr int kRarely = 16;  // steps between looks at everything
 
 // Frees a container at the end of the walk, also of one that ended by a mismatch.
 template <typename Api>
@@ -294,15 +194,6 @@ class GroupModel {
     auto *element = Api::get(iteratorAt<Api>(group_.get(), place));
     require(elements_.is(element, model_[place]));
     elements_.discard(element);
-  }
-
-  void lookEachUp() {
-    auto *node = group_->head;
-    for (const int i : model_) {
-      require(Api::getLink(group_.get(), elements_.at(i)) == node);
-      node = node->next;
-    }
-    requireReferences(elements_, model_);
   }
 
   Choices &choices_;

@@ -22,7 +22,8 @@ int fuzzModels(const uint8_t *data, size_t size) {
   try {
     kWalks[data[0] % std::size(kWalks)](choices);
   } catch (const Mismatch &mismatch) {
-    fprintf(stderr, "line %d: %s\nin step %u\n", mismatch.line, mismatch.expected, choices.step());
+    fprintf(stderr, "%s:%d: %s\nin step %u\n", mismatch.file, mismatch.line, mismatch.expected,
+            choices.step());
     abort();
   }
   return 0;

@@ -14,7 +14,7 @@ void walk(uint32_t steps) {
   try {
     Model model(choices);
   } catch (const Mismatch &mismatch) {
-    FAIL() << "line " << mismatch.line << ": " << mismatch.expected << "\nin step "
+    FAIL() << mismatch.file << ":" << mismatch.line << ": " << mismatch.expected << "\nin step "
            << choices.step() << ", " << seed;
   }
 }

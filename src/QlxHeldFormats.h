@@ -32,8 +32,8 @@ QLX_BEGIN_DECLS
 // u_vformatMessage() formats it. Null args read as zeros: a number is 0, a date is 1970, and a text
 // is a null string, which ICU answers with U_ILLEGAL_ARGUMENT_ERROR. Returns the units appended; 0
 // with the buffer's text unchanged when *status is a failure and when the text is empty. When
-// memory runs out *status is U_MEMORY_ALLOCATION_ERROR. A pattern that nests too deep, and dates
-// and plurals in a locale of a name that is none, are U_ILLEGAL_ARGUMENT_ERROR.
+// memory runs out *status is U_MEMORY_ALLOCATION_ERROR. A pattern that nests too deep, and what
+// takes dates or plural rules from a locale of a name that is none, are U_ILLEGAL_ARGUMENT_ERROR.
 uint32_t qlxAppendHeldMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
                               va_list *args, UErrorCode *status);
 

@@ -125,9 +125,12 @@ static bool mayUseZone(std::u16string_view pattern) {
   return mayHaveType(pattern, {u"date", u"time"});
 }
 
-// Worded numbers take the forms of their words from them too.
+// Worded numbers take the forms of their words from them too, and so do long names of currencies
+// and what skeletons of numbers know: short notations and units.
 static bool mayUsePluralRules(std::u16string_view pattern) {
-  return mayHaveType(pattern, {u"plural", u"selectordinal", u"ordinal", u"spellout", u"duration"});
+  return mayHaveType(pattern,
+                     {u"plural", u"selectordinal", u"ordinal", u"spellout", u"duration", u"::"}) ||
+         pattern.find(u"\u00a4\u00a4\u00a4") != pattern.npos;
 }
 
 // Whether ICU can be given the pattern. What has a type takes data of its locale, and where there

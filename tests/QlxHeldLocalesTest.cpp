@@ -70,13 +70,14 @@ constexpr const UChar *kDelicate[] = {u"{0,date}",
                                       u"{0,select,other{{0,Plural,other{#}}}}",
                                       u"{0,ordinal}",
                                       u"{0,spellout}",
-                                      u"{0,duration}"};
+                                      u"{0,duration}",
+                                      u"{0,number,\u00a4\u00a4\u00a4 #}",
+                                      u"{0,number, ::compact-short}",
+                                      u"{0,number,::unit/meter}",
+                                      u"{0,number,::currency/EUR unit-width-full-name}"};
 
-constexpr const UChar *kOthers[] = {u"{0,number}",
-                                    u"{0,number,percent}",
-                                    u"{0,number,currency}",
-                                    u"{0,number,::compact-short}",
-                                    u"{0,number,::currency/EUR unit-width-full-name}",
+constexpr const UChar *kOthers[] = {u"{0,number}", u"{0,number,percent}", u"{0,number,currency}",
+                                    u"{0,number,#,##0.0 \u00a4\u00a4}",
                                     u"{0,choice,0#none|1#{0,number}}"};
 
 std::string repeated(size_t count, const char *text = "k") {

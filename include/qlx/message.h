@@ -43,8 +43,9 @@ QLX_API void QlxFreeI18Msg(I18Msg *message);
  *
  * The same error has a pattern whose messages nest deeper than 8 levels (those of choice, plural
  * and select below the pattern itself), so that every pattern can be formatted on a stack of 64
- * KiB. Dates, times, plurals and worded numbers have it when the locale's name is none: one that
- * ICU's parser cannot read or that is longer than ULOC_FULLNAME_CAPACITY, or its keywords than
+ * KiB. Dates, times, plurals, worded numbers number skeletons (::) and the long names of currencies
+ * (three currency signs) have it when the locale's name is none: one that ICU's parser cannot read
+ * or that is longer than ULOC_FULLNAME_CAPACITY, or its keywords than
  * ULOC_KEYWORD_AND_VALUES_CAPACITY. Where the default locale has such a name, so have all arguments
  * with a type, and bundles.
  *

@@ -67,18 +67,18 @@ void QlxBasicFormatterFCfgChange(QlxObject *formatter, const char *key) {
 
 namespace {
 
-// What cannot be appended, for want of memory, is left out.
+// What cannot be appended, for want of memory, is left out, and the event tells of it.
 class WideLine {
  public:
-  explicit WideLine(CxUStringBuff *text) : text_(text) {}
+  WideLine(CxUStringBuff *text, Event *event) : text_(text), event_(event) {}
 
-  bool append(std::string_view text) { return cxUStringBuffAppend(text_, text) || true; }
+  bool append(std::string_view text) { return orMiss(cxUStringBuffAppend(text_, text)); }
 
   bool appendDate(const char *pattern, double time) {
-    return qlxAppendHeldDate(text_, pattern, time) || true;
+    return orMiss(qlxAppendHeldDate(text_, pattern, time));
   }
 
-  bool appendNumber(uint64_t number) { return CxUStringBuffAppendUInt64(text_, number) || true; }
+  bool appendNumber(uint64_t number) { return orMiss(CxUStringBuffAppendUInt64(text_, number)); }
 
   // The library's own binder writes straight into the line.
   bool appendMessage(Event *event, const ObjClass *binder, va_list *args) {
@@ -87,8 +87,7 @@ class WideLine {
       qlxSettleEvent(event);
       qlxUseEventLocale(event);
       const OwnedUStr text{qlxCall({binder, "fBindMsg"}, bind, event->message, args)};
-      if (text) CxUStringBuffAppendUStr(text_, text.get());
-      return true;
+      return !text || orMiss(CxUStringBuffAppendUStr(text_, text.get()));
     }
     qlxUseEventLocale(event);
     qlxIntlBindI18MsgTo(event->message, args, text_);
@@ -96,7 +95,13 @@ class WideLine {
   }
 
  private:
+  bool orMiss(uint8_t appended) {
+    if (!appended) qlxMissMemory(event_);
+    return true;
+  }
+
   CxUStringBuff *text_;
+  Event *event_;
 };
 
 class AsciiLine {
@@ -163,8 +168,7 @@ static bool appendEvent(Line line, QlxObject *formatter, Event *event, va_list *
   if (!binder->op4.fBindMsg) return false;
   const char *own = separatorOf(formatter);
   const std::string_view separator = own ? std::string_view{own} : kDefaultSeparator;
-  // Deliberate: the locale stays on the event, and what formats the event later binds in it too.
-  if (localeOf(formatter)) qlxSetEventLocale(event, localeOf(formatter));
+  qlxUseFormatterLocale(event, localeOf(formatter));
   return line.appendDate(datePatternOf(formatter), event->time) && line.append(separator) &&
          appendProperties(line, event, separator) && line.appendMessage(event, binder, args) &&
          line.append("\n");
@@ -172,7 +176,7 @@ static bool appendEvent(Line line, QlxObject *formatter, Event *event, va_list *
 
 uint8_t qlxBasicFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
                                 CxUStringBuff *text) {
-  return appendEvent(WideLine{text}, formatter, event, args) && text->length > 0;
+  return appendEvent(WideLine{text, event}, formatter, event, args) && text->length > 0;
 }
 
 bool qlxBasicFormatterAppendAscii(QlxObject *formatter, Event *event, va_list *args,

@@ -101,6 +101,7 @@ FormattedEvent::FormattedEvent(QlxObject *handler, Event *event, va_list *args) 
   QlxObject *formatter = formatterOf(handler);
   if (const Row *row = rowOf(formatter)) {
     has_ = row->append(formatter, event, args, buffer_.get());
+    ranOut_ = !has_ && qlxMissedMemory(event);
     length_ = buffer_.get()->length;
     return;
   }
@@ -117,8 +118,8 @@ FormattedBytes::FormattedBytes(QlxObject *handler, Event *event, va_list *args) 
     return;
   }
   const FormattedEvent text{handler, event, args};
-  has_ = static_cast<bool>(text);
-  if (has_) narrow(text);
+  has_ = text || text.ranOut();
+  if (text) narrow(text);
 }
 
 void FormattedBytes::narrow(const FormattedEvent &text) {

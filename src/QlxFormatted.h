@@ -83,12 +83,14 @@ class FormattedEvent {
   explicit operator bool() const { return has_; }  // false: there is nothing to write
   const UChar *text() const { return own_ ? own_.get() : buffer_.get()->data; }
   uint32_t length() const { return length_; }
+  bool ranOut() const { return ranOut_; }  // there is nothing, for want of memory
 
  private:
   KeptBuffer buffer_;
   OwnedUStr own_;  // of a host's formatter
   uint32_t length_ = 0;
   bool has_ = false;
+  bool ranOut_ = false;  // of a built-in formatter
 };
 
 // The same as bytes of the default code page, for handlers that write bytes.

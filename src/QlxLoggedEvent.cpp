@@ -91,6 +91,10 @@ void qlxMissMemory(Event *event) {
   event->status = cxFailure(ENOMEM);
 }
 
+bool qlxMissedMemory(const Event *event) {
+  return event->status.kind == 'p' && event->status.code == ENOMEM;
+}
+
 // ---- Properties
 
 // The first kept node, with that key and value; null when there is none or memory ran out.

@@ -32,6 +32,9 @@ void qlxSettleNotedEvent(void);
 // Makes it the event's status that memory ran out, so that the log call's result tells it.
 void qlxMissMemory(Event *event);
 
+// Whether it is.
+bool qlxMissedMemory(const Event *event);
+
 // Sets a property as QlxSetEventProp() does, in a kept block where there is one.
 // The event is settled. It is its status when memory ran out.
 void qlxStampEvent(Event *event, const char *key, std::string_view value);

@@ -12,6 +12,7 @@
 #include "QlxConfigKeys.h"
 #include "QlxFormatted.h"
 #include "QlxHeldFormats.h"
+#include "QlxI18Msg.h"
 #include "QlxMsgId.h"
 #include "QlxObject.h"
 
@@ -162,7 +163,7 @@ static bool appendRecord(RecordText out, QlxObject *formatter, Event *event, va_
   PDXMLVars *vars = varsOf(formatter);
   if (!vars || !event) return false;
   const bool asMessage = isMessage(vars, event);
-  if (formatter->kind3.locale) qlxSetEventLocale(event, formatter->kind3.locale);
+  qlxUseFormatterLocale(event, formatter->kind3.locale);
   const BoundText text{event, args};
   const EventValues values = qlxFindEventValues(event);
 
@@ -177,7 +178,7 @@ static bool appendRecord(RecordText out, QlxObject *formatter, Event *event, va_
                 "</CorrelationId>\n"sv);
   appendElement(out, " <Principal>"sv, values[EventKey::kClient], "</Principal>\n"sv);
   out << (asMessage ? "</Message>\n"sv : "</Trace>\n"sv);
-  if (!out.isWhole()) return false;  // a lost record leaves its preamble to the next one
+  if (!out.isWholeFor(event)) return false;  // a lost record leaves its preamble to the next one
   vars->firstRecord = 0;
   return true;
 }

@@ -1,12 +1,18 @@
 #include "QlxRecordText.h"
 
 #include "QlxFormatted.h"
+#include "QlxLoggedEvent.h"
 
 RecordText &RecordText::number(QlxHeldNumber format, double number) {
   if (!line_) return by(qlxAppendHeldNumber, format, number);
   KeptBuffer text;
   if (!qlxAppendHeldNumber(text.get(), format, number)) return toLine(false);
   return *this << std::u16string_view{text.get()->data, text.get()->length};
+}
+
+bool RecordText::isWholeFor(Event *event) const {
+  if (text_ && isLost(text_)) qlxMissMemory(event);
+  return isWhole();
 }
 
 void RecordText::lose() {

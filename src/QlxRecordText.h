@@ -54,6 +54,9 @@ class RecordText {
 
   bool isWhole() const { return line_ ? !isLost_ : text_ && text_->data; }
 
+  // The same; the event tells when memory ran out.
+  bool isWholeFor(Event *event) const;
+
  private:
   // Room without a block is what no buffer has otherwise.
   static bool isLost(const CxUStringBuff *text) { return !text->data && text->capacity > 0; }

@@ -14,6 +14,7 @@
 #include "QlxClasses.h"
 #include "QlxEventValues.h"
 #include "QlxFormatted.h"
+#include "QlxI18Msg.h"
 #include "QlxMsgId.h"
 #include "QlxObject.h"
 #include "QlxRecordText.h"
@@ -93,7 +94,7 @@ static constexpr void (*kFields[])(RecordText &line, const Record &record) = {
 
 static bool appendLine(RecordText line, QlxObject *formatter, Event *event, va_list *args) {
   if (!isKind(formatter, Formatter) || !event) return false;
-  if (formatter->kind3.locale) qlxSetEventLocale(event, formatter->kind3.locale);
+  qlxUseFormatterLocale(event, formatter->kind3.locale);
   const BoundText text{event, args};
   const Record record{formatter, event, text.get(), qlxFindEventValues(event)};
   std::string_view before = "\x1e";  // a record separator (U+001E), then what is between fields
@@ -103,7 +104,7 @@ static bool appendLine(RecordText line, QlxObject *formatter, Event *event, va_l
     before = " - ";
   }
   line << "\n"sv;
-  return line.isWhole();
+  return line.isWholeFor(event);
 }
 
 uint8_t qlxVexTraceFormatterAppend(QlxObject *formatter, Event *event, va_list *args,

@@ -7,8 +7,8 @@
  * listeners. All arguments are borrowed; a null logger logs nothing. The result starts as
  * {'-', 0, 0} and stays so when there was nothing to log; else it tells the event's status (a
  * handler that could not write stores the system's error there) and ICU's code of the last failed
- * bind. When memory runs out before the first listener has the event, the status is {'p', ENOMEM}:
- * nothing was logged then, or an event that lacks what there was no memory for.
+ * bind. When memory runs out for the event or for its record, the status is {'p', ENOMEM}: nothing
+ * was logged then, or a record that lacks what there was no memory for, as its locale.
  *
  * The message parameters follow as ICU reads them for the pattern: a string is a `const UChar *`, a
  * {0,number,integer} an int32_t, a {0,number} a double, a {0,date} a UDate (double). Each call has

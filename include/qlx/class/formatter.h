@@ -18,7 +18,8 @@ QLX_API void QlxBasicFormatterFCfgChange(QlxObject *formatter, const char *key);
  * The event as one line: its time, source location, product properties and message, with the
  * formatter's separator after each but the message, and a line feed. Deliberate: the formatter's
  * locale is set on the event and stays there. What cannot be appended, for want of memory, is left
- * out of the line, and so is a message that cannot be bound.
+ * out of the line, and the event's status is {'p', ENOMEM} then. A message that cannot be bound is
+ * left out too.
  *
  * @return the line; null for a null event, for an object that is no formatter or whose class has no
  *         fBindMsg, and when there was no memory for any of it

@@ -8,7 +8,6 @@
 #include <qlx/files.h>
 
 #include "util/CxStatus.h"
-#include "util/CxThread.h"
 
 static constexpr uint32_t kBlockBytes = 8192;
 
@@ -77,7 +76,6 @@ static void readOpened(CxFile *file, QlxPropsFile &props) {
 }
 
 QlxPropsFile qlxLoadProps(const char *path) {
-  const CxNoCancel untilItIsClosed;
   QlxPropsFile props;
   props.status = checkPath(path);
   if (props.status.kind != '-') return props;

@@ -23,8 +23,8 @@ struct QlxPropsFile {
 };
 
 // Reads a regular file, or a pipe until its end, for which it waits. Interrupted, it goes on;
-// cancelled, the thread ends after it. A folder, a device or a socket, a path of more than
-// kMaxPropsPathBytes and a file of more than kMaxPropsBytes are refused, with no bytes.
+// the caller sees to it that the thread is not cancelled. A folder, a device or a socket, a path of
+// more than kMaxPropsPathBytes and a file of more than kMaxPropsBytes are refused, with no bytes.
 QlxPropsFile qlxLoadProps(const char *path);
 
 #endif

@@ -7,6 +7,7 @@
 #include <qlx/memory.h>
 
 #include "QlxLogManager.h"
+#include "util/CxThread.h"
 
 namespace {
 
@@ -307,6 +308,7 @@ uint8_t qlxDeliverProps(const QlxPropsFile &file, CxPropList *propList, CxStatus
 }
 
 uint8_t qlxDoReadProps(const char *path, CxPropList *propList, CxStatus *status) {
+  const CxNoCancel untilItIsFreed;
   return qlxDeliverProps(qlxLoadProps(path), propList, status);
 }
 

@@ -18,6 +18,7 @@
 #include "QlxObjClass.h"
 #include "QlxObject.h"
 #include "QlxReadProps.h"
+#include "util/CxThread.h"
 
 static constexpr int32_t kKinds = 4;  // Logger, Filter, Handler, Formatter: consecutive numbers
 
@@ -238,6 +239,7 @@ static uint8_t openToolkit(const QlxPropsFile *config, CxStatus *status) {
 uint8_t QlxOpenToolkit(const char *configFileName, CxStatus *status) {
   if (qlxLocked<isOpen>()) return 1;
   if (!configFileName) return qlxLocked<openToolkit>(nullptr, status);
+  const CxNoCancel untilItIsFreed;
   const QlxPropsFile config = qlxLoadProps(configFileName);
   return qlxLocked<openToolkit>(&config, status);
 }

@@ -271,9 +271,15 @@ TEST_F(PropsFileTest, InterruptedOpensAndReadsGoOn) {
   });
 }
 
-TEST_F(PropsFileTest, AThreadThatWaitsForAPipeIsCancelledWhenTheToolkitIsOpen) {
+class CancelledOpenTest : public PropsFileTest, public ::testing::WithParamInterface<int> {};
+
+INSTANTIATE_TEST_SUITE_P(Types, CancelledOpenTest,
+                         ::testing::Values(PTHREAD_CANCEL_DEFERRED, PTHREAD_CANCEL_ASYNCHRONOUS));
+
+TEST_P(CancelledOpenTest, AThreadThatWaitsForAPipeEndsWhenTheToolkitIsOpen) {
   expectNoHang([this] {
     const OwnThread thread([this] {
+      pthread_setcanceltype(GetParam(), nullptr);
       QlxOpenToolkit(pipe.c_str(), nullptr);
       pthread_testcancel();
     });

@@ -26,9 +26,11 @@ inline CxCancellation cxThreadDisableCancel() {
   pthread_setcanceltype(PTHREAD_CANCEL_DEFERRED, &before.type);
   return before;
 }
+// The type comes last: a thread that the state ended would have another result than
+// PTHREAD_CANCELED in some versions of the C library.
 inline void cxThreadRestoreCancel(CxCancellation before) {
-  pthread_setcancelstate(before.state, nullptr);
-  pthread_setcanceltype(before.type, nullptr);
+  if (before.state != PTHREAD_CANCEL_DISABLE) pthread_setcancelstate(before.state, nullptr);
+  if (before.type != PTHREAD_CANCEL_DEFERRED) pthread_setcanceltype(before.type, nullptr);
 }
 
 // Keeps it from being cancelled for a scope.

@@ -19,10 +19,11 @@ class OwnThread {
 
   void cancel() const { EXPECT_EQ(pthread_cancel(id_), 0); }
 
-  // Waits for its end; whether it ended before its call did. To be called once. Not by the thread's
-  // result: the C library sets none where a state that is set again ends the thread.
+  // Waits for its end; whether that came before its call's. To be called once.
   bool endsCancelled() const {
-    EXPECT_EQ(pthread_join(id_, nullptr), 0);
+    void *result = nullptr;
+    EXPECT_EQ(pthread_join(id_, &result), 0);
+    EXPECT_EQ(result, hasReturned_ ? nullptr : PTHREAD_CANCELED);
     return !hasReturned_;
   }
 

@@ -1,8 +1,10 @@
 // A host's operations that throw: the process ends with a line that names the operation.
 #include <gtest/gtest.h>
 
+#include <csetjmp>
 #include <stdexcept>
 
+#include "support/Child.h"
 #include "support/OwnThread.h"
 #include "support/ToolkitTest.h"
 
@@ -170,6 +172,21 @@ TEST_F(OperationTest, ThatEndsItsThreadEndsTheProcess) {
   const auto logInAThread = [] { OwnThread([] { Chain::logToListener(); }).endsCancelled(); };
   EXPECT_DEATH(logInAThread(),
                "^qlx: the end of a thread left the operation fProcess of the class test_throwing");
+}
+
+std::jmp_buf gOut;
+
+// Nothing can notice it.
+TEST_F(OperationTest, ThatJumpsOutLeavesTheLockHeld) {
+  Chain::addHandler([](QlxObject *, Event *, va_list *) { std::longjmp(gOut, 1); }, nullptr,
+                    nullptr);
+  Child child([] {
+    if (setjmp(gOut) == 0) Chain::logToListener();
+    EXPECT_FALSE(isCancellable());
+    qlxAPIMutexUnlock();
+    EXPECT_TRUE(isCancellable());
+  });
+  EXPECT_EQ(child.end(), 0);
 }
 
 }  // namespace

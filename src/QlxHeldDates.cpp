@@ -62,21 +62,21 @@ void qlxIntlDropHeldDates(void) {
   ucal_close(std::exchange(gCalendar, nullptr));
 }
 
-static UDateFormat *openDate(const char *pattern, const char *locale) {
+static UDateFormat *openDate(const char *pattern, const char *locale, UErrorCode *status) {
   const OwnedUStr own{CxUStringDupStrToUChar(pattern)};
-  if (pattern && !own) return nullptr;
-  UErrorCode status = U_ZERO_ERROR;
+  if (pattern && !own) *status = U_MEMORY_ALLOCATION_ERROR;
   return udat_open(UDAT_PATTERN, UDAT_PATTERN, qlxIntlGoodLocale(locale), nullptr, -1,
-                   pattern ? own.get() : kDefaultPattern, -1, &status);
+                   pattern ? own.get() : kDefaultPattern, -1, status);
 }
 
-// Finds or opens the format of a pattern; null when that fails.
-static HeldDate *fetch(const char *pattern, const char *locale) {
+// Finds or opens the format of a pattern; null, with the reason, when that fails.
+static HeldDate *fetch(const char *pattern, const char *locale, UErrorCode *status) {
   for (HeldDate &held : gDates)
     if (held.format && qlxSameText(held.pattern, pattern)) return &held;
-  icu::LocalUDateFormatPointer format{openDate(pattern, locale)};
+  icu::LocalUDateFormatPointer format{openDate(pattern, locale, status)};
   OwnedStr copy{OslStringDup(pattern)};
-  if (format.isNull() || (pattern && !copy)) return nullptr;
+  if (pattern && !copy) *status = U_MEMORY_ALLOCATION_ERROR;
+  if (U_FAILURE(*status)) return nullptr;
   HeldDate &place = *std::ranges::min_element(gDates, {}, &HeldDate::lastUse);
   drop(place);
   place.format = format.orphan();
@@ -230,25 +230,28 @@ static uint8_t appendBy(HeldDate &held, CxUStringBuff *text, double time) {
   return appendDate(text, held, time, nullptr, &status);
 }
 
-// The place of a pattern under the defaults of this moment; null when memory ran out.
-static HeldDate *fetchCurrent(const char *pattern) {
+// The place of a pattern under the defaults of this moment; null, with the reason, when there is
+// none.
+static HeldDate *fetchCurrent(const char *pattern, UErrorCode *status) {
   const char *locale = qlxIntlCheckHeldLocale();
   qlxIntlCheckHeldZone();
   if (pattern) qlxIntlCheckHeldCodePage();
-  HeldDate *held = fetch(pattern, locale);
+  HeldDate *held = fetch(pattern, locale, status);
   if (held) held->lastUse = ++gUses;
   return held;
 }
 
 uint8_t qlxAppendHeldDate(CxUStringBuff *text, const char *pattern, double time) {
   const HeldFormatsLock lock;
-  HeldDate *held = fetchCurrent(pattern);
-  return held ? appendBy(*held, text, time) : 0;
+  UErrorCode status = U_ZERO_ERROR;
+  HeldDate *held = fetchCurrent(pattern, &status);
+  return held ? appendBy(*held, text, time) : status != U_MEMORY_ALLOCATION_ERROR;
 }
 
 bool qlxAppendHeldDateAscii(CxAsciiLine *line, const char *pattern, double time) {
   const HeldFormatsLock lock;
-  HeldDate *held = fetchCurrent(pattern);
+  UErrorCode status = U_ZERO_ERROR;
+  HeldDate *held = fetchCurrent(pattern, &status);
   const std::optional<Moment> moment = held ? momentOf(time) : std::nullopt;
   if (!moment || !keep(*held, moment->second) || held->asciiLength == 0) return false;
   std::array<char, 64> text = held->ascii;

@@ -52,7 +52,8 @@ bool qlxScanBundlePattern(const MessageName &message, ArgTypes *types);
 
 // Appends a time in milliseconds since 1970-01-01 UTC, formatted by an 8-bit date pattern in the
 // default locale and zone; a null pattern is "yyyy-MM-dd HH:mm:ss.SSS" and the offset from UTC.
-// Returns 1, or 0 when memory ran out; what ICU cannot format is empty.
+// Returns 1, or 0 when memory ran out; what ICU cannot format is empty, and nothing is appended,
+// not even to a buffer without a block, where it has no format.
 uint8_t qlxAppendHeldDate(CxUStringBuff *text, const char *pattern, double time);
 
 // The same as bytes; false when the text is not ASCII, or not one that is kept for its second.

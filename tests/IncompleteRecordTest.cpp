@@ -6,6 +6,7 @@
 #include <regex>
 #include <string>
 
+#include <qlx/class/formatter.h>
 #include <qlx/class/handler.h>
 #include <qlx/qlx.h>
 
@@ -13,6 +14,7 @@
 #include "QlxHeldFormats.h"
 #include "QlxLoggedEvent.h"
 #include "support/FailingMemory.h"
+#include "support/IcuDefaults.h"
 #include "support/ResourceBundles.h"
 #include "support/TempDir.h"
 
@@ -144,6 +146,21 @@ TEST_F(IncompleteRecordTest, OfALongTextIsNoSuccess) {
   expectEveryWay([](QlxObject *logger, const char *) {
     return QlxLogDebugMin(logger, "main.c", "main", 42, u"{0}", kLong.c_str());
   });
+}
+
+TEST_F(IncompleteRecordTest, HasNoDateWhereIcuHasNone) {
+  const IcuDefaults defaults;
+  ASSERT_TRUE(IcuDefaults::setLocale("de@numbers=nonsense"));
+  for (const char *formatter : kFormatters) {
+    SCOPED_TRACE(formatter);
+    ASSERT_EQ(QlxOpenToolkit(config("qlx_basiclogger", formatter).c_str(), nullptr), 1);
+    QlxObject *logger = QlxGetObject("app", nullptr);
+    EXPECT_TRUE(isSuccess(QlxLogUText(logger, u"text")));
+    EXPECT_NE(record().find("text"), std::string::npos);
+    QlxReleaseObject(logger);
+    QlxCloseToolkit();
+  }
+  EXPECT_EQ(QlxBasicUFormatterFormatDate(nullptr, 0), nullptr);
 }
 
 TEST_F(IncompleteRecordTest, OfALongTextAsItStandsIsNoSuccess) {

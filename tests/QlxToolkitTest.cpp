@@ -208,6 +208,19 @@ TEST_F(ToolkitLifeTest, ARecordIsRegisteredUnderTheGivenName) {
   EXPECT_EQ(classNames(101), "qlx_basiclogger|qlx_pdlogger|other|");
 }
 
+// Deliberate: an existing object is compared with what its class calls itself.
+TEST_F(ToolkitLifeTest, AnObjectIsMadeByAnyNameOfItsClassAndFoundByItsOwn) {
+  open();
+  const ApiLock lock;
+  ObjClass *record = qlxInitObjectClass("own", Logger, nullptr, nullptr, nullptr, nullptr);
+  qlxToolkitAddClassDef("other", record);
+  const ObjectRef object{qlxIntlGetObject("object", "other")};
+  ASSERT_NE(object, nullptr);
+  EXPECT_EQ(qlxIntlGetObject("object", "other"), nullptr);
+  const ObjectRef again{qlxIntlGetObject("object", "own")};
+  EXPECT_EQ(again, object);
+}
+
 TEST_F(ToolkitLifeTest, ARecordOfSeveralNamesIsFreedOnce) {
   open();
   const FailingMemory memory;

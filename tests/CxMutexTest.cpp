@@ -4,18 +4,8 @@
 
 #include "support/FailingMemory.h"
 #include "support/Status.h"
+#include "support/WrongUseOfAMutex.h"
 #include "util/CxMutex.h"
-
-#if defined(__SANITIZE_THREAD__)
-#define WRONG_USE_OF_A_MUTEX() GTEST_SKIP() << "the thread sanitizer reports the wrong use itself"
-#elif defined(__has_feature)
-#if __has_feature(thread_sanitizer)
-#define WRONG_USE_OF_A_MUTEX() GTEST_SKIP() << "the thread sanitizer reports the wrong use itself"
-#endif
-#endif
-#ifndef WRONG_USE_OF_A_MUTEX
-#define WRONG_USE_OF_A_MUTEX() static_assert(true)
-#endif
 
 namespace {
 

@@ -39,14 +39,19 @@ static CxStatus renameOver(const char *from, const char *to) {
   return cxUntilDone([&] { return CxFileNameRename(from, to); });
 }
 
+// Of a file system that does not know the call, and of filters that refuse it. What refuses the
+// move itself with EPERM does so again.
+static bool mayBeOfTheCall(int32_t error) {
+  return error == EINVAL || error == ENOSYS || error == EPERM;
+}
+
 // Into a gap: whoever has filled it meanwhile stays.
 static CxStatus renameIntoGap(const char *from, const char *to) {
   const auto call = [&] {
     return cxStatusOfCall(renameat2(AT_FDCWD, from, AT_FDCWD, to, RENAME_NOREPLACE) == 0);
   };
   const CxStatus status = cxUntilDone(call);
-  const bool isUnknown = status.code == EINVAL || status.code == ENOSYS;  // to the file system
-  return isUnknown ? renameOver(from, to) : status;
+  return mayBeOfTheCall(status.code) ? renameOver(from, to) : status;
 }
 
 using Rename = CxStatus(const char *from, const char *to);

@@ -1,5 +1,6 @@
 // The rollover of a file that several processes share, and what fails in it.
 #include "support/MultiProcFileHandlerTest.h"
+#include "support/Descriptors.h"
 #include "support/TestClock.h"
 
 #include <sys/syscall.h>
@@ -255,16 +256,12 @@ TEST_F(MultiProcFileHandlerTest, EmptiesTheFileAlsoWhenTheCopyCannotBeWritten) {
 }
 
 TEST_F(MultiProcFileHandlerTest, ClosesTheCopy) {
-  const auto descriptors = [] {
-    const std::filesystem::directory_iterator all("/proc/self/fd");
-    return std::distance(begin(all), end(all));
-  };
   rollAlways("3");
   log(u"one");
-  const auto before = descriptors();
+  const int before = openDescriptors();
   log(u"two");
   EXPECT_EQ(generations(), "two| one| - -");
-  EXPECT_EQ(descriptors(), before);
+  EXPECT_EQ(openDescriptors(), before);
 }
 
 constexpr int64_t kSecond = 1000000000;

@@ -2,7 +2,6 @@
 
 #include <cerrno>
 #include <cstring>
-#include <filesystem>
 #include <string>
 
 #include <qlx/buffers.h>
@@ -11,6 +10,7 @@
 
 #include "QlxLocked.h"
 #include "QlxReadProps.h"
+#include "support/Descriptors.h"
 #include "support/FailingMemory.h"
 #include "support/Status.h"
 #include "support/Take.h"
@@ -253,15 +253,10 @@ TEST_F(QlxReadPropsTest, WithoutAListNothingIsRead) {
   EXPECT_EQ(status, kUntouched);
 }
 
-size_t openDescriptors() {
-  const std::filesystem::directory_iterator all("/proc/self/fd");
-  return static_cast<size_t>(std::distance(begin(all), end(all)));
-}
-
 TEST_F(QlxReadPropsTest, TheFileIsClosedHoweverReadingEnds) {
   dir.write("good", "a=1\n");
   dir.write("bad", "a\n");
-  const size_t before = openDescriptors();
+  const int before = openDescriptors();
   CxPropListRead(dir.path("good").c_str(), &list, nullptr);
   CxPropListRead(dir.path("bad").c_str(), &list, nullptr);
   CxPropListRead(dir.path().c_str(), &list, nullptr);

@@ -12,11 +12,16 @@
 
 #include <dlfcn.h>
 #include <sys/wait.h>
+#include <unicode/ucal.h>
 #include <unistd.h>
 
+#include "QlxHeldFormats.h"
 #include "support/ChainTest.h"
 #include "support/Child.h"
+#include "support/FreshProcess.h"
+#include "support/OpenToolkit.h"
 #include "support/TempDir.h"
+#include "util/CxAsciiLine.h"
 
 namespace {
 
@@ -104,6 +109,36 @@ TEST(HostsPageExitTest, TrailersAreWrittenByTheCloseAlone) {
   EXPECT_EQ(leftBehind(false), "- text\n");
 }
 
+// ---- The time zone
+
+constexpr double kTime = 1155725335123.0;  // 2006-08-16 10:48:55.123 UTC
+
+std::string hour() {
+  CxAsciiLine line;
+  EXPECT_TRUE(qlxAppendHeldDateAscii(&line, "HH", kTime));
+  return std::string(line.data(), line.length());
+}
+
+void setZoneVariable(const char *zone) {
+  setenv("TZ", zone, 1);
+  tzset();
+}
+
+TEST(HostsPageZoneTest, IsAskedForOnceAndThenFollowsIcu) {
+  inFreshProcess([] {
+    setZoneVariable("Asia/Tokyo");  // before the first date
+    const OpenToolkit toolkit;
+    EXPECT_EQ(hour(), "19");
+    setZoneVariable("UTC");
+    EXPECT_EQ(hour(), "19");
+    UErrorCode status = U_ZERO_ERROR;
+    UChar zone[128];
+    ucal_getHostTimeZone(zone, 128, &status);
+    ucal_setDefaultTimeZone(zone, &status);
+    EXPECT_EQ(hour(), "10");
+  });
+}
+
 // ---- The page
 
 std::set<std::string> testsOfThisProgram() {
@@ -125,7 +160,7 @@ TEST(HostsPage, NamesTestsThatAreThere) {
   std::ifstream in(root / "docs/hosts.md");
   const std::string page{std::istreambuf_iterator<char>(in), {}};
   const std::set<std::string> tests = testsOfThisProgram();
-  static const std::regex name(R"(\b[A-Za-z]+Test\.[A-Za-z0-9]+\b)");
+  static const std::regex name(R"(\b[A-Z][A-Za-z]+\.[A-Z][A-Za-z0-9]+\b)");
   int found = 0;
   for (std::sregex_iterator it(page.begin(), page.end(), name), end; it != end; ++it, ++found) {
     EXPECT_TRUE(tests.contains(it->str())) << it->str();

@@ -16,6 +16,7 @@
 #include "QlxConfigKeys.h"
 #include "QlxFileNames.h"
 #include "QlxObject.h"
+#include "QlxProps.h"
 #include "QlxRolling.h"
 #include "util/CxStatus.h"
 
@@ -247,9 +248,11 @@ static void applyKeepFullFile(QlxObject *handler, const char *key) {
 }
 
 static void applyFileName(QlxObject *handler, const char *key) {
-  const OwnedStr name{qlxIntlGetObjProp(handler, key, nullptr)};
-  const OwnedStr closedName{qlxFHCloseBaseDigits(name.get())};
-  nameActiveFile(closeForChange(handler), closedName.get());
+  const char *name = qlxPeekMapProp(handler->props, key);
+  const OwnedStr closedName{qlxFHCloseBaseDigits(name)};
+  QlxFileHandlerVars *vars = closeForChange(handler);
+  nameActiveFile(vars, closedName.get());
+  if (name && !closedName) vars->nameError = ENOMEM;
 }
 
 static void applyEncoding(QlxObject *handler, const char *key) {

@@ -112,6 +112,21 @@ TEST_F(FileHandlerTest, TellsOfARecordThatItCouldNotNarrow) {
   EXPECT_EQ(failed[0], failure(ENOMEM));
 }
 
+TEST_F(FileHandlerTest, TellsOfEachRecordWhileItsNameFoundNoMemory) {
+  const std::string name = dir.path("other.log");
+  for (uint64_t nth = 1, failures = 1; failures > 0; ++nth) {
+    FailingMemory memory;
+    memory.failOnce(nth);
+    QlxSetObjProp(handler.get(), "fileName", name.c_str());
+    failures = memory.failures();
+    memory.failNone();
+    const OwnedStr stored{QlxGetObjProp(handler.get(), "fileName", nullptr)};
+    if (!stored) continue;
+    EXPECT_EQ(logged(u"1"), vars()->fullName ? kSuccess : failure(ENOMEM)) << nth;
+  }
+  EXPECT_EQ(logged(u"1"), kSuccess);
+}
+
 TEST_F(FileHandlerTest, IgnoresNullAndObjectsWithoutVariables) {
   QlxObject bare = {};
   for (QlxObject *object : {static_cast<QlxObject *>(nullptr), &bare}) {

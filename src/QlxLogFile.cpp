@@ -157,11 +157,18 @@ CxStatus qlxLogFileOpen(QlxFileHandlerVars *vars, int32_t existing) {
   return kCxSuccess;
 }
 
+// EBADF also for a number that leads to another file now.
+static CxStatus findOurs(const QlxFileHandlerVars *vars, CxFile file, Found *found) {
+  const CxStatus status = findOpen(file, found);
+  if (qlxFailed(status)) return status;
+  const bool isOurs = found->device == vars->log.device && found->inode == vars->log.inode;
+  return isOurs ? status : cxFailure(EBADF);
+}
+
 CxStatus qlxLogFileMeasure(QlxFileHandlerVars *vars) {
   Found found;
-  const CxStatus status = findOpen(vars->file, &found);
+  const CxStatus status = findOurs(vars, vars->file, &found);
   if (qlxFailed(status)) return status;
-  if (found.device != vars->log.device || found.inode != vars->log.inode) return cxFailure(EBADF);
   takeSize(vars, found);
   return kCxSuccess;
 }
@@ -223,7 +230,5 @@ bool qlxLogFileSpend(QlxFileHandlerVars *vars) {
   CxFile reserve = vars->log.reserve;
   vars->log.reserve = -1;
   Found found;
-  const bool isOurs = !qlxFailed(findOpen(reserve, &found)) && found.device == vars->log.device &&
-                      found.inode == vars->log.inode;
-  return isOurs && !qlxFailed(CxFileClose(&reserve));
+  return !qlxFailed(findOurs(vars, reserve, &found)) && !qlxFailed(CxFileClose(&reserve));
 }

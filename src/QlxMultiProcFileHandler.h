@@ -23,7 +23,8 @@ void qlxMultiProcFileHandlerUnlockSem(QlxFileHandlerVars *vars);
 /** Moves the generations up by one and empties the active file into the first. */
 void qlxMultiProcFileHandlerDoRollover(QlxFileHandlerVars *vars);
 
-/** Copies the active file into generation 1 and truncates it, also when the copy failed. */
+/** Copies the active file into generation 1 and truncates it, also when the copy failed, unless
+ *  keepFullFile is set. */
 void qlxMultiProcFileHandlerRollActiveLog(QlxFileHandlerVars *vars);
 
 QLX_END_DECLS

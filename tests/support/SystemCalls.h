@@ -1,6 +1,6 @@
-// In place of the C library's sleep, semget, semop, semctl, ftruncate, lseek, statx, fstatat and lstat,
-// for the whole program of the tests: nothing in it waits by the clock, and a test may answer instead of
-// the system.
+// In place of the C library's sleep, semget, semop, semctl, ftruncate, lseek, statx, fstatat and
+// lstat, for the whole program of the tests: nothing in it waits by the clock, and a test may
+// answer instead of the system.
 #ifndef QLX_TESTS_SYSTEMCALLS_H
 #define QLX_TESTS_SYSTEMCALLS_H
 

@@ -234,9 +234,20 @@ TEST_P(LogFileTest, StartsAnotherFileWithoutAnEmptyLine) {
     const FileSizeLimit full{8};
     log(u"67890");
   }
-  set("fileName", dir.path("other.log"));
+  set("fileName", dir.write("other.log", "old\n"));
   log(u"next");
-  EXPECT_EQ(dir.read("other.log"), "next\n");
+  EXPECT_EQ(dir.read("other.log"), "old\nnext\n");
+}
+
+TEST_P(LogFileTest, GoesOnWhereThePieceBeganAlsoWhenItDoesNotAppend) {
+  set("appending", "false");
+  log(u"12345");
+  {
+    const FileSizeLimit full{8};
+    EXPECT_EQ(logged(u"67890"), failure(EFBIG));
+  }
+  EXPECT_EQ(logged(u"next"), kSuccess);
+  EXPECT_EQ(dir.read("app.log"), "12345\nnext\n");
 }
 
 TEST_P(LogFileTest, StartsTheFileAfterARolloverWithoutAnEmptyLine) {

@@ -27,7 +27,7 @@ struct FreeVars {
 class FileThatAppears {
  public:
   FileThatAppears(const std::string &name, const std::string &bytes) {
-    calls_.afterLook = [=, this](const char *path) {
+    calls_.afterLook = [=](const char *path) {
       const std::filesystem::path looked(path);
       if (looked.lexically_normal() != name || std::filesystem::exists(looked)) return;
       std::ofstream(name) << bytes;

@@ -46,6 +46,7 @@ const std::map<long, std::string> kNames{
     {SYS_fsync, "fsync"},
     {SYS_ftruncate, "ftruncate"},
     {SYS_getcwd, "getcwd"},
+    {SYS_geteuid, "geteuid"},
     {SYS_getdents64, "getdents64"},
     {SYS_lseek, "lseek"},
     {SYS_read, "read"},

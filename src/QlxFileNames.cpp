@@ -41,7 +41,7 @@ char *qlxFHCloseBaseDigits(const char *name) {
   return closed;
 }
 
-void qlxGetNativePath(const char *name, char buffer[kMaxNameBytes + 1]) {
+void qlxGetNativePath(const char *name, QlxFileName buffer) {
   if (!buffer) return;
   buffer[0] = '\0';
   CxFileNameGetNative(name, buffer, kMaxNameBytes);
@@ -78,7 +78,7 @@ static int32_t cutNumber(char *stem) {
 }
 
 // The working directory in `buffer`; a failure is reported and leaves it empty.
-static void getCurrentDirectory(char buffer[kMaxNameBytes + 1]) {
+static void getCurrentDirectory(QlxFileName buffer) {
   const CxStatus status = CxProcessGetCwd(buffer, kMaxNameBytes + 1);
   if (qlxFailed(status)) QlxReportPlatformErr(status);
   std::replace(buffer, buffer + OslStringLen(buffer), '\\', '/');  // as in the name
@@ -89,7 +89,7 @@ void qlxFHGetFileNameParts(const char *name, QlxFileHandlerVars *vars) {
   clearParts(vars);
   vars->nameError = OslStringLen(name) > kMaxNameBytes ? ENAMETOOLONG : 0;
   if (!name || vars->nameError != 0) return;
-  char stem[kMaxNameBytes + 1];
+  QlxFileName stem;
   qlxGetNativePath(name, stem);
 
   // Deliberate: a dot in a directory's name, with none in the file's, makes all behind it the

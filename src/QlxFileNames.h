@@ -7,6 +7,9 @@
 
 QLX_BEGIN_DECLS
 
+/** The longest name of a file, with its terminator. */
+typedef char QlxFileName[257];
+
 /** Place of the digit before the last dot of the whole name (before its end when it has none); -1
  *  when no digit stands there, and for null. */
 int32_t qlxFHTrailingBaseDigit(const char *name);
@@ -25,7 +28,7 @@ void qlxSetFileNameParts(char **out, const char *dir, const char *base, int32_t 
                          const char *ext);
 
 /** Copies the first 256 bytes of a name, with each backslash as "/", and terminates. */
-void qlxGetNativePath(const char *name, char buffer[257]);
+void qlxGetNativePath(const char *name, QlxFileName buffer);
 
 /** A new copy of a name in which a digit that would run into a generation's number is followed by
  *  "_"; null for null. */
@@ -33,9 +36,6 @@ char *qlxFHCloseBaseDigits(const char *name);
 
 /** The name of a generation, or null. */
 char *qlxFHGenerationName(const QlxFileHandlerVars *vars, int32_t generation);
-
-/** A name that is not cut, with its terminator. */
-typedef char QlxFileName[257];
 
 /** As qlxFHGenerationName(), without memory. 0, and an empty name, for one that would have to be
  * cut, and for none. */

@@ -10,6 +10,7 @@
 
 #include "QlxLoggedEvent.h"
 #include "support/ChainTest.h"
+#include "support/SemaphoreKey.h"
 #include "support/TempDir.h"
 
 namespace {
@@ -193,7 +194,9 @@ TEST_F(EventSourceTest, IsInALineThatIsNotAscii) {
 }
 
 TEST_F(EventSourceTest, IsInTheLinesOfAFileThatProcessesShare) {
+  const SemaphoreKey key;
   const Handle file = attachFile("a.log", "qlx_multiproc_filehandler");
+  QlxSetObjProp(file.get(), "MPFileSemKey", key.text().c_str());
   debug();
   EXPECT_EQ(linesOf("a.log"), "file.c function 7 text\n");
 }

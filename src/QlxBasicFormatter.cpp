@@ -10,15 +10,15 @@
 #include <qlx/event.h>
 #include <qlx/memory.h>
 
-#include "QlxClasses.h"
-#include "QlxConfigKeys.h"
-#include "QlxEventValues.h"
-#include "QlxFormatted.h"
-#include "QlxHeldFormats.h"
+#include "object/QlxClasses.h"
+#include "object/QlxConfigKeys.h"
+#include "record/QlxEventValues.h"
+#include "record/QlxFormatted.h"
+#include "text/QlxFormatCache.h"
 #include "QlxI18Msg.h"
-#include "QlxLoggedEvent.h"
+#include "record/QlxLoggedEvent.h"
 #include "QlxObject.h"
-#include "QlxOperation.h"
+#include "object/QlxOperation.h"
 #include "util/CxDecimal.h"
 #include "util/CxUStringBuff.h"
 #include "util/CxUnits.h"
@@ -75,7 +75,7 @@ class WideLine {
   bool append(std::string_view text) { return orMiss(cxUStringBuffAppend(text_, text)); }
 
   bool appendDate(const char *pattern, double time) {
-    return orMiss(qlxAppendHeldDate(text_, pattern, time));
+    return orMiss(qlxAppendCachedDate(text_, pattern, time));
   }
 
   bool appendNumber(uint64_t number) { return orMiss(CxUStringBuffAppendUInt64(text_, number)); }
@@ -111,7 +111,7 @@ class AsciiLine {
   bool append(std::string_view text) { return line_->append(text); }
 
   bool appendDate(const char *pattern, double time) {
-    return qlxAppendHeldDateAscii(line_, pattern, time);
+    return qlxAppendCachedDateAscii(line_, pattern, time);
   }
 
   bool appendNumber(uint64_t number) {
@@ -129,7 +129,7 @@ class AsciiLine {
       const size_t units = cxUnitsLength(message->text);
       if (line_->append(message->text, units, QlxPatternSyntax{})) return true;
     }
-    KeptBuffer text;
+    CachedBuffer text;
     qlxIntlBindI18MsgTo(message, args, text.get());
     return line_->append(text.get()->data, text.get()->length);
   }
@@ -198,7 +198,8 @@ char *QlxBasicFormatterFGetTrailer(QlxObject *) {
 
 UChar *QlxBasicUFormatterFormatDate(QlxObject *formatter, double time) {
   CxUStringBuff text{};
-  if (qlxAppendHeldDate(&text, datePatternOf(formatter), time)) return CxUStringBuffTakeUStr(&text);
+  if (qlxAppendCachedDate(&text, datePatternOf(formatter), time))
+    return CxUStringBuffTakeUStr(&text);
   CxUStringBuffDiscard(&text);
   return nullptr;
 }

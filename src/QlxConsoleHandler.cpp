@@ -9,7 +9,7 @@
 #include <qlx/memory.h>
 #include <qlx/ustring.h>
 
-#include "QlxClasses.h"
+#include "object/QlxClasses.h"
 #include "QlxObject.h"
 
 // The variables: 1 after the header was written, 0 at first and after the trailer.

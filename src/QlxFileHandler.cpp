@@ -12,12 +12,12 @@
 #include <qlx/memory.h>
 #include <qlx/toolkit.h>
 
-#include "QlxClasses.h"
-#include "QlxConfigKeys.h"
-#include "QlxFileNames.h"
+#include "object/QlxClasses.h"
+#include "object/QlxConfigKeys.h"
+#include "file/QlxFileNames.h"
 #include "QlxObject.h"
 #include "QlxProps.h"
-#include "QlxRolling.h"
+#include "file/QlxRolling.h"
 #include "util/CxStatus.h"
 
 static constexpr const char *kFirstFileName = "default.log";
@@ -124,7 +124,7 @@ static bool rollOver(QlxObject *handler, QlxFileHandlerVars *vars) {
 // file under its name is not noticed, what is open goes on. Between two looks own bytes are
 // counted; what the count calls full is measured.
 static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
-  if (!qlxLookAgain(&vars->log.look) && !qlxFileHandlerIsFull(vars)) return true;
+  if (!cxLookAgain(&vars->log.look) && !qlxFileHandlerIsFull(vars)) return true;
   const CxStatus status = qlxLogFileMeasure(vars);
   if (qlxFailed(status)) {
     qlxKeepFailure(nullptr, status);

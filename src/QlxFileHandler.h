@@ -5,9 +5,9 @@
 #include <qlx/class/handler.h>
 #include <qlx/types.h>
 
-#include "QlxFormatted.h"
-#include "QlxLogFile.h"
-#include "QlxProblems.h"
+#include "record/QlxFormatted.h"
+#include "file/QlxLogFile.h"
+#include "file/QlxProblems.h"
 
 QLX_BEGIN_DECLS
 

@@ -5,11 +5,11 @@
 #include <qlx/class/object.h>
 #include <qlx/handler.h>
 
-#include "QlxConfigKeys.h"
-#include "QlxLocked.h"
-#include "QlxLoggedEvent.h"
+#include "object/QlxConfigKeys.h"
+#include "object/QlxLocked.h"
+#include "record/QlxLoggedEvent.h"
 #include "QlxObject.h"
-#include "QlxOperation.h"
+#include "object/QlxOperation.h"
 
 QlxObject *qlxIntlHandlerGetFormatter(QlxObject *handler) {
   return isKind(handler, Handler) ? qlxIntlAcquireObject(handler->kind2.formatter) : nullptr;

@@ -12,8 +12,8 @@
 #include <qlx/message.h>
 #include <qlx/ustring.h>
 
-#include "QlxHeldFormats.h"
-#include "QlxLocked.h"
+#include "text/QlxFormatCache.h"
+#include "object/QlxLocked.h"
 #include "util/CxOwned.h"
 
 using OwnedMsg = Owned<I18Msg, qlxIntlFreeI18Msg>;
@@ -78,7 +78,7 @@ void qlxSetI18MsgLocale(I18Msg *message, const char *locale) {
 static uint32_t bindTo(I18Msg *message, va_list *args, CxUStringBuff *text, UErrorCode *status) {
   if (!message->bundle) {
     if (!message->text) return 0;
-    return qlxAppendHeldMessage(text, message->locale, message->text, args, status);
+    return qlxAppendCachedMessage(text, message->locale, message->text, args, status);
   }
   return qlxAppendBundleMessage(text, {message->bundle, message->key, message->locale}, args,
                                 status);

@@ -5,7 +5,7 @@
 #include <qlx/class/event.h>
 #include <qlx/class/message.h>
 
-#include "QlxLoggedEvent.h"
+#include "record/QlxLoggedEvent.h"
 
 QLX_BEGIN_DECLS
 

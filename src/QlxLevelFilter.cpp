@@ -7,11 +7,11 @@
 #include <qlx/level.h>
 #include <qlx/memory.h>
 
-#include "QlxClasses.h"
-#include "QlxConfigKeys.h"
-#include "QlxLoggedEvent.h"
+#include "object/QlxClasses.h"
+#include "object/QlxConfigKeys.h"
+#include "record/QlxLoggedEvent.h"
 #include "QlxObject.h"
-#include "QlxOperation.h"
+#include "object/QlxOperation.h"
 #include "QlxProps.h"
 
 void QlxBasicFilterFProcess(QlxObject *filter, Event *event, va_list *args) {

@@ -7,7 +7,7 @@
 #include <qlx/config.h>
 #include <qlx/memory.h>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "QlxObjConfig.h"
 
 static constexpr const char *kRoot = "/";

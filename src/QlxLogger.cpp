@@ -11,12 +11,12 @@
 #include <qlx/level.h>
 #include <qlx/memory.h>
 
-#include "QlxClasses.h"
-#include "QlxConfigKeys.h"
-#include "QlxLocked.h"
-#include "QlxLoggedEvent.h"
+#include "object/QlxClasses.h"
+#include "object/QlxConfigKeys.h"
+#include "object/QlxLocked.h"
+#include "record/QlxLoggedEvent.h"
 #include "QlxObject.h"
-#include "QlxOperation.h"
+#include "object/QlxOperation.h"
 #include "QlxProps.h"
 
 static constexpr QlxLogResult kNothingLogged = {'-', 0, 0};

@@ -12,8 +12,8 @@
 #include <qlx/memory.h>
 #include <qlx/props.h>
 
-#include "QlxClasses.h"
-#include "QlxConfigKeys.h"
+#include "object/QlxClasses.h"
+#include "object/QlxConfigKeys.h"
 #include "QlxObject.h"
 #include "QlxProps.h"
 

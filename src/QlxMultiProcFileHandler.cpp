@@ -15,11 +15,11 @@
 #include <qlx/files.h>
 #include <qlx/memory.h>
 
-#include "QlxClasses.h"
-#include "QlxFileNames.h"
+#include "object/QlxClasses.h"
+#include "file/QlxFileNames.h"
 #include "QlxObject.h"
-#include "QlxRolling.h"
-#include "QlxSharedLock.h"
+#include "file/QlxRolling.h"
+#include "file/QlxSharedLock.h"
 #include "util/CxFile.h"
 #include "util/CxStatus.h"
 
@@ -42,7 +42,7 @@ static CxStatus copyBytes(CxFile *from, CxFile *to) {
     CxStatus status =
         cxUntilDone([&] { return CxFileRead(from, bytes.data(), kCopyBytes, &count); });
     if (qlxFailed(status) || count == 0) return status;
-    status = cxIntlFileWriteAll(to, bytes.data(), static_cast<uint32_t>(count), &copied);
+    status = cxFileWriteAll(to, bytes.data(), static_cast<uint32_t>(count), &copied);
     if (qlxFailed(status)) return status;
   }
 }
@@ -128,7 +128,7 @@ static bool rollActiveFile(QlxFileHandlerVars *vars, Event *event) {
 static constexpr int64_t kNanosecondsBetweenTries = 1000000000;
 
 static bool waitsForNextTry(const QlxFileHandlerVars *vars) {
-  return vars->stuck && qlxLookTick() - vars->stuckSince < kNanosecondsBetweenTries;
+  return vars->stuck && cxLookTick() - vars->stuckSince < kNanosecondsBetweenTries;
 }
 
 static void rollOver(QlxFileHandlerVars *vars, Event *event) {
@@ -136,7 +136,7 @@ static void rollOver(QlxFileHandlerVars *vars, Event *event) {
   const auto makeRoom = mayComeAgain ? qlxFreeFirstGeneration : qlxShiftGenerations;
   const bool hasRoom = makeRoom(vars, event) || !vars->keepFullFile;
   vars->stuck = !hasRoom || !rollActiveFile(vars, event);
-  vars->stuckSince = qlxLookTick();
+  vars->stuckSince = cxLookTick();
 }
 
 static bool mayRoll(QlxFileHandlerVars *vars) {

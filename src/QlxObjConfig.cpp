@@ -8,7 +8,7 @@
 #include <qlx/memory.h>
 #include <qlx/props.h>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "QlxLogManager.h"
 #include "QlxProps.h"
 

@@ -9,9 +9,9 @@
 #include <qlx/memory.h>
 #include <qlx/object.h>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "QlxLogManager.h"
-#include "QlxOperation.h"
+#include "object/QlxOperation.h"
 #include "QlxToolkit.h"
 
 static constexpr const char *kDefaultFormatterName = "quill.defaultFormatter";

@@ -10,8 +10,8 @@
 #include <qlx/memory.h>
 #include <qlx/system.h>
 
-#include "QlxClasses.h"
-#include "QlxLoggedEvent.h"
+#include "object/QlxClasses.h"
+#include "record/QlxLoggedEvent.h"
 #include "QlxObject.h"
 
 namespace {

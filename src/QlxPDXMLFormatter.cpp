@@ -8,12 +8,12 @@
 #include <qlx/event.h>
 #include <qlx/memory.h>
 
-#include "QlxClasses.h"
-#include "QlxConfigKeys.h"
-#include "QlxFormatted.h"
-#include "QlxHeldFormats.h"
+#include "object/QlxClasses.h"
+#include "object/QlxConfigKeys.h"
+#include "record/QlxFormatted.h"
+#include "text/QlxFormatCache.h"
 #include "QlxI18Msg.h"
-#include "QlxMsgId.h"
+#include "record/QlxMsgId.h"
 #include "QlxObject.h"
 
 using namespace std::string_view_literals;
@@ -118,7 +118,7 @@ static void appendStart(RecordText &out, const Event *event, std::u16string_view
 
 static void appendTime(RecordText &out, const QlxObject *formatter, double time) {
   out << " <Time Millis=\""sv;
-  out.number(kHeldWhole, time) << "\">"sv;
+  out.number(kCachedWhole, time) << "\">"sv;
   out.date(formatter->kind2.dateTimeFormat, time) << "</Time>\n"sv;
 }
 

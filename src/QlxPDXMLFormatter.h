@@ -5,8 +5,8 @@
 
 #include <qlx/class/formatter.h>
 
-#include "QlxEventValues.h"
-#include "QlxRecordText.h"
+#include "record/QlxEventValues.h"
+#include "record/QlxRecordText.h"
 
 QLX_BEGIN_DECLS
 

@@ -3,7 +3,7 @@
 #ifndef QLX_SRC_QLXREADPROPS_H
 #define QLX_SRC_QLXREADPROPS_H
 
-#include "QlxPropsFile.h"
+#include "file/QlxPropsFile.h"
 #include "util/CxPropList.h"
 
 QLX_BEGIN_DECLS

@@ -9,13 +9,13 @@
 #include <qlx/class/handler.h>
 #include <qlx/toolkit.h>
 
-#include "QlxClasses.h"
-#include "QlxFormatted.h"
-#include "QlxHeldFormats.h"
-#include "QlxLocked.h"
-#include "QlxLoggedEvent.h"
+#include "object/QlxClasses.h"
+#include "record/QlxFormatted.h"
+#include "text/QlxFormatCache.h"
+#include "object/QlxLocked.h"
+#include "record/QlxLoggedEvent.h"
 #include "QlxLogManager.h"
-#include "QlxObjClass.h"
+#include "object/QlxObjClass.h"
 #include "QlxObject.h"
 #include "QlxReadProps.h"
 #include "util/CxThread.h"
@@ -178,9 +178,9 @@ static void closeToolkit() {
   qlxCloseLogMgr();
   qlxFreeInstancesMap();
   freeClasses();
-  qlxDropKeptEvent();
+  qlxDropCachedEvent();
   qlxDropFormatted();
-  qlxDropHeldFormats();
+  qlxDropCachedFormats();
   gToolkit.open = 0;
 }
 

@@ -11,13 +11,13 @@
 #include <qlx/class/message.h>
 #include <qlx/event.h>
 
-#include "QlxClasses.h"
-#include "QlxEventValues.h"
-#include "QlxFormatted.h"
+#include "object/QlxClasses.h"
+#include "record/QlxEventValues.h"
+#include "record/QlxFormatted.h"
 #include "QlxI18Msg.h"
-#include "QlxMsgId.h"
+#include "record/QlxMsgId.h"
 #include "QlxObject.h"
-#include "QlxRecordText.h"
+#include "record/QlxRecordText.h"
 
 using namespace std::string_view_literals;
 

@@ -7,9 +7,9 @@
 
 #include <unicode/ustring.h>
 
-#include "QlxClasses.h"
-#include "QlxHeldFormats.h"
-#include "QlxLocked.h"
+#include "object/QlxClasses.h"
+#include "text/QlxFormatCache.h"
+#include "object/QlxLocked.h"
 #include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"
 #include "support/Take.h"
@@ -373,7 +373,7 @@ TEST_F(BasicFormatterTest, WithoutMemoryALineLacksFieldsOrIsNull) {
       const EventPtr event = makeEvent(u"'{message}'");
       QlxSetEventProp(event.get(), "qlx_prop_srcfile", "main.c");
       QlxSetEventProp(event.get(), "product", "product");
-      qlxDropHeldFormats();
+      qlxDropCachedFormats();
       FailingMemory memory;
       (memory.*fail)(nth);
       const std::u16string text = line(event);

@@ -11,7 +11,7 @@
 
 #include "util/CxOwned.h"
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "support/FailingMemory.h"
 #include "support/Take.h"
 

@@ -13,7 +13,7 @@
 #include <qlx/message.h>
 #include <qlx/props.h>
 
-#include "QlxHeldFormats.h"
+#include "text/QlxFormatCache.h"
 #include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"
 #include "support/ResourceBundles.h"
@@ -34,8 +34,8 @@ Message textMessage(const UChar *text) {
 
 class I18MsgTest : public ::testing::Test {
  protected:
-  void SetUp() override { qlxDropHeldFormats(); }
-  void TearDown() override { qlxDropHeldFormats(); }
+  void SetUp() override { qlxDropCachedFormats(); }
+  void TearDown() override { qlxDropCachedFormats(); }
 
   // The text that a message binds to, "<null>" for null.
   static std::u16string bindWith(I18Msg *message, ...) {
@@ -370,7 +370,7 @@ TEST_F(I18MsgTest, WithoutMemoryAMessageIsWholeOrNull) {
         EXPECT_EQ(text, made->error ? u"<null>" : u"{");
         EXPECT_EQ(made->error, made->error ? U_MEMORY_ALLOCATION_ERROR : 0);
       }
-      qlxDropHeldFormats();
+      qlxDropCachedFormats();
       EXPECT_EQ(memory.live(), 0);
       if (memory.failures() == 0) break;
     }

@@ -2,7 +2,7 @@
 
 #include <qlx/class/logger.h>
 
-#include "QlxLoggedEvent.h"
+#include "record/QlxLoggedEvent.h"
 #include "support/ChainTest.h"
 #include "support/FailingMemory.h"
 #include "support/HostClasses.h"
@@ -293,7 +293,7 @@ TEST_F(LoggerTest, ACallWithoutListenersMakesAndFreesItsEvent) {
   const FailingMemory memory;
   EXPECT_EQ(QlxLogInfo(lonely.get(), "bundle", "key"), kNothing);
   EXPECT_GT(memory.attempts(), 0u);
-  qlxDropKeptEvent();  // its blocks wait for the next call
+  qlxDropCachedEvent();  // its blocks wait for the next call
   EXPECT_EQ(memory.live(), 0);
 }
 

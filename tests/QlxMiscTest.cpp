@@ -6,7 +6,7 @@
 #include <qlx/memory.h>
 #include <qlx/toolkit.h>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "support/CaptureStdout.h"
 #include "support/FailingMemory.h"
 #include "support/Take.h"

@@ -10,9 +10,9 @@
 #include <optional>
 #include <utility>
 
-#include "QlxFormatted.h"
-#include "QlxHeldFormats.h"
-#include "QlxLoggedEvent.h"
+#include "record/QlxFormatted.h"
+#include "text/QlxFormatCache.h"
+#include "record/QlxLoggedEvent.h"
 #include "support/HostName.h"
 #include "support/ChainTest.h"
 #include "support/FailingMemory.h"
@@ -413,8 +413,8 @@ TEST_F(PDLoggerTest, WhateverFindsNoMemoryBeforeTheFirstListenerIsTold) {
       for (uint64_t nth = 1, failures = 1; failures > 0; ++nth) {
         EXPECT_EQ(log(), kSuccess);
         const std::string whole = Arrival::event;
-        if (isFirstCall) qlxDropKeptEvent();
-        qlxDropHeldFormats();
+        if (isFirstCall) qlxDropCachedEvent();
+        qlxDropCachedFormats();
         qlxDropFormatted();
         (memory.*fail)(nth);
         const CxStatus status = log();
@@ -506,7 +506,7 @@ TEST_F(PDLoggerTest, AllItsMemoryIsGivenBackWhenItIsReleased) {
     QlxLogInfo(made.get(), nullptr, nullptr);
     EXPECT_GT(memory.live(), 0);
   }
-  qlxDropKeptEvent();  // what is kept for the next call
+  qlxDropCachedEvent();  // what is kept for the next call
   qlxDropFormatted();
   EXPECT_EQ(memory.live(), 0);
 }

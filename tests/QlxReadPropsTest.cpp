@@ -8,7 +8,7 @@
 #include <qlx/proplist.h>
 #include <qlx/qlx.h>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "QlxReadProps.h"
 #include "support/Descriptors.h"
 #include "support/FailingMemory.h"

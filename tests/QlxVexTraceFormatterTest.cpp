@@ -4,7 +4,7 @@
 
 #include <string>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"
 #include "support/ResourceBundles.h"

@@ -159,7 +159,7 @@ writeSource() {
 
 #include "$2.h"
 #include "QlxElements.h"
-#include "../QlxLocked.h"
+#include "object/QlxLocked.h"
 
 namespace {
 

@@ -57,7 +57,7 @@ CxStatus CxFileWrite(CxFile *file, const void *buffer, uint32_t length, int32_t 
   return cxStatusOfCall(*count != -1);
 }
 
-CxStatus cxIntlFileWriteAll(CxFile *file, const char *bytes, uint32_t length, uint64_t *written) {
+CxStatus cxFileWriteAll(CxFile *file, const char *bytes, uint32_t length, uint64_t *written) {
   while (length > 0) {
     int32_t count = 0;
     const CxStatus status = cxUntilDone([&] { return CxFileWrite(file, bytes, length, &count); });

@@ -11,14 +11,14 @@
 static constexpr uint32_t kFirstWorkBytes = 1024;
 static constexpr uint32_t kMaxWorkBytes = 64 * 1024;
 
-int64_t cxIntlMillisOf(int64_t seconds, int64_t microseconds) {
+int64_t cxMillisOf(int64_t seconds, int64_t microseconds) {
   return seconds * 1000 + microseconds / 1000;
 }
 
 double CxSystemGetTimestamp(void) {
   timeval now;
   gettimeofday(&now, nullptr);
-  return static_cast<double>(cxIntlMillisOf(now.tv_sec, now.tv_usec));
+  return static_cast<double>(cxMillisOf(now.tv_sec, now.tv_usec));
 }
 
 static bool ownName(char *buffer, uint32_t length, const CxHostCalls &calls) {

@@ -10,7 +10,7 @@
 QLX_BEGIN_DECLS
 
 // Whole milliseconds of a clock reading; parts of one are dropped.
-int64_t cxIntlMillisOf(int64_t seconds, int64_t microseconds);
+int64_t cxMillisOf(int64_t seconds, int64_t microseconds);
 
 typedef struct CxHostCalls {
   int (*getName)(char *buffer, size_t length);  // as gethostname()

@@ -5,7 +5,7 @@
 #include <cstring>
 #include <string_view>
 
-#include "../QlxHeldFormats.h"
+#include "text/QlxFormatCache.h"
 #include "CxDecimal.h"
 #include "CxOwned.h"
 #include "CxStringBuff.h"
@@ -124,11 +124,11 @@ uint8_t CxUStringBuffAppendUInt64(CxUStringBuff *buffer, uint64_t value) {
 }
 
 uint8_t CxUStringBuffAppendUDate(CxUStringBuff *buffer, double date) {
-  return buffer ? qlxAppendHeldNumber(buffer, kHeldWhole, date) : 0;
+  return buffer ? qlxAppendCachedNumber(buffer, kCachedWhole, date) : 0;
 }
 
 uint8_t CxUStringBuffAppendUDouble(CxUStringBuff *buffer, double value) {
-  return buffer ? qlxAppendHeldNumber(buffer, kHeldFraction, value) : 0;
+  return buffer ? qlxAppendCachedNumber(buffer, kCachedFraction, value) : 0;
 }
 
 UChar *CxUStringBuffTakeUStr(CxUStringBuff *buffer) {

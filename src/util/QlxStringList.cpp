@@ -5,7 +5,7 @@
 
 #include "QlxListTemplate.h"
 #include "QlxElements.h"
-#include "../QlxLocked.h"
+#include "object/QlxLocked.h"
 
 namespace {
 

@@ -5,7 +5,7 @@
 
 #include "QlxMapTemplate.h"
 #include "QlxElements.h"
-#include "../QlxLocked.h"
+#include "object/QlxLocked.h"
 
 namespace {
 

@@ -6,7 +6,7 @@
 
 #include <qlx/memory.h>
 
-#include "QlxFileNames.h"
+#include "file/QlxFileNames.h"
 #include "support/Take.h"
 
 static void require(bool holds) {

@@ -6,7 +6,7 @@
 #include <unicode/dcfmtsym.h>
 #include <unicode/decimfmt.h>
 
-#include "QlxNumberShape.h"
+#include "text/QlxNumberShape.h"
 
 static void require(bool holds) {
   if (!holds) std::abort();

@@ -1,7 +1,7 @@
 // Any units as a message's pattern: where ICU can read it, its levels are those that ICU counts;
 // where it cannot, ICU comes no deeper than what is told. So nothing is refused that ICU takes at
 // the limit, and nothing deeper gets to it.
-#include "QlxPatternNesting.h"
+#include "text/QlxPatternNesting.h"
 
 #include <algorithm>
 #include <cstdint>

@@ -7,8 +7,8 @@
 
 #include <unicode/messagepattern.h>
 
-#include "QlxPatternNesting.h"
-#include "QlxPatternTypes.h"
+#include "text/QlxPatternNesting.h"
+#include "text/QlxPatternTypes.h"
 
 static void require(bool holds) {
   if (!holds) std::abort();

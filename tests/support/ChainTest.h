@@ -5,7 +5,7 @@
 #include <memory>
 #include <optional>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "support/PlainFormatter.h"
 #include "support/RecordingHandler.h"
 #include "support/ToolkitTest.h"

@@ -8,7 +8,7 @@
 
 #include <qlx/qlx.h>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "support/Choices.h"
 #include "support/ModelToolkit.h"
 

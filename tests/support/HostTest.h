@@ -4,7 +4,7 @@
 
 #include <optional>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "support/HostClasses.h"
 #include "support/ToolkitTest.h"
 

@@ -6,7 +6,7 @@
 
 #include <qlx/qlx.h>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "QlxLogManager.h"
 #include "QlxObject.h"
 #include "support/Status.h"

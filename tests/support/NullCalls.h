@@ -18,7 +18,7 @@
 #include <utility>
 #include <vector>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "support/Status.h"
 #include "support/Take.h"
 

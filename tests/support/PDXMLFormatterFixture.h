@@ -10,7 +10,7 @@
 #include <qlx/class/formatter.h>
 #include <qlx/class/message.h>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "support/IcuDefaults.h"
 #include "support/Take.h"
 #include "support/ToolkitTest.h"

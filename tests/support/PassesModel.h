@@ -11,7 +11,7 @@
 
 #include <qlx/qlx.h>
 
-#include "QlxLocked.h"
+#include "object/QlxLocked.h"
 #include "QlxObject.h"
 #include "support/Choices.h"
 #include "support/ModelToolkit.h"

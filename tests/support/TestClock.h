@@ -2,18 +2,18 @@
 #ifndef QLX_TESTS_TESTCLOCK_H
 #define QLX_TESTS_TESTCLOCK_H
 
-#include "QlxLook.h"
+#include "util/CxLook.h"
 
 class TestClock {
  public:
-  TestClock() : before_(qlxLookTick) {
+  TestClock() : before_(cxLookTick) {
     tick = 1;
-    qlxLookTick = [] { return tick; };
-    qlxLookRestart();
+    cxLookTick = [] { return tick; };
+    cxLookRestart();
   }
   ~TestClock() {
-    qlxLookTick = before_;
-    qlxLookRestart();
+    cxLookTick = before_;
+    cxLookRestart();
   }
   TestClock(const TestClock &) = delete;
   TestClock &operator=(const TestClock &) = delete;

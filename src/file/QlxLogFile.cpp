@@ -1,0 +1,234 @@
+#include "QlxLogFile.h"
+
+#include <cerrno>
+#include <cstring>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <sys/sysmacros.h>
+#include <unistd.h>
+
+#include <qlx/files.h>
+
+#include "QlxFileHandler.h"
+#include "util/CxFile.h"
+#include "util/CxStatus.h"
+
+static constexpr int kHighNumber = 500;
+static constexpr int kFirstFreeNumber = STDERR_FILENO + 1;
+
+static QlxFileHandlerVars *gOpen;  // linked by log.next
+
+// ---- What a path or a descriptor leads to
+
+namespace {
+struct Found {
+  bool isRegular;
+  uint64_t device, inode;
+  int64_t size;
+};
+}  // namespace
+
+// Does not ask for the times: after a look at them the next write has to store them anew, which
+// costs as much again as the write.
+static CxStatus find(int directory, const char *path, int flags, Found *found) {
+  struct statx info;
+  if (statx(directory, path, flags, STATX_TYPE | STATX_INO | STATX_SIZE, &info) == 0) {
+    const uint64_t device = uint64_t{info.stx_dev_major} << 32 | info.stx_dev_minor;
+    *found = {S_ISREG(info.stx_mode), device, info.stx_ino, static_cast<int64_t>(info.stx_size)};
+    return kCxSuccess;
+  }
+  struct stat old;  // missing, or a system that refuses statx
+  if (fstatat(directory, path, &old, flags) != 0) return cxFailure(errno);
+  const uint64_t device = uint64_t{major(old.st_dev)} << 32 | minor(old.st_dev);
+  *found = {S_ISREG(old.st_mode), device, old.st_ino, old.st_size};
+  return kCxSuccess;
+}
+
+static CxStatus findOpen(CxFile file, Found *found) {
+  return file < 0 ? cxFailure(EBADF) : find(file, "", AT_EMPTY_PATH, found);
+}
+
+CxStatus qlxLeadsToFile(const char *name) {
+  Found found;
+  const CxStatus status = find(AT_FDCWD, name, 0, &found);
+  return qlxFailed(status) || found.isRegular ? status : cxFailure(ENOENT);
+}
+
+// Links to descriptors, such as /dev/stdout: what they lead to is not this name's, so it must
+// neither be renamed nor truncated.
+static bool isDescriptorsName(const char *name) {
+  static constexpr const char *kPlaces[] = {"/proc/", "/dev/fd/", "/dev/std"};
+  char target[sizeof "/dev/fd/"] = "";
+  const ssize_t length = readlink(name, target, sizeof target - 1);
+  for (const char *place : kPlaces) {
+    const size_t bytes = strlen(place);
+    if (strncmp(name, place, bytes) == 0) return true;
+    if (length > 0 && strncmp(target, place, bytes) == 0) return true;
+  }
+  return false;
+}
+
+// ---- Numbers
+
+// A number that another handler, or this one, had before its host closed it, is its no more.
+static void claim(QlxFileHandlerVars *vars, CxFile number, CxFile *place) {
+  for (QlxFileHandlerVars *each = gOpen; each; each = each->log.next) {
+    if (each->file == number) each->file = -1;
+    if (each->log.reserve == number) each->log.reserve = -1;
+  }
+  if (vars->file == number) vars->file = -1;
+  if (vars->log.reserve == number) vars->log.reserve = -1;
+  *place = number;
+}
+
+// False when it is not among them.
+static bool unlinkFromOpen(const QlxFileHandlerVars *vars) {
+  QlxFileHandlerVars **link = &gOpen;
+  while (*link && *link != vars) link = &(*link)->log.next;
+  if (!*link) return false;
+  *link = vars->log.next;
+  return true;
+}
+
+static int duplicateFrom(int lowest, CxFile file) {
+  return fcntl(file, F_DUPFD_CLOEXEC, lowest);
+}
+
+CxStatus qlxOpenHigh(CxFile *file, const char *name, int32_t flags, uint32_t mode) {
+  CxFile low = -1;
+  *file = -1;
+  const CxStatus status =
+      cxUntilDone([&] { return CxFileOpenMode(&low, name, flags | O_NOCTTY, mode & 0777); });
+  if (qlxFailed(status)) return status;
+  *file = low >= kHighNumber ? low : duplicateFrom(kHighNumber, low);
+  if (*file == -1) *file = low >= kFirstFreeNumber ? low : duplicateFrom(kFirstFreeNumber, low);
+  const CxStatus moved = cxStatusOfCall(*file != -1);
+  if (*file != low) CxFileClose(&low);
+  return moved;
+}
+
+// ---- Opening, measuring, closing
+
+// A FIFO without a reader, or a terminal without a line, would keep the caller waiting.
+static CxStatus openName(QlxFileHandlerVars *vars, int32_t existing, CxFile *file) {
+  Found found = {};
+  const bool exists = !qlxFailed(find(AT_FDCWD, vars->fullName, 0, &found));
+  const bool isFile = !exists || (found.isRegular && !isDescriptorsName(vars->fullName));
+  if (vars->log.taken) existing = O_APPEND;
+  const int32_t flags = isFile ? O_CREAT | O_RDWR | existing : O_WRONLY | O_APPEND | O_NONBLOCK;
+  const CxStatus status = qlxOpenHigh(file, vars->fullName, flags, vars->filePermission);
+  vars->log.rolls = isFile;
+  return status;
+}
+
+static void takeSize(QlxFileHandlerVars *vars, const Found &found) {
+  vars->size = static_cast<uint64_t>(found.size);
+  if (found.size == 0) vars->log.torn = 0;
+}
+
+static CxStatus note(QlxFileHandlerVars *vars) {
+  Found found;
+  const CxStatus status = findOpen(vars->file, &found);
+  if (qlxFailed(status)) return status;
+  vars->log.device = found.device;
+  vars->log.inode = found.inode;
+  takeSize(vars, found);
+  if (found.isRegular) return kCxSuccess;
+  vars->log.rolls = 0;
+  return cxStatusOfCall(fcntl(vars->file, F_SETFL, O_APPEND | O_NONBLOCK) == 0);
+}
+
+CxStatus qlxLogFileOpen(QlxFileHandlerVars *vars, int32_t existing) {
+  qlxLogFileClose(vars);  // a formatter that logs while it makes the header has opened it, too
+  CxFile file = -1;
+  CxStatus status = openName(vars, existing, &file);
+  if (qlxFailed(status)) return status;
+  claim(vars, file, &vars->file);
+  status = note(vars);
+  if (qlxFailed(status)) {
+    CxFileClose(&vars->file);
+    return status;
+  }
+  vars->log.next = gOpen;
+  gOpen = vars;
+  vars->log.look = {};
+  vars->log.taken = 0;
+  return kCxSuccess;
+}
+
+// EBADF also for a number that leads to another file now.
+static CxStatus findOurs(const QlxFileHandlerVars *vars, CxFile file, Found *found) {
+  const CxStatus status = findOpen(file, found);
+  if (qlxFailed(status)) return status;
+  const bool isOurs = found->device == vars->log.device && found->inode == vars->log.inode;
+  return isOurs ? status : cxFailure(EBADF);
+}
+
+CxStatus qlxLogFileMeasure(QlxFileHandlerVars *vars) {
+  Found found;
+  const CxStatus status = findOurs(vars, vars->file, &found);
+  if (qlxFailed(status)) return status;
+  takeSize(vars, found);
+  return kCxSuccess;
+}
+
+CxStatus qlxLogFileClose(QlxFileHandlerVars *vars) {
+  if (!unlinkFromOpen(vars)) return kCxSuccess;  // it was not open
+  qlxLogFileSpend(vars);
+  const bool isOurs = !qlxFailed(qlxLogFileMeasure(vars));
+  if (isOurs) return CxFileClose(&vars->file);
+  vars->log.taken = 1;
+  vars->file = -1;
+  return kCxSuccess;
+}
+
+// ---- Writing
+
+static CxStatus endTornLine(QlxFileHandlerVars *vars) {
+  if (!vars->log.torn) return kCxSuccess;
+  const CxStatus status = cxFileWriteAll(&vars->file, "\n", 1, &vars->size);
+  vars->log.torn = qlxFailed(status);
+  return status;
+}
+
+// What somebody appended behind the piece stays, and so does the piece then.
+static void cutOff(QlxFileHandlerVars *vars, uint64_t piece) {
+  const off_t end = vars->log.rolls ? lseek(vars->file, 0, SEEK_CUR) : -1;
+  const off_t start = end - static_cast<off_t>(piece);
+  const bool isLast = end >= 0 && start >= 0 && !qlxFailed(qlxLogFileMeasure(vars)) &&
+                      vars->size == static_cast<uint64_t>(end);
+  const auto cut = [&] { return cxStatusOfCall(ftruncate(vars->file, start) == 0); };
+  vars->log.torn = !isLast || qlxFailed(cxUntilDone(cut));
+  if (vars->log.torn) return (void)endTornLine(vars);  // other processes do not know of the piece
+  vars->size = static_cast<uint64_t>(start);
+  lseek(vars->file, start, SEEK_SET);
+}
+
+CxStatus qlxLogFileWrite(QlxFileHandlerVars *vars, const char *bytes, uint32_t length) {
+  if (length == 0) return kCxSuccess;
+  uint64_t written = 0;
+  CxStatus status = endTornLine(vars);
+  if (!qlxFailed(status)) status = cxFileWriteAll(&vars->file, bytes, length, &written);
+  vars->size += written;
+  if (!qlxFailed(status)) return status;
+  vars->log.look = {};
+  if (written > 0) cutOff(vars, written);
+  return status;
+}
+
+// ---- The number in reserve
+
+void qlxLogFileReserve(QlxFileHandlerVars *vars) {
+  if (vars->log.reserve >= 0) return;
+  int number = duplicateFrom(kHighNumber, vars->file);
+  if (number == -1) number = duplicateFrom(kFirstFreeNumber, vars->file);
+  if (number != -1) claim(vars, number, &vars->log.reserve);
+}
+
+bool qlxLogFileSpend(QlxFileHandlerVars *vars) {
+  CxFile reserve = vars->log.reserve;
+  vars->log.reserve = -1;
+  Found found;
+  return !qlxFailed(findOurs(vars, reserve, &found)) && !qlxFailed(CxFileClose(&reserve));
+}

@@ -1,0 +1,63 @@
+// The open log file of a handler: a descriptor that the process's host may close, and put a file of
+// its own in its place. So it has a high number, and what it leads to is compared with what was
+// opened before it is measured, truncated or closed; one that is no longer ours is left alone.
+//
+// What is no regular file (a FIFO, a device, a terminal) is opened once, written without waiting,
+// and otherwise left as it is: no rollover, no truncation, no look.
+#ifndef QLX_SRC_QLXLOGFILE_H
+#define QLX_SRC_QLXLOGFILE_H
+
+#include <qlx/types.h>
+
+#include "util/CxLook.h"
+
+QLX_BEGIN_DECLS
+
+typedef struct QlxFileHandlerVars QlxFileHandlerVars;
+
+// What the variables of a handler have for it beside the descriptor.
+typedef struct QlxLogFile {
+  uint64_t device, inode;    // of what was opened
+  uint8_t rolls;             // 1: a regular file that may be renamed and truncated
+  uint8_t torn;              // 1: ends in a piece of a record
+  uint8_t taken;             // 1: the descriptor was, or it seems so: what it had written is kept
+  CxFile reserve;            // a number to give up when there are none left; -1: none
+  CxLook look;               // at the path and at the descriptor
+  QlxFileHandlerVars *next;  // all handlers with an open file, in no order
+} QlxLogFile;
+
+/**
+ * Opens a file with a number that hosts do not expect: beyond 500 where the limit allows, never one
+ * of the standard streams'. An interrupted call is tried again.
+ */
+CxStatus qlxOpenHigh(CxFile *file, const char *name, int32_t flags, uint32_t mode);
+
+/** Opens the active file, with O_APPEND or O_TRUNC as `existing`, and measures it. After a
+ * descriptor that was taken away it appends: what was written is no old file's. */
+CxStatus qlxLogFileOpen(QlxFileHandlerVars *vars, int32_t existing);
+
+/** Sets the size to that of the open file, which has other writers' bytes too. EBADF also when the
+ *  number leads to another file now. */
+CxStatus qlxLogFileMeasure(QlxFileHandlerVars *vars);
+
+/** Closes what is ours, and forgets the number in any case. */
+CxStatus qlxLogFileClose(QlxFileHandlerVars *vars);
+
+/**
+ * Writes all of it; the size counts what was written. A piece of it that was written before a
+ * failure is cut off again; where that cannot be, the next bytes start on a line of their own.
+ */
+CxStatus qlxLogFileWrite(QlxFileHandlerVars *vars, const char *bytes, uint32_t length);
+
+/** Success for a name that leads to a regular file, ENOENT for one that does not; another error
+ *  leaves it open. */
+CxStatus qlxLeadsToFile(const char *name);
+
+/** Keeps a number to give up when there are none left; qlxLogFileSpend() gives it up, and answers
+ *  whether there was one. Closing the file gives it up too. */
+void qlxLogFileReserve(QlxFileHandlerVars *vars);
+bool qlxLogFileSpend(QlxFileHandlerVars *vars);
+
+QLX_END_DECLS
+
+#endif

@@ -1,0 +1,81 @@
+// A record that is being built is whole or nothing: when a piece cannot be appended, all that was
+// appended is dropped, and what comes later is not appended any more.
+#ifndef QLX_SRC_QLXRECORDTEXT_H
+#define QLX_SRC_QLXRECORDTEXT_H
+
+#include <string_view>
+#include <type_traits>
+
+#include <qlx/buffers.h>
+
+#include "text/QlxFormatCache.h"
+#include "util/CxAsciiLine.h"
+#include "util/CxDecimal.h"
+#include "util/CxUStringBuff.h"
+
+// Appends to what it does not own: to a buffer, which runs out of memory, or to a line of bytes,
+// which ends at a piece that is not ASCII or does not fit. A buffer itself remembers a loss, so
+// that several of these, one after the other, build one record; CxUStringBuffTakeUStr() gives null
+// then.
+class RecordText {
+ public:
+  explicit RecordText(CxUStringBuff *text) : text_(text) {}  // null: nothing is appended
+  explicit RecordText(CxAsciiLine *line) : line_(line) {}    // with the default code page UTF-8
+
+  // Words of the record's own, in ASCII.
+  RecordText &operator<<(std::string_view words) {
+    return line_ ? toLine(line_->appendAscii(words)) : by(cxUStringBuffAppendAscii, words);
+  }
+  RecordText &operator<<(std::u16string_view text) {
+    if (line_) return toLine(line_->append(text.data(), text.size()));
+    return by(cxUStringBuffAppendUnits, text.data(), static_cast<uint32_t>(text.size()));
+  }
+
+  // Bytes of the default code page; null appends nothing.
+  RecordText &value(std::string_view bytes) {
+    return line_ ? toLine(line_->append(bytes)) : by(cxUStringBuffAppend, bytes);
+  }
+  RecordText &value(const char *bytes) { return bytes ? value(std::string_view{bytes}) : *this; }
+
+  RecordText &number(uint64_t number) {
+    char digits[kMaxDecimalDigits];
+    char *const end = digits + kMaxDecimalDigits;
+    const char *const first = cxDecimalBefore(end, number, '0');
+    return *this << std::string_view{first, static_cast<size_t>(end - first)};
+  }
+  // Deliberate: a negative one has its unsigned 64-bit form.
+  RecordText &number(int32_t value) { return number(static_cast<uint64_t>(int64_t{value})); }
+  RecordText &number(QlxCachedNumber format, double number);
+
+  RecordText &date(const char *pattern, double time) {
+    if (line_) return toLine(qlxAppendCachedDateAscii(line_, pattern, time));
+    return by(qlxAppendCachedDate, pattern, time);
+  }
+
+  bool isWhole() const { return line_ ? !isLost_ : text_ && text_->data; }
+
+  // The same; the event tells when memory ran out.
+  bool isWholeFor(Event *event) const;
+
+ private:
+  // Room without a block is what no buffer has otherwise.
+  static bool isLost(const CxUStringBuff *text) { return !text->data && text->capacity > 0; }
+  void lose();
+
+  RecordText &toLine(bool appended) {
+    isLost_ |= !appended;
+    return *this;
+  }
+  // Appends with a function that answers 0 when memory ran out.
+  template <typename... Args>
+  RecordText &by(uint8_t (*append)(CxUStringBuff *, Args...), std::type_identity_t<Args>... args) {
+    if (text_ && !isLost(text_) && !append(text_, args...)) lose();
+    return *this;
+  }
+
+  CxUStringBuff *text_ = nullptr;
+  CxAsciiLine *line_ = nullptr;
+  bool isLost_ = false;  // of a line
+};
+
+#endif

@@ -1,0 +1,183 @@
+// Resource bundles, cached by name and locale, and by the default locale, in which ICU looks for
+// them when it has no bundle of the locale. ICU keeps what it has loaded anyway, also when its data
+// directory is another one by now; cached is the handle.
+#include "QlxFormatCache.h"
+
+#include <algorithm>
+#include <array>
+#include <cstring>
+
+#include <unicode/uloc.h>
+#include <unicode/ures.h>
+
+#include <qlx/memory.h>
+
+#include "QlxPatternTypes.h"
+#include "util/CxOwned.h"
+#include "util/CxUnits.h"
+
+struct BundleKey {
+  const char *name;
+  const char *locale;  // null is the default locale, and not the same as ""
+  const char *defaultLocale;
+};
+
+static constexpr const char *BundleKey::*kKeyTexts[] = {&BundleKey::name, &BundleKey::locale,
+                                                        &BundleKey::defaultLocale};
+
+// What is known of a key of a bundle. A text stays where it is while its bundle is cached.
+struct BundlePattern {
+  std::array<char, 48> key;
+  std::u16string_view text;  // its data is null: nothing is known, all zero
+  MessagePlace message;
+  bool isScanned, isReadable;
+  ArgTypes types;
+};
+
+struct CachedBundle {
+  UResourceBundle *bundle;  // null: a free place, all zero
+  BundleKey key;            // with copies of the texts, owned
+  uint64_t lastUse;         // larger is later
+  std::array<BundlePattern, 64> patterns;
+};
+
+static constexpr int kMaxCachedBundles = 16;
+
+static CachedBundle gBundles[kMaxCachedBundles];
+static uint64_t gUses;
+
+static void freeTexts(BundleKey &key) {
+  for (auto text : kKeyTexts) OslMemoryFree(const_cast<char *>(key.*text));
+}
+
+static void drop(CachedBundle &cached) {
+  ures_close(cached.bundle);
+  freeTexts(cached.key);
+  cached = {};
+}
+
+void qlxDropCachedBundles(void) {
+  for (CachedBundle &cached : gBundles)
+    if (cached.bundle) drop(cached);
+}
+
+static bool isSame(const BundleKey &a, const BundleKey &b) {
+  return std::ranges::all_of(kKeyTexts, [&](auto text) { return qlxSameText(a.*text, b.*text); });
+}
+
+// A pattern of a cached bundle is in use while it is formatted, so nothing here is dropped when a
+// default turns out to be another one.
+static CachedBundle *find(const BundleKey &key) {
+  for (CachedBundle &cached : gBundles)
+    if (cached.bundle && isSame(cached.key, key)) return &cached;
+  return nullptr;
+}
+
+// Opens a bundle by its name or, when that fails, by the part after the name's last "/".
+static icu::LocalUResourceBundlePointer open(const char *name, const char *locale,
+                                             UErrorCode *status) {
+  icu::LocalUResourceBundlePointer bundle{ures_open(name, locale, status)};
+  const char *separator = std::strrchr(name, '/');
+  if (U_SUCCESS(*status) || !separator) return bundle;
+  *status = U_ZERO_ERROR;
+  return icu::LocalUResourceBundlePointer{ures_open(separator + 1, locale, status)};
+}
+
+// Takes the bundle over when there is memory to hold it, unless the default locale, in which ICU
+// may have looked for it, became another one meanwhile. One that cannot be opened is not cached: it
+// may be there the next time.
+static void store(const BundleKey &key, icu::LocalUResourceBundlePointer &bundle) {
+  if (!qlxSameText(uloc_getDefault(), key.defaultLocale)) return;
+  BundleKey copy = key;
+  bool whole = true;
+  for (auto text : kKeyTexts) {
+    copy.*text = OslStringDup(key.*text);
+    whole = whole && (copy.*text || !(key.*text));
+  }
+  if (!whole) return freeTexts(copy);
+  CachedBundle &place = *std::ranges::min_element(gBundles, {}, &CachedBundle::lastUse);
+  drop(place);
+  place.bundle = bundle.orphan();
+  place.key = copy;
+  place.lastUse = ++gUses;
+}
+
+// The place of a key's pattern; null: the key is too long for one.
+static BundlePattern *placeOf(CachedBundle *cached, const char *key) {
+  uint32_t hash = 2166136261U;  // FNV-1a
+  size_t length = 0;
+  for (; key[length] != 0; ++length) {
+    if (length + 1 == sizeof BundlePattern::key) return nullptr;
+    hash = (hash ^ static_cast<uint8_t>(key[length])) * 16777619U;
+  }
+  return &cached->patterns[hash % cached->patterns.size()];
+}
+
+// The text ends at its first zero, where it has one.
+static void lookUp(BundlePattern *pattern, const UResourceBundle *bundle, const char *key,
+                   UErrorCode *status) {
+  *status = U_ZERO_ERROR;
+  const UChar *text = ures_getStringByKey(bundle, key, nullptr, status);
+  if (U_SUCCESS(*status)) *pattern = {{}, {text, cxUnitsLength(text)}, {}, false, false, {}};
+}
+
+// Null when there is no pattern. `room` takes one that has no place.
+static BundlePattern *patternOf(CachedBundle *cached, const char *key, BundlePattern *room,
+                                UErrorCode *status) {
+  BundlePattern *const place = key ? placeOf(cached, key) : nullptr;
+  if (place && place->text.data() && std::strcmp(place->key.data(), key) == 0) return place;
+  lookUp(room, cached->bundle, key, status);
+  if (U_FAILURE(*status)) return nullptr;
+  if (!place) return room;
+  std::strcpy(room->key.data(), key);
+  *place = *room;
+  return place;
+}
+
+// Calls use(pattern) when there is one.
+template <typename Use>
+static void withPattern(const MessageName &message, UErrorCode *status, Use use) {
+  const BundleKey key{message.bundle, message.locale, qlxCheckCachedLocale()};
+  BundlePattern room{};
+  if (CachedBundle *cached = find(key)) {
+    cached->lastUse = ++gUses;
+    if (BundlePattern *pattern = patternOf(cached, message.key, &room, status)) use(*pattern);
+    return;
+  }
+  // ICU looks in the default locale when there is no bundle of the other.
+  if (!qlxIsGoodLocale(key.defaultLocale)) *status = U_ILLEGAL_ARGUMENT_ERROR;
+  if (U_FAILURE(*status)) return;
+  const char *locale = key.locale ? key.locale : key.defaultLocale;
+  icu::LocalUResourceBundlePointer fresh = open(key.name, locale, status);
+  if (U_FAILURE(*status)) return;
+  lookUp(&room, fresh.getAlias(), message.key, status);
+  if (U_SUCCESS(*status)) use(room);
+  store(key, fresh);
+}
+
+uint32_t qlxAppendBundleMessage(CxUStringBuff *text, const MessageName &message, va_list *args,
+                                UErrorCode *status) {
+  const FormatCacheLock lock;
+  uint32_t appended = 0;
+  withPattern(message, status, [&](BundlePattern &pattern) {
+    appended = qlxAppendCachedMessageAt(text, &pattern.message, message.locale, pattern.text, args,
+                                        status);
+  });
+  return appended;
+}
+
+bool qlxScanBundlePattern(const MessageName &message, ArgTypes *types) {
+  const FormatCacheLock lock;
+  UErrorCode status = U_ZERO_ERROR;
+  bool isReadable = false;
+  *types = {};
+  withPattern(message, &status, [&](BundlePattern &pattern) {
+    if (!pattern.isScanned) {
+      pattern.isReadable = qlxScanPatternTypes(pattern.text.data(), &pattern.types);
+    }
+    pattern.isScanned = true;
+    isReadable = pattern.isReadable;
+    *types = pattern.types;
+  });
+  return isReadable;
+}

@@ -1,0 +1,262 @@
+// Date formats, cached by pattern, each with the text of the last second it was asked for.
+#include "QlxFormatCache.h"
+
+#include <algorithm>
+#include <array>
+#include <cstdlib>
+#include <cstring>
+#include <optional>
+#include <utility>
+
+#include <unicode/calendar.h>
+#include <unicode/ucal.h>
+#include <unicode/uchar.h>
+#include <unicode/udat.h>
+#include <unicode/uloc.h>
+#include <unicode/ustring.h>
+
+#include <qlx/memory.h>
+#include <qlx/ustring.h>
+
+#include "util/CxOwned.h"
+#include "util/CxUnits.h"
+
+static constexpr UChar kDefaultPattern[] = u"yyyy-MM-dd HH:mm:ss.SSS";
+static constexpr int32_t kMillisDigits = 3;
+
+struct CachedDate {
+  UDateFormat *format;  // null: a free place, all zero
+  char *pattern;        // owned; null is the default pattern, which the offset from UTC follows
+  uint64_t lastUse;     // larger is later
+  bool varies;          // texts of one second differ in more than three digits: none is kept
+
+  // The text of `second` at its millisecond 0, when hasText.
+  bool hasText;
+  int64_t second;  // since 1970
+  CxUStringBuff text;
+  int32_t fraction;  // where in the text the milliseconds stand, or -1: it has none
+  std::array<char, 64> ascii;
+  uint32_t asciiLength;  // of the text's bytes when they are ASCII and fit; else 0
+};
+
+// A whole number of milliseconds, taken apart.
+struct Moment {
+  int64_t second;
+  int32_t millis;  // 0 to 999
+};
+
+static CachedDate gDates[kMaxCachedDates];
+static UCalendar *gCalendar;  // null: not opened
+static uint64_t gUses;
+
+static void drop(CachedDate &cached) {
+  udat_close(cached.format);
+  OslMemoryFree(cached.pattern);
+  CxUStringBuffDiscard(&cached.text);
+  cached = {};
+}
+
+void qlxDropCachedDates(void) {
+  for (CachedDate &cached : gDates)
+    if (cached.format) drop(cached);
+  ucal_close(std::exchange(gCalendar, nullptr));
+}
+
+static UDateFormat *openDate(const char *pattern, const char *locale, UErrorCode *status) {
+  const OwnedUStr own{CxUStringDupStrToUChar(pattern)};
+  if (pattern && !own) *status = U_MEMORY_ALLOCATION_ERROR;
+  return udat_open(UDAT_PATTERN, UDAT_PATTERN, qlxGoodLocale(locale), nullptr, -1,
+                   pattern ? own.get() : kDefaultPattern, -1, status);
+}
+
+// Finds or opens the format of a pattern; null, with the reason, when that fails.
+static CachedDate *fetch(const char *pattern, const char *locale, UErrorCode *status) {
+  for (CachedDate &cached : gDates)
+    if (cached.format && qlxSameText(cached.pattern, pattern)) return &cached;
+  icu::LocalUDateFormatPointer format{openDate(pattern, locale, status)};
+  OwnedStr copy{OslStringDup(pattern)};
+  if (pattern && !copy) *status = U_MEMORY_ALLOCATION_ERROR;
+  if (U_FAILURE(*status)) return nullptr;
+  CachedDate &place = *std::ranges::min_element(gDates, {}, &CachedDate::lastUse);
+  drop(place);
+  place.format = format.orphan();
+  place.pattern = copy.release();
+  return &place;
+}
+
+// In the zone that was checked: the default one may be another by now.
+static UCalendar *openCalendar(UErrorCode *status) {
+  const char *locale = qlxGoodLocale(uloc_getDefault());
+  UCalendar *calendar = ucal_open(nullptr, -1, locale, UCAL_TRADITIONAL, status);
+  const icu::TimeZone *zone = qlxCachedZone();
+  if (calendar && zone) reinterpret_cast<icu::Calendar *>(calendar)->setTimeZone(*zone);
+  return calendar;
+}
+
+// The cached calendar, at a time.
+static const UCalendar *calendarAt(double time, UErrorCode *status) {
+  if (!gCalendar) gCalendar = openCalendar(status);
+  ucal_setMillis(gCalendar, time, status);
+  return gCalendar;
+}
+
+static int32_t offsetOf(const UCalendar *calendar, UErrorCode *status) {
+  const int32_t zone = ucal_get(calendar, UCAL_ZONE_OFFSET, status);
+  return zone + ucal_get(calendar, UCAL_DST_OFFSET, status);
+}
+
+// The default zone's offset from UTC at a time, in milliseconds.
+static int32_t offsetAt(double time) {
+  UErrorCode status = U_ZERO_ERROR;
+  const int32_t offset = offsetOf(calendarAt(time, &status), &status);
+  return U_SUCCESS(status) ? offset : 0;
+}
+
+// Whether the zone's clock goes on by a second when UTC does, and at the same moment. A zone may
+// have parts of a second, or change within one.
+static bool isSteady(double second) {
+  constexpr double kLastMillis = 999;
+  UErrorCode status = U_ZERO_ERROR;
+  const UCalendar *calendar = calendarAt(second, &status);
+  const int32_t offset = offsetOf(calendar, &status);
+  double change = 0;
+  if (ucal_getTimeZoneTransitionDate(calendar, UCAL_TZ_TRANSITION_NEXT, &change, &status) &&
+      change <= second + kLastMillis) {
+    return false;
+  }
+  // Not every zone tells of its changes.
+  const bool lasts = offsetOf(calendarAt(second + kLastMillis, &status), &status) == offset;
+  return U_SUCCESS(status) && lasts && offset % 1000 == 0;
+}
+
+// As "%02d" writes it: a sign takes the place of a leading zero.
+static uint8_t appendTwoDigits(CxUStringBuff *text, int32_t number) {
+  const char *lead = number < 0 ? "-" : number < 10 ? "0" : "";
+  return CxUStringBuffAppendStr(text, lead) && CxUStringBuffAppendInt32(text, std::abs(number));
+}
+
+// Deliberate: the minutes keep their sign and the sign before them is that of the hours alone, so
+// that -330 minutes are "-05:-30" and -30 are "+00:-30".
+static uint8_t appendOffset(CxUStringBuff *text, int32_t offset) {
+  const int32_t hours = offset / 3'600'000;
+  const int32_t minutes = offset / 60'000 % 60;
+  return CxUStringBuffAppendStr(text, hours < 0 ? "-" : "+") &&
+         appendTwoDigits(text, std::abs(hours)) && CxUStringBuffAppendStr(text, ":") &&
+         appendTwoDigits(text, minutes);
+}
+
+// Appends the date by ICU, with the offset where it belongs. The places of the fields are optional.
+static uint8_t appendDate(CxUStringBuff *text, const CachedDate &cached, double time,
+                          UFieldPositionIterator *fields, UErrorCode *status) {
+  const UDateFormat *format = cached.format;
+  qlxAppendFormatted(text, status, [&](UChar *room, int32_t units, UErrorCode *answer) {
+    return fields ? udat_formatForFields(format, time, room, units, fields, answer)
+                  : udat_format(format, time, room, units, nullptr, answer);
+  });
+  if (*status == U_MEMORY_ALLOCATION_ERROR) return 0;
+  return cached.pattern ? 1 : appendOffset(text, offsetAt(time));
+}
+
+// Three times the zero of a script's decimal digits, behind which the other nine stand in order.
+static bool isZeros(const UChar *digits, int32_t length) {
+  return length == kMillisDigits && u_charDigitValue(digits[0]) == 0 && digits[1] == digits[0] &&
+         digits[2] == digits[0];
+}
+
+// Finds the milliseconds in the text of a whole second: three zeros in one place at most. Nothing
+// when another text of the same second may differ in more than that.
+static std::optional<int32_t> findFraction(const CxUStringBuff &text,
+                                           UFieldPositionIterator *fields) {
+  int32_t found = -1;
+  int32_t begin = 0;
+  int32_t end = 0;
+  for (int32_t field; (field = ufieldpositer_next(fields, &begin, &end)) >= 0;) {
+    if (field == UDAT_MILLISECONDS_IN_DAY_FIELD) return std::nullopt;
+    if (field != UDAT_FRACTIONAL_SECOND_FIELD) continue;
+    if (found >= 0 || !isZeros(text.data + begin, end - begin)) return std::nullopt;
+    found = begin;
+  }
+  return found;
+}
+
+// Makes the text of a second the kept one; false when none can be kept.
+static bool keep(CachedDate &cached, int64_t second) {
+  if (cached.hasText && cached.second == second) return true;
+  if (cached.varies) return false;
+  cached.hasText = false;
+  CxUStringBuffRestart(&cached.text);
+  UErrorCode status = U_ZERO_ERROR;
+  const icu::LocalUFieldPositionIteratorPointer fields{ufieldpositer_open(&status)};
+  if (U_FAILURE(status)) return false;
+  const double time = static_cast<double>(second) * 1000;
+  if (!isSteady(time)) return false;
+  if (!appendDate(&cached.text, cached, time, fields.getAlias(), &status)) return false;
+  const std::optional<int32_t> fraction = findFraction(cached.text, fields.getAlias());
+  cached.varies = U_FAILURE(status) || !fraction;
+  if (cached.varies) return false;
+  cached.fraction = *fraction;
+  cached.second = second;
+  cached.hasText = true;
+  const uint32_t units = cached.text.length;
+  const bool plain =
+      units <= cached.ascii.size() && cxNarrowAscii(cached.ascii.data(), cached.text.data, units);
+  cached.asciiLength = plain ? units : 0;
+  return true;
+}
+
+static uint8_t appendCached(CxUStringBuff *text, const CachedDate &cached, int32_t millis) {
+  if (!CxUStringBuffAppendUStr(text, cached.text.data)) return 0;
+  if (cached.fraction < 0) return 1;
+  UChar *digits = text->data + text->length - cached.text.length + cached.fraction;
+  for (int32_t at = kMillisDigits - 1; at >= 0; --at, millis /= 10)
+    digits[at] = static_cast<UChar>(digits[at] + millis % 10);
+  return 1;
+}
+
+// Nothing for a time that is not a whole number, or is not one any more with a zone's offset added.
+static std::optional<Moment> momentOf(double time) {
+  constexpr double kMaxWhole = 4503599627370496.0;  // 2 to the power 52
+  if (!(time >= -kMaxWhole && time <= kMaxWhole)) return std::nullopt;
+  const auto whole = static_cast<int64_t>(time);
+  if (static_cast<double>(whole) != time) return std::nullopt;
+  const int64_t millis = (whole % 1000 + 1000) % 1000;
+  return Moment{(whole - millis) / 1000, static_cast<int32_t>(millis)};
+}
+
+static uint8_t appendBy(CachedDate &cached, CxUStringBuff *text, double time) {
+  const std::optional<Moment> moment = momentOf(time);
+  if (moment && keep(cached, moment->second)) return appendCached(text, cached, moment->millis);
+  UErrorCode status = U_ZERO_ERROR;
+  return appendDate(text, cached, time, nullptr, &status);
+}
+
+// The place of a pattern under the defaults of this moment; null, with the reason, when there is
+// none.
+static CachedDate *fetchCurrent(const char *pattern, UErrorCode *status) {
+  const char *locale = qlxCheckCachedLocale();
+  qlxCheckCachedZone();
+  if (pattern) qlxCheckCachedCodePage();
+  CachedDate *cached = fetch(pattern, locale, status);
+  if (cached) cached->lastUse = ++gUses;
+  return cached;
+}
+
+uint8_t qlxAppendCachedDate(CxUStringBuff *text, const char *pattern, double time) {
+  const FormatCacheLock lock;
+  UErrorCode status = U_ZERO_ERROR;
+  CachedDate *cached = fetchCurrent(pattern, &status);
+  return cached ? appendBy(*cached, text, time) : status != U_MEMORY_ALLOCATION_ERROR;
+}
+
+bool qlxAppendCachedDateAscii(CxAsciiLine *line, const char *pattern, double time) {
+  const FormatCacheLock lock;
+  UErrorCode status = U_ZERO_ERROR;
+  CachedDate *cached = fetchCurrent(pattern, &status);
+  const std::optional<Moment> moment = cached ? momentOf(time) : std::nullopt;
+  if (!moment || !keep(*cached, moment->second) || cached->asciiLength == 0) return false;
+  std::array<char, 64> text = cached->ascii;
+  int32_t millis = moment->millis;
+  for (int32_t at = kMillisDigits - 1; cached->fraction >= 0 && at >= 0; --at, millis /= 10)
+    text[static_cast<size_t>(cached->fraction + at)] = static_cast<char>('0' + millis % 10);
+  return line->append({text.data(), cached->asciiLength});
+}

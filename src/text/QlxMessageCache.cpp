@@ -1,0 +1,299 @@
+// Parsed message patterns, cached by pattern and locale.
+#include "QlxFormatCache.h"
+
+#include <algorithm>
+#include <array>
+#include <cstring>
+#include <initializer_list>
+#include <string_view>
+#include <utility>
+
+#include <unicode/uchar.h>
+#include <unicode/umsg.h>
+#include <unicode/ustring.h>
+
+#include <qlx/memory.h>
+#include <qlx/ustring.h>
+
+#include "QlxComposed.h"
+#include "QlxPatternNesting.h"
+#include "util/CxOwned.h"
+#include "util/CxUnits.h"
+
+struct PatternKey {
+  const char *locale;  // null is the default locale, and not the same as ""
+  std::u16string_view pattern;
+  uint32_t tag;  // of the pattern
+};
+
+enum class Composing : uint8_t { kUntried, kLeftToIcu, kDone };
+
+struct CachedMessage {
+  UMessageFormat *format;  // null: a free place, all zero
+  Composing composing;     // untried until the message is found again
+  QlxComposed composed;
+  PatternKey key;  // with copies of the two texts, owned
+  bool usesZone;
+  uint64_t serial;   // another one for whatever is cached
+  uint64_t lastUse;  // larger is later
+};
+
+static CachedMessage gMessages[kMaxCachedMessages];
+static std::array<MessagePlace, kMaxCachedMessages> gLatest;  // by tag: the callers' patterns
+static uint64_t gUses;
+
+// Missing arguments read as zeros up to this many.
+static constexpr int32_t kMaxZeroArgs = 64;
+
+static void drop(CachedMessage &cached) {
+  umsg_close(cached.format);
+  OslMemoryFree(const_cast<char *>(cached.key.locale));
+  OslMemoryFree(const_cast<UChar *>(cached.key.pattern.data()));
+  cached = {};
+}
+
+void qlxDropCachedMessages(void) {
+  for (CachedMessage &cached : gMessages)
+    if (cached.format) drop(cached);
+}
+
+// Tells most patterns apart without reading all of them: from the length and the units at both ends
+// and in the middle.
+static uint32_t tagOf(std::u16string_view pattern) {
+  constexpr uint64_t kSpread = 0x9E3779B97F4A7C15;
+  constexpr size_t kUnits = sizeof(uint64_t) / sizeof(UChar);
+  uint64_t tag = pattern.size() * kSpread;
+  const auto add = [&](uint64_t units) { tag = (tag ^ units) * kSpread; };
+  if (pattern.size() < kUnits) {
+    for (const char16_t unit : pattern) add(unit);
+  } else {
+    const size_t last = pattern.size() - kUnits;
+    for (const size_t at : {size_t{0}, last / 2, last}) {
+      uint64_t units;
+      std::memcpy(&units, pattern.data() + at, sizeof units);
+      add(units);
+    }
+  }
+  return static_cast<uint32_t>(tag >> 32);
+}
+
+static bool samePattern(std::u16string_view a, std::u16string_view b) {
+  return a.size() == b.size() && std::memcmp(a.data(), b.data(), a.size() * sizeof(UChar)) == 0;
+}
+
+static bool isAt(const CachedMessage &cached, const PatternKey &key) {
+  return cached.format && cached.key.tag == key.tag &&
+         samePattern(cached.key.pattern, key.pattern) && qlxSameText(cached.key.locale, key.locale);
+}
+
+static CachedMessage *find(const PatternKey &key) {
+  for (CachedMessage &cached : gMessages)
+    if (isAt(cached, key)) return &cached;
+  return nullptr;
+}
+
+// Whether the defaults of this moment would give the same format.
+static bool isCurrent(const CachedMessage &cached) {
+  if (!cached.usesZone) return true;
+  qlxCheckCachedZone();
+  return cached.format;
+}
+
+// Behind the white space that ICU leaves out at a place.
+static size_t skipSpace(std::u16string_view pattern, size_t at) {
+  while (at < pattern.size() && u_hasBinaryProperty(pattern[at], UCHAR_PATTERN_WHITE_SPACE)) ++at;
+  return at;
+}
+
+// Whether an argument may have one of the types, which are words in any mix of case behind a comma.
+static bool mayHaveType(std::u16string_view pattern,
+                        std::initializer_list<std::u16string_view> types) {
+  const auto isAt = [&](size_t at, std::u16string_view type) {
+    return type.size() <= pattern.size() - at &&
+           u_strncasecmp(pattern.data() + at, type.data(), static_cast<int32_t>(type.size()),
+                         U_FOLD_CASE_DEFAULT) == 0;
+  };
+  for (size_t at = 0; (at = pattern.find(u',', at)) != pattern.npos;) {
+    at = skipSpace(pattern, at + 1);
+    if (std::ranges::any_of(types, [&](auto type) { return isAt(at, type); })) return true;
+  }
+  return false;
+}
+
+// Where no argument is a date or time, the zone, which is costly to ask for, need not be looked at.
+static bool mayUseZone(std::u16string_view pattern) {
+  return mayHaveType(pattern, {u"date", u"time"});
+}
+
+// Worded numbers take the forms of their words from them too, and so do long names of currencies
+// and what skeletons of numbers know: short notations and units.
+static bool mayUsePluralRules(std::u16string_view pattern) {
+  return mayHaveType(pattern,
+                     {u"plural", u"selectordinal", u"ordinal", u"spellout", u"duration", u"::"}) ||
+         pattern.find(u"\u00a4\u00a4\u00a4") != pattern.npos;
+}
+
+// Whether ICU can be given the pattern. What has a type takes data of its locale, and where there
+// are none those of the default one.
+static bool isSafe(std::u16string_view pattern, const char *locale, const char *defaultLocale,
+                   bool usesZone) {
+  const bool hasTypes = pattern.find(u',') != pattern.npos;
+  const bool usesRules = usesZone || mayUsePluralRules(pattern);
+  return (!hasTypes || qlxIsGoodLocale(defaultLocale)) && (!usesRules || qlxIsGoodLocale(locale)) &&
+         !qlxNestsTooDeep(pattern);
+}
+
+// The default locale is the one that was checked: ICU, asked for no locale, would take the one of a
+// moment later.
+static icu::LocalUMessageFormatPointer open(const PatternKey &key, bool usesZone,
+                                            UErrorCode *status) {
+  const char *defaultLocale = qlxCheckCachedLocale();
+  const char *locale = key.locale ? key.locale : defaultLocale;
+  if (usesZone) qlxCheckCachedZone();
+  if (!isSafe(key.pattern, locale, defaultLocale, usesZone)) *status = U_ILLEGAL_ARGUMENT_ERROR;
+  return icu::LocalUMessageFormatPointer{umsg_open(
+      key.pattern.data(), static_cast<int32_t>(key.pattern.size()), locale, nullptr, status)};
+}
+
+// Takes the format over when there is memory to hold it.
+static void store(const PatternKey &key, bool usesZone, icu::LocalUMessageFormatPointer &format) {
+  OwnedStr locale{OslStringDup(key.locale)};
+  OwnedUStr pattern{CxUStringDup(key.pattern.data())};
+  if (!pattern || (key.locale && !locale)) return;
+  CachedMessage &place = *std::ranges::min_element(gMessages, {}, &CachedMessage::lastUse);
+  drop(place);
+  place.format = format.orphan();
+  place.key = {locale.release(), {pattern.release(), key.pattern.size()}, tagOf(key.pattern)};
+  place.usesZone = usesZone;
+  place.serial = place.lastUse = ++gUses;
+}
+
+// The highest number that an argument of the pattern may have, or -1. What only looks like an
+// argument, in quotes, counts as well.
+static int32_t highestArgument(std::u16string_view pattern) {
+  int32_t highest = -1;
+  for (size_t at = 0; (at = pattern.find(u'{', at)) != pattern.npos;) {
+    at = skipSpace(pattern, at + 1);
+    int32_t number = -1;
+    for (; at < pattern.size() && pattern[at] >= u'0' && pattern[at] <= u'9'; ++at)
+      number = std::min(std::max(number, 0) * 10 + (pattern[at] - u'0'), kMaxZeroArgs);
+    highest = std::max(highest, number);
+  }
+  return highest;
+}
+
+static int32_t formatList(const UMessageFormat *format, UChar *room, int32_t units,
+                          UErrorCode *status, ...) {
+  va_list args;
+  va_start(args, status);
+  const int32_t needed = umsg_vformat(format, room, units, args, status);
+  va_end(args);
+  return needed;
+}
+
+// Numbers and pointers travel in registers of two kinds and then on the stack: with this many zeros
+// of both kinds whatever is read is a zero.
+template <size_t... index>
+static int32_t formatZeros(const UMessageFormat *format, UChar *room, int32_t units,
+                           UErrorCode *status, std::index_sequence<index...>) {
+  return formatList(format, room, units, status, 0.0, 0.0, 0.0, 0.0, 0.0, 0.0, 0.0, 0.0,
+                    (static_cast<void>(index), int64_t{0})...);
+}
+
+static int32_t formatWithoutArgs(const UMessageFormat *format, std::u16string_view pattern,
+                                 UChar *room, int32_t units, UErrorCode *status) {
+  if (highestArgument(pattern) >= kMaxZeroArgs) {
+    *status = U_ILLEGAL_ARGUMENT_ERROR;
+    return -1;
+  }
+  return formatZeros(format, room, units, status, std::make_index_sequence<kMaxZeroArgs + 8>{});
+}
+
+static uint32_t append(CxUStringBuff *text, const UMessageFormat *format,
+                       std::u16string_view pattern, va_list *args, UErrorCode *status) {
+  return qlxAppendFormatted(text, status, [&](UChar *room, int32_t units, UErrorCode *answer) {
+    if (!args) return formatWithoutArgs(format, pattern, room, units, answer);
+    va_list copy;
+    va_copy(copy, *args);
+    const int32_t needed = umsg_vformat(format, room, units, copy, answer);
+    va_end(copy);
+    return needed;
+  });
+}
+
+// A pattern without syntax is its own text, in every locale.
+static uint32_t appendPlain(CxUStringBuff *text, std::u16string_view pattern, UErrorCode *status) {
+  const auto units = static_cast<uint32_t>(pattern.size());
+  *status = U_MEMORY_ALLOCATION_ERROR;
+  if (!cxUStringBuffHasCapacity(text, units)) return 0;
+  *status = U_ZERO_ERROR;
+  pattern.copy(text->data + text->length, units);
+  text->length += units;
+  text->data[text->length] = 0;
+  return units;
+}
+
+static bool isComposed(CachedMessage &cached) {
+  if (cached.composing == Composing::kUntried) {
+    const bool done = qlxCompose(&cached.composed, cached.key.pattern, cached.format);
+    cached.composing = done ? Composing::kDone : Composing::kLeftToIcu;
+  }
+  return cached.composing == Composing::kDone;
+}
+
+static uint32_t appendCached(CxUStringBuff *text, CachedMessage &cached, va_list *args,
+                             UErrorCode *status) {
+  cached.lastUse = ++gUses;
+  const uint32_t before = text->length;
+  *status = U_ZERO_ERROR;
+  if (args && isComposed(cached) && qlxAppendComposed(text, &cached.composed, args)) {
+    return text->length - before;
+  }
+  return append(text, cached.format, cached.key.pattern, args, status);
+}
+
+// The pattern is not a plain one.
+static uint32_t appendParsed(CxUStringBuff *text, MessagePlace *known, PatternKey key,
+                             va_list *args, UErrorCode *status) {
+  CachedMessage *cached = known->cached;
+  if (!cached || cached->serial != known->serial) {
+    key.tag = tagOf(key.pattern);
+    cached = find(key);
+  }
+  if (cached && isCurrent(*cached)) {
+    *known = {cached, cached->serial};
+    return appendCached(text, *cached, args, status);
+  }
+  const bool usesZone = mayUseZone(key.pattern);
+  *status = U_ZERO_ERROR;
+  icu::LocalUMessageFormatPointer fresh = open(key, usesZone, status);
+  if (U_FAILURE(*status)) return 0;
+  const UMessageFormat *format = fresh.getAlias();
+  store(key, usesZone, fresh);
+  return append(text, format, key.pattern, args, status);
+}
+
+// A message that is known has no plain pattern.
+static bool isPlain(const MessagePlace &known, std::u16string_view pattern) {
+  return !known.cached && qlxIsPlainPattern(pattern.data(), pattern.size());
+}
+
+uint32_t qlxAppendCachedMessageAt(CxUStringBuff *text, MessagePlace *known, const char *locale,
+                                  std::u16string_view pattern, va_list *args, UErrorCode *status) {
+  if (isPlain(*known, pattern)) return appendPlain(text, pattern, status);
+  return appendParsed(text, known, {locale, pattern, 0}, args, status);
+}
+
+uint32_t qlxAppendCachedMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
+                                va_list *args, UErrorCode *status) {
+  const FormatCacheLock lock;
+  const std::u16string_view whole{pattern, cxUnitsLength(pattern)};
+  const PatternKey key{locale, whole, tagOf(whole)};
+  MessagePlace &latest = gLatest[key.tag % gLatest.size()];
+  MessagePlace known = latest.cached && isAt(*latest.cached, key) ? latest : MessagePlace{};
+  if (isPlain(known, whole)) return appendPlain(text, whole, status);
+  qlxCheckCachedLocale();
+  const uint32_t appended = appendParsed(text, &known, key, args, status);
+  latest = known;
+  return appended;
+}

@@ -1,0 +1,139 @@
+// docs/configuration.md against the key tables of the sources: each section has the rows of one
+// table.
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <map>
+#include <regex>
+#include <set>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include <qlx/proplist.h>
+
+#include "support/TempDir.h"
+
+namespace {
+
+using Keys = std::map<std::string, std::set<std::string>>;  // of a section, or of a table
+
+// Which section tells of which table.
+const std::map<std::string, std::string> kSectionOfTable = {
+    {"kCommonKeys", "Every class"},
+    {"kLoggerKeys", "qlx_basiclogger"},
+    {"kLevelFilterKeys", "qlx_levelfilter"},
+    {"kHandlerKeys", "Every handler"},
+    {"kFileHandlerKeys", "qlx_filehandler"},
+    {"kFormatterKeys", "qlx_basicformatter"},
+    {"kMsgIdFilterKeys", "qlx_msgidfilter"},
+    {"kXmlFormatterKeys", "qlx_xmlformatter"},
+    {"kStamps", "qlx_pdlogger"},
+};
+
+std::filesystem::path projectFile(const char *name) {
+  return std::filesystem::path(QLX_HEADERS).parent_path().parent_path() / name;
+}
+
+std::string contents(const std::filesystem::path &path) {
+  std::ifstream in(path);
+  EXPECT_TRUE(in.is_open()) << path;
+  return {std::istreambuf_iterator<char>(in), {}};
+}
+
+std::set<std::string> firstGroups(const std::string &text, const char *pattern) {
+  const std::regex row(pattern);
+  std::set<std::string> found;
+  for (std::sregex_iterator it(text.begin(), text.end(), row), end; it != end; ++it) {
+    found.insert((*it)[1]);
+  }
+  return found;
+}
+
+Keys keysOfTables() {
+  static const std::regex table(R"((?:ConfigKey|Stamp) (k\w+)\[\] = \{([^;]*)\};)");
+  Keys keys;
+  for (const auto &entry : std::filesystem::recursive_directory_iterator(projectFile("src"))) {
+    if (entry.path().extension() != ".cpp") continue;
+    const std::string source = contents(entry.path());
+    for (std::sregex_iterator it(source.begin(), source.end(), table), end; it != end; ++it) {
+      keys[(*it)[1]] = firstGroups((*it)[2], R"re(\{"(\w+)",)re");
+    }
+  }
+  return keys;
+}
+
+// The first cells in code type below each heading that are keys: "logging", but not "FATAL".
+Keys keysOfSections() {
+  const std::string page = contents(projectFile("docs/configuration.md"));
+  Keys keys;
+  for (size_t at = page.find("\n## "); at != std::string::npos;) {
+    const size_t next = page.find("\n## ", at + 1);
+    const size_t headingEnd = page.find('\n', at + 1);
+    const std::string heading = page.substr(at + 4, headingEnd - at - 4);
+    const std::string section = page.substr(headingEnd, next - headingEnd);
+    keys[heading] = firstGroups(section, R"(\n\| `(\w+)` \|)");
+    at = next;
+  }
+  return keys;
+}
+
+TEST(ConfigurationPage, HasTheKeysOfEveryTable) {
+  const Keys tables = keysOfTables();
+  Keys sections = keysOfSections();
+  EXPECT_GE(tables.size(), kSectionOfTable.size());
+  for (const auto &[table, keys] : tables) {
+    EXPECT_FALSE(keys.empty()) << table;
+    ASSERT_TRUE(kSectionOfTable.contains(table)) << table << " has no section";
+    EXPECT_EQ(sections[kSectionOfTable.at(table)], keys) << table;
+  }
+}
+
+TEST(ConfigurationPage, HasNoKeysBesideThem) {
+  std::set<std::string> told;
+  for (const auto &[table, section] : kSectionOfTable) told.insert(section);
+  for (const auto &[section, keys] : keysOfSections()) {
+    if (told.contains(section)) continue;
+    EXPECT_EQ(keys, std::set<std::string>{}) << section;
+  }
+}
+
+// A table's cells in code type; "" for other ones.
+std::vector<std::string> cellsOf(const std::string &row) {
+  static const std::regex cell(R"(\| (?:`([^`]*)`|[^|]*?) ?(?=\|))");
+  std::vector<std::string> cells;
+  for (std::sregex_iterator it(row.begin(), row.end(), cell), end; it != end; ++it) {
+    cells.push_back((*it)[1]);
+  }
+  return cells;
+}
+
+// The pair that a line gives, as a row of the page has it.
+std::vector<std::string> readLine(const std::string &line) {
+  const TempDir dir;
+  CxPropList list{};
+  const bool good = CxPropListRead(dir.write("file", line).c_str(), &list, nullptr) == 1;
+  std::vector<std::string> cells = {line, "", ""};
+  if (good) cells = {line, list.entries[0].key, list.entries[0].value};
+  CxPropListDiscard(&list);
+  return cells;
+}
+
+TEST(ConfigurationPage, ShowsWhatLinesOfAFileGive) {
+  const std::string page = contents(projectFile("docs/configuration.md"));
+  std::istringstream table(page.substr(page.find("| Line | Left side | Value |\n|---")));
+  int rows = 0;
+  std::string row;
+  std::getline(table, row), std::getline(table, row);
+  while (std::getline(table, row) && !row.empty()) {
+    const std::vector<std::string> cells = cellsOf(row);
+    ASSERT_EQ(cells.size(), 3u) << row;
+    EXPECT_EQ(readLine(cells[0]), cells);
+    ++rows;
+  }
+  EXPECT_GT(rows, 15);
+}
+
+}  // namespace

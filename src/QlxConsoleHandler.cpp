@@ -10,6 +10,7 @@
 #include <qlx/ustring.h>
 
 #include "object/QlxClasses.h"
+#include "object/QlxObjClass.h"
 #include "QlxObject.h"
 
 // The variables: 1 after the header was written, 0 at first and after the trailer.
@@ -70,4 +71,5 @@ const ObjClass qlxConsoleHandlerClass = {
     .fAllocVars = QlxConsoleHandlerFAllocVars,
     .fFreeVars = QlxConsoleHandlerFFreeVars,
     .fCfgChange = QlxBasicHandlerFCfgChange,
+    .own = &kTakesNotes,
 };

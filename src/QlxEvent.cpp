@@ -1,14 +1,11 @@
 // Events: the record of one log request, and the typed family over its properties.
-#include <qlx/event.h>
+#include "QlxEvent.h"
 
 #include <qlx/class/containers.h>
-#include <qlx/class/event.h>
-#include <qlx/class/message.h>
+#include <qlx/event.h>
 #include <qlx/memory.h>
 #include <qlx/props.h>
 #include <qlx/system.h>
-
-#include "QlxI18Msg.h"
 
 static void replaceString(char **target, const char *value) {
   char *copy = OslStringDup(value);  // first: the value may be the stored one

@@ -13,6 +13,7 @@
 #include <qlx/toolkit.h>
 
 #include "object/QlxClasses.h"
+#include "object/QlxObjClass.h"
 #include "object/QlxConfigKeys.h"
 #include "file/QlxFileNames.h"
 #include "QlxObject.h"
@@ -196,8 +197,8 @@ static CxStatus writeAnew(QlxObject *handler, QlxFileHandlerVars *vars,
 static void formatAndWrite(QlxObject *handler, QlxFileHandlerVars *vars, Event *event,
                            va_list *args) {
   const bool isOpen = vars->opened == 1;  // unless a host's formatter closes it
-  const FormattedBytes text{handler, event, args};
-  if (!text || !isOpen) return;
+  FormattedBytes text;
+  if (!text.format(handler, event, args) || !isOpen) return;
   CxStatus status = qlxFileHandlerWriteText(vars, text);
   if (status.code == EBADF) status = writeAnew(handler, vars, text);
   qlxKeepLost(event, status);
@@ -313,4 +314,5 @@ const ObjClass qlxFileHandlerClass = {
     .fAllocVars = QlxFileHandlerFAllocVars,
     .fFreeVars = QlxFileHandlerFFreeVars,
     .fCfgChange = QlxFileHandlerFCfgChange,
+    .own = &kTakesNotes,
 };

@@ -7,7 +7,6 @@
 
 #include "object/QlxConfigKeys.h"
 #include "object/QlxLocked.h"
-#include "record/QlxLoggedEvent.h"
 #include "QlxObject.h"
 #include "object/QlxOperation.h"
 
@@ -31,14 +30,12 @@ static const ObjClass *formatterClass(const QlxObject *handler) {
 char *qlxIntlHandlerGetFmtHeader(QlxObject *handler) {
   const ObjClass *formatter = formatterClass(handler);
   if (!formatter || !formatter->op2.fGetHeader) return nullptr;
-  qlxSettleNotedEvent();
   return qlxCall({formatter, "fGetHeader"}, formatter->op2.fGetHeader, handler->kind2.formatter);
 }
 
 char *qlxIntlHandlerGetFmtTrailer(QlxObject *handler) {
   const ObjClass *formatter = formatterClass(handler);
   if (!formatter || !formatter->op3.fGetTrailer) return nullptr;
-  qlxSettleNotedEvent();
   return qlxCall({formatter, "fGetTrailer"}, formatter->op3.fGetTrailer, handler->kind2.formatter);
 }
 

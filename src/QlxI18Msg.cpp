@@ -12,7 +12,8 @@
 #include <qlx/message.h>
 #include <qlx/ustring.h>
 
-#include "text/QlxFormatCache.h"
+#include "text/QlxBundleCache.h"
+#include "text/QlxMessageCache.h"
 #include "object/QlxLocked.h"
 #include "util/CxOwned.h"
 

@@ -8,8 +8,8 @@
 #include <qlx/memory.h>
 
 #include "object/QlxClasses.h"
+#include "object/QlxObjClass.h"
 #include "object/QlxConfigKeys.h"
-#include "record/QlxLoggedEvent.h"
 #include "QlxObject.h"
 #include "object/QlxOperation.h"
 #include "QlxProps.h"
@@ -18,9 +18,6 @@ void QlxBasicFilterFProcess(QlxObject *filter, Event *event, va_list *args) {
   if (!isKind(filter, Filter) || !loadEnabled(filter)) return;
   const ObjClass *objClass = filter->objClass;
   if (!objClass->op2.fIsLoggable || !objClass->op3.fLog) return;
-  const bool isHosts = objClass->op2.fIsLoggable != QlxLevelFilterFIsLoggable ||
-                       objClass->op3.fLog != QlxBasicObjectFLog;
-  if (isHosts) qlxSettleEvent(event);
   if (qlxCall({objClass, "fIsLoggable"}, objClass->op2.fIsLoggable, filter, event, args) == 1)
     qlxCall({objClass, "fLog"}, objClass->op3.fLog, filter, event, args);
 }
@@ -54,4 +51,5 @@ const ObjClass qlxLevelFilterClass = {
     .op2 = {.fIsLoggable = QlxLevelFilterFIsLoggable},
     .op3 = {.fLog = QlxBasicObjectFLog},
     .fCfgChange = QlxLevelFilterFCfgChange,
+    .own = &kTakesNotes,
 };

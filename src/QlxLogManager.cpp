@@ -1,9 +1,8 @@
 // The log manager: the one registry of configurations. It links each to its parent by the dots of
-// the names, makes unknown ones on first reference, and applies them to objects.
+// the names and makes unknown ones on first reference.
 #include "QlxLogManager.h"
 
 #include <qlx/class/containers.h>
-#include <qlx/class/object.h>
 #include <qlx/config.h>
 #include <qlx/memory.h>
 
@@ -18,13 +17,23 @@ static struct {
   bool initialised;
 } gLogMgr;
 
+static void childStrays(const char *parentName);
+
 static void freeRegistries() {
   qlxIntlFreeStringGroup(gLogMgr.configNames);
   qlxIntlFreeStringToObjCfgMap(gLogMgr.configs);
   gLogMgr = {};
 }
 
+// What configurations ask the registry that they are in.
+static constexpr ConfigRegistry kRegistry = {
+    .has = qlxIntlLogMgrHasCfg,
+    .get = qlxIntlLogMgrGetCfg,
+    .childStrays = childStrays,
+};
+
 void qlxInitLogMgr(void) {
+  qlxSetConfigRegistry(&kRegistry);
   if (gLogMgr.initialised) return;
   gLogMgr.configNames = qlxIntlAllocStringGroup();
   gLogMgr.configs = qlxIntlAllocStringToObjCfgMap();
@@ -111,7 +120,7 @@ static bool areChildrenLinked(ObjCfg *parent) {
   return true;
 }
 
-void qlxLogMgrChildStrays(const char *parentName) {
+static void childStrays(const char *parentName) {
   const StringToObjCfgMapNode *parent =
       qlxIntlStringToObjCfgMapGetNode(gLogMgr.configs, parentName);
   if (parent) parent->value->childrenLinked = 0;
@@ -197,7 +206,7 @@ uint8_t qlxLogMgrAddCfgFromFile(const char *configName, const char *propertyName
   return qlxIntlSetObjCfgProp(cfg.get(), propertyName, value);
 }
 
-// ---- Applying
+// ---- What is inherited
 
 namespace {
 
@@ -247,13 +256,12 @@ class Lineage {
 
 }  // namespace
 
-uint8_t qlxIntlLogMgrApplyCfg(QlxObject *object, const char *name) {
-  if (!object || !object->objClass) return 0;
+// Ancestors first, so that the value set nearest to the configuration itself is the last.
+bool qlxVisitInherited(const char *name, QlxObject *object, QlxVisitProperty visit) {
   const Lineage lineage{qlxIntlLogMgrGetCfg(name)};
-  // Ancestors first, so that the value set nearest to the object's own configuration is the last.
   for (uint32_t i = lineage.count(); i-- > 0;) {
     for (StringToStringMapNode *it = qlxIntlObjCfgProperties(lineage[i]); it; it = it->next) {
-      qlxIntlSetObjProp(object, it->key, it->value);
+      visit(object, it->key, it->value);
     }
   }
   return lineage.count() > 0;
@@ -275,10 +283,6 @@ ObjCfg *QlxLogMgrGetCfg(const char *name) {
 }
 uint8_t QlxLogMgrHasCfg(const char *name) {
   return qlxLocked<qlxIntlLogMgrHasCfg>(name);
-}
-
-uint8_t QlxLogMgrApplyCfg(QlxObject *object, const char *name) {
-  return qlxLocked<qlxIntlLogMgrApplyCfg>(object, name);
 }
 
 StringGroupNode *QlxLogMgrConfigNames(void) {

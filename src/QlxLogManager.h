@@ -21,9 +21,6 @@ void qlxCloseLogMgr(void);
  */
 char *qlxLogMgrGetParentConfigName(ObjCfg *cfg);
 
-/** Told when a configuration that stored this parent name got another one. */
-void qlxLogMgrChildStrays(const char *parentName);
-
 /**
  * Sets a property of a configuration, which is made when it is new and then marked as read from the
  * file. The value may be empty, the two names may not.
@@ -32,6 +29,15 @@ void qlxLogMgrChildStrays(const char *parentName);
  */
 uint8_t qlxLogMgrAddCfgFromFile(const char *configName, const char *propertyName,
                                 const char *value);
+
+/**
+ * Visits the properties of a configuration and of those that it inherits from, farthest first, with
+ * the object that is to have them; a configuration of a new name is made.
+ *
+ * @return false when there is none of that name
+ */
+typedef uint8_t (*QlxVisitProperty)(QlxObject *object, const char *key, const char *value);
+bool qlxVisitInherited(const char *name, QlxObject *object, QlxVisitProperty visit);
 
 QLX_END_DECLS
 

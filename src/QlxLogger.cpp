@@ -12,6 +12,7 @@
 #include <qlx/memory.h>
 
 #include "object/QlxClasses.h"
+#include "object/QlxObjClass.h"
 #include "object/QlxConfigKeys.h"
 #include "object/QlxLocked.h"
 #include "record/QlxLoggedEvent.h"
@@ -49,7 +50,6 @@ static void report(QlxLogResult *result, const QlxLogResult &what) {
 
 static void passToLogger(QlxLogResult *result, QlxObject *logger, fLog log, Event *event,
                          va_list *args) {
-  if (log != QlxBasicObjectFLog) qlxSettleEvent(event);
   qlxCall({logger->objClass, "fLog"}, log, logger, event, args);
   const int32_t bindError = event->message ? event->message->error : 0;
   report(result, {event->status.kind, event->status.code, bindError});
@@ -107,6 +107,7 @@ const ObjClass qlxBasicLoggerClass = {
     .description = nullptr,
     .op1 = {.fLog = QlxBasicObjectFLog},
     .fCfgChange = QlxBasicLoggerFCfgChange,
+    .own = &kTakesNotes,
 };
 
 // Public functions. The threshold test runs before the lock, so a suppressed call costs no lock.

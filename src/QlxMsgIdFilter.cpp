@@ -13,6 +13,7 @@
 #include <qlx/props.h>
 
 #include "object/QlxClasses.h"
+#include "object/QlxObjClass.h"
 #include "object/QlxConfigKeys.h"
 #include "QlxObject.h"
 #include "QlxProps.h"
@@ -160,4 +161,5 @@ const ObjClass qlxMsgIdFilterClass = {
     .fAllocVars = QlxMsgIdFilterFAllocVars,
     .fFreeVars = QlxMsgIdFilterFFreeVars,
     .fCfgChange = QlxMsgIdFilterFCfgChange,
+    .own = &kTakesNotes,
 };

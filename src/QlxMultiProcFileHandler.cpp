@@ -16,6 +16,7 @@
 #include <qlx/memory.h>
 
 #include "object/QlxClasses.h"
+#include "object/QlxObjClass.h"
 #include "file/QlxFileNames.h"
 #include "QlxObject.h"
 #include "file/QlxRolling.h"
@@ -221,8 +222,8 @@ static void writeText(QlxFileHandlerVars *vars, Event *event, const FormattedByt
 // The text is gone before the listeners get the event.
 static void formatAndWrite(QlxObject *handler, QlxFileHandlerVars *vars, Event *event,
                            va_list *args) {
-  const FormattedBytes text{handler, event, args};
-  if (text) writeText(vars, event, text);
+  FormattedBytes text;
+  if (text.format(handler, event, args)) writeText(vars, event, text);
 }
 
 void QlxMultiProcFileUHandlerFProcess(QlxObject *handler, Event *event, va_list *args) {
@@ -244,4 +245,5 @@ const ObjClass qlxMultiProcFileHandlerClass = {
     .fAllocVars = QlxFileHandlerFAllocVars,
     .fFreeVars = QlxFileHandlerFFreeVars,
     .fCfgChange = QlxFileHandlerFCfgChange,
+    .own = &kTakesNotes,
 };

@@ -9,8 +9,13 @@
 #include <qlx/props.h>
 
 #include "object/QlxLocked.h"
-#include "QlxLogManager.h"
 #include "QlxProps.h"
+
+static const ConfigRegistry *gRegistry;  // null before the log manager was there
+
+void qlxSetConfigRegistry(const ConfigRegistry *registry) {
+  gRegistry = registry;
+}
 
 static void destroyObjCfg(ObjCfg *cfg) {
   OslMemoryFree(cfg->name);
@@ -58,8 +63,9 @@ static bool isParentNamed(const ObjCfg *cfg, const char *name) {
 
 // One that names itself as its parent makes no namesake.
 ObjCfg *qlxIntlObjCfgGetParent(ObjCfg *cfg) {
-  if (!cfg || (isParentNamed(cfg, cfg->name) && !qlxIntlLogMgrHasCfg(cfg->name))) return nullptr;
-  return qlxIntlLogMgrGetCfg(cfg->parentName);
+  if (!cfg || !gRegistry) return nullptr;
+  if (isParentNamed(cfg, cfg->name) && !gRegistry->has(cfg->name)) return nullptr;
+  return gRegistry->get(cfg->parentName);
 }
 
 void qlxSetParentName(ObjCfg *cfg, const char *parentName) {
@@ -68,7 +74,7 @@ void qlxSetParentName(ObjCfg *cfg, const char *parentName) {
   if (!copy) return;
   const OwnedStr old{cfg->parentName};
   cfg->parentName = copy;
-  qlxLogMgrChildStrays(old.get());
+  if (gRegistry) gRegistry->childStrays(old.get());
 }
 
 void qlxIntlObjCfgSetParent(ObjCfg *cfg, ObjCfg *parent) {

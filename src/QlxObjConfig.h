@@ -20,6 +20,17 @@ struct ObjCfg {
 
 using ObjCfgRef = Owned<ObjCfg, qlxIntlReleaseObjCfg>;  // one counted reference
 
+/** What configurations ask the registry that they are in, where there is one. */
+struct ConfigRegistry {
+  uint8_t (*has)(const char *name);
+  ObjCfg *(*get)(const char *name);  // counted; made when it is new; null where that cannot be
+  // Told when a configuration that stored this parent name got another one.
+  void (*childStrays)(const char *parentName);
+};
+
+/** The registry lasts as long as the process. */
+void qlxSetConfigRegistry(const ConfigRegistry *registry);
+
 /** Replaces the stored parent name by a copy. */
 void qlxSetParentName(ObjCfg *cfg, const char *parentName);
 

@@ -11,8 +11,9 @@
 
 #include "object/QlxLocked.h"
 #include "QlxLogManager.h"
+#include "object/QlxInstances.h"
+#include "object/QlxListeners.h"
 #include "object/QlxOperation.h"
-#include "QlxToolkit.h"
 
 static constexpr const char *kDefaultFormatterName = "quill.defaultFormatter";
 static constexpr const char *kDefaultFormatterClass = "qlx_basicformatter";

@@ -11,6 +11,7 @@
 #include <qlx/system.h>
 
 #include "object/QlxClasses.h"
+#include "object/QlxObjClass.h"
 #include "record/QlxLoggedEvent.h"
 #include "QlxObject.h"
 
@@ -31,18 +32,18 @@ struct PDLoggerVars {
 // keeps it (owned, null at first unless said otherwise; null is not stamped). In the order in which
 // an event gets them.
 struct Stamp {
-  const char *key;
+  EventKey key;
   char *PDLoggerVars::*value;
 };
 
 constexpr Stamp kStamps[] = {
-    {"organization", &PDLoggerVars::organization},
-    {"product", &PDLoggerVars::product},
-    {"component", &PDLoggerVars::component},
-    {"client", &PDLoggerVars::client},
-    {"server", &PDLoggerVars::server},
-    {"serverFormat", &PDLoggerVars::serverFormat},
-    {"productInstance", &PDLoggerVars::productInstance},
+    {EventKey::kOrganization, &PDLoggerVars::organization},
+    {EventKey::kProduct, &PDLoggerVars::product},
+    {EventKey::kComponent, &PDLoggerVars::component},
+    {EventKey::kClient, &PDLoggerVars::client},
+    {EventKey::kServer, &PDLoggerVars::server},
+    {EventKey::kServerFormat, &PDLoggerVars::serverFormat},
+    {EventKey::kProductInstance, &PDLoggerVars::productInstance},
 };
 
 constexpr uint32_t kMaxHostChars = 256;
@@ -80,7 +81,7 @@ void QlxPDLoggerFCfgChange(QlxObject *logger, const char *key) {
   if (!key) return;
   PDLoggerVars *vars = varsOf(logger);
   for (const Stamp &stamp : kStamps) {
-    if (OslStringCmp(stamp.key, key) != 0) continue;
+    if (OslStringCmp(nameOf(stamp.key), key) != 0) continue;
     if (!vars) return;
     OslMemoryFree(vars->*stamp.value);
     vars->*stamp.value = qlxIntlGetObjProp(logger, key, nullptr);
@@ -99,8 +100,8 @@ void QlxPDLoggerFLog(QlxObject *logger, Event *event, va_list *args) {
   if (!logger || !event) return;
   const PDLoggerVars *vars = varsOf(logger);
   if (vars) stampValues(event, vars);
-  qlxStampEventInt(event, "processId", static_cast<int32_t>(CxProcessGetCurrentID()));
-  qlxStampEventInt(event, "threadId", static_cast<int32_t>(CxThreadGetCurrentID()));
+  qlxStampEventInt(event, EventKey::kProcessId, static_cast<int32_t>(CxProcessGetCurrentID()));
+  qlxStampEventInt(event, EventKey::kThreadId, static_cast<int32_t>(CxThreadGetCurrentID()));
   qlxPDXMLUFormatterCacheMessageID(vars ? vars->idFormatter : nullptr, event, args);
   QlxBasicObjectFLog(logger, event, args);
 }
@@ -113,4 +114,5 @@ const ObjClass qlxPDLoggerClass = {
     .fAllocVars = QlxPDLoggerFAllocVars,
     .fFreeVars = QlxPDLoggerFFreeVars,
     .fCfgChange = QlxPDLoggerFCfgChange,
+    .own = &kTakesNoNotes,
 };

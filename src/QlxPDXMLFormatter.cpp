@@ -1,20 +1,21 @@
 // The XML formatter: each event as one Message or Trace element.
-#include "QlxPDXMLFormatter.h"
-
 #include <qlx/class/containers.h>
-#include <qlx/class/event.h>
-#include <qlx/class/message.h>
+#include <qlx/class/formatter.h>
 #include <qlx/class/object.h>
 #include <qlx/event.h>
 #include <qlx/memory.h>
 
+#include "QlxBasicFormatter.h"
+#include "QlxEvent.h"
+#include "QlxLevel.h"
 #include "object/QlxClasses.h"
 #include "object/QlxConfigKeys.h"
+#include "object/QlxObjClass.h"
+#include "object/QlxObjectFields.h"
+#include "record/QlxBoundText.h"
 #include "record/QlxFormatted.h"
-#include "text/QlxFormatCache.h"
-#include "QlxI18Msg.h"
 #include "record/QlxMsgId.h"
-#include "QlxObject.h"
+#include "record/QlxPDXMLElements.h"
 
 using namespace std::string_view_literals;
 
@@ -32,7 +33,7 @@ struct PDXMLVars {
 
 }  // namespace
 
-// Null for an object of another kind, which keeps something else in the same place.
+// Null for an object of another kind, which has something else in the same place.
 static PDXMLVars *varsOf(QlxObject *formatter) {
   return isKind(formatter, Formatter) ? static_cast<PDXMLVars *>(formatter->vars) : nullptr;
 }
@@ -112,14 +113,14 @@ static void appendStart(RecordText &out, const Event *event, std::u16string_view
   } else {
     out << (hasLevel ? "<Trace Level=\""sv : "<Trace"sv);
   }
-  if (hasLevel) qlxPDXMLAppendLevel(out, event->level);
+  if (hasLevel) out << qlxLevelWord(event->level);
   out << (asMessage || hasLevel ? "\">\n"sv : ">\n"sv);
 }
 
 static void appendTime(RecordText &out, const QlxObject *formatter, double time) {
   out << " <Time Millis=\""sv;
   out.number(kCachedWhole, time) << "\">"sv;
-  out.date(formatter->kind2.dateTimeFormat, time) << "</Time>\n"sv;
+  out.date(qlxDateStyleOf(formatter), time) << "</Time>\n"sv;
 }
 
 static void appendFreeAttributes(RecordText &out, const Event *event, const EventValues &values) {
@@ -159,19 +160,20 @@ static void appendElement(RecordText &out, std::string_view start, const char *v
   if (value) (out << start).value(value) << end;
 }
 
-static bool appendRecord(RecordText out, QlxObject *formatter, Event *event, va_list *args) {
+static bool appendRecord(QlxObject *formatter, Event *event, va_list *args, RecordText &out) {
   PDXMLVars *vars = varsOf(formatter);
   if (!vars || !event) return false;
   const bool asMessage = isMessage(vars, event);
   qlxUseFormatterLocale(event, formatter->kind3.locale);
-  const BoundText text{event, args};
+  BoundText bound;
+  const std::u16string_view text = bound.bind(event, args);
   const EventValues values = qlxFindEventValues(event);
 
   if (vars->firstRecord) qlxPDXMLAppendProducts(out, values, productsOf(vars, 1));
-  appendStart(out, event, text.get(), asMessage);
+  appendStart(out, event, text, asMessage);
   appendTime(out, formatter, event->time);
   qlxPDXMLAppendProducts(out, values, productsOf(vars, 0));
-  out << " <LogText><![CDATA["sv << text.get() << "]]></LogText>\n"sv;
+  out << " <LogText><![CDATA["sv << text << "]]></LogText>\n"sv;
   appendFreeAttributes(out, event, values);
   appendOrigin(out, event, values, asMessage, args);
   appendElement(out, " <CorrelationId>"sv, values[EventKey::kCorrelationId],
@@ -183,19 +185,11 @@ static bool appendRecord(RecordText out, QlxObject *formatter, Event *event, va_
   return true;
 }
 
-uint8_t qlxPDXMLFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
-                                CxUStringBuff *record) {
-  return appendRecord(RecordText{record}, formatter, event, args);
-}
-
-bool qlxPDXMLFormatterAppendAscii(QlxObject *formatter, Event *event, va_list *args,
-                                  CxAsciiLine *line) {
-  return appendRecord(RecordText{line}, formatter, event, args);
-}
-
 UChar *QlxPDXMLUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {
-  return qlxFormatNew(qlxPDXMLFormatterAppend, formatter, event, args);
+  return qlxFormatNew(formatter, event, args, appendRecord);
 }
+
+static constexpr QlxOwnClass kOwn = {.takesNotes = true, .append = appendRecord};
 
 const ObjClass qlxPDXMLFormatterClass = {
     .kind = Formatter,
@@ -208,4 +202,5 @@ const ObjClass qlxPDXMLFormatterClass = {
     .fAllocVars = QlxPDXMLFormatterFAllocVars,
     .fFreeVars = QlxPDXMLFormatterFFreeVars,
     .fCfgChange = QlxPDXMLFormatterFCfgChange,
+    .own = &kOwn,
 };

@@ -1,129 +1,33 @@
-// The toolkit: the library's entry and exit, and its three registries: classes, class names by
-// kind, and named objects.
+// The toolkit: the library's entry and exit.
 #include "QlxToolkit.h"
 
 #include <array>
 #include <iterator>
+#include <utility>
 
 #include <qlx/class/containers.h>
 #include <qlx/class/handler.h>
+#include <qlx/class/object.h>
 #include <qlx/toolkit.h>
 
-#include "object/QlxClasses.h"
-#include "record/QlxFormatted.h"
-#include "text/QlxFormatCache.h"
-#include "object/QlxLocked.h"
-#include "record/QlxLoggedEvent.h"
 #include "QlxLogManager.h"
-#include "object/QlxObjClass.h"
 #include "QlxObject.h"
 #include "QlxReadProps.h"
+#include "object/QlxInstances.h"
+#include "object/QlxListeners.h"
+#include "object/QlxLocked.h"
+#include "object/QlxObjClass.h"
+#include "util/CxHooks.h"
 #include "util/CxThread.h"
-
-static constexpr int32_t kKinds = 4;  // Logger, Filter, Handler, Formatter: consecutive numbers
-
-// In the order of registration.
-static constexpr const ObjClass *kBuiltinClasses[] = {
-    &qlxBasicLoggerClass,          &qlxPDLoggerClass,       &qlxLevelFilterClass,
-    &qlxMsgIdFilterClass,          &qlxConsoleHandlerClass, &qlxFileHandlerClass,
-    &qlxMultiProcFileHandlerClass, &qlxBasicFormatterClass, &qlxPDXMLFormatterClass,
-    &qlxVexTraceFormatterClass,
-};
 
 static struct {
   uint8_t open;
-  QlxObject *logger;   // one of `kept`; hidden while the toolkit is closed
   QlxObject *kept[3];  // references that open obtained: error logger, console, its formatter
-  StringToObjClassMap *classes;             // owns the records
-  std::array<StringGroup *, kKinds> names;  // class names by kind
-  StringToObjMap *instances;                // one reference to each object
-  StringToObjMapNode *nextToClose;          // where the walk over `instances` goes on
-  uint8_t closing;                          // 1 while the objects are taken apart
 } gToolkit;
-
-// ---- Classes
-
-void qlxToolkitInitObjClasses(void) {
-  if (gToolkit.classes) return;
-  gToolkit.classes = qlxIntlAllocStringToObjClassMap();
-  if (!gToolkit.classes) return;
-  for (StringGroup *&names : gToolkit.names) names = qlxIntlAllocStringGroup();
-  for (const ObjClass *builtin : kBuiltinClasses) qlxAddBuiltinClass(*builtin);
-}
-
-static StringGroup *namesOfKind(int32_t kind) {
-  return kind >= Logger && kind < Logger + kKinds ? gToolkit.names[kind - Logger] : nullptr;
-}
-
-// A record may stand there under several names.
-static bool isListedFrom(const StringToObjClassMapNode *node, const ObjClass *objClass) {
-  while (node && node->value != objClass) node = node->next;
-  return node;
-}
-
-void qlxToolkitAddClassDef(const char *className, ObjClass *objClass) {
-  if (!objClass) return;
-  qlxToolkitInitObjClasses();
-  // The first of a name stays; it may be a built-in class that was registered just now.
-  if (!qlxToolkitGetClassDef(className) &&
-      qlxIntlStringToObjClassMapPut(gToolkit.classes, className, objClass)) {
-    qlxIntlStringGroupAdd(namesOfKind(objClass->kind), className);
-  } else if (!isListedFrom(qlxIntlStringToObjClassMapIterator(gToolkit.classes), objClass)) {
-    qlxFreeObjClass(objClass);
-  }
-}
-
-ObjClass *qlxToolkitGetClassDef(const char *className) {
-  return qlxIntlStringToObjClassMapGet(gToolkit.classes, className);
-}
-
-StringGroupNode *qlxToolkitFetchClassnames(int32_t kind) {
-  return qlxIntlStringGroupIterator(namesOfKind(kind));
-}
-
-static void freeClasses() {
-  for (StringToObjClassMapNode *it = qlxIntlStringToObjClassMapIterator(gToolkit.classes); it;
-       it = it->next) {
-    if (!isListedFrom(it->next, it->value)) qlxFreeObjClass(it->value);
-  }
-  qlxIntlFreeStringToObjClassMap(gToolkit.classes);
-  gToolkit.classes = nullptr;
-  for (StringGroup *&names : gToolkit.names) {
-    qlxIntlFreeStringGroup(names);
-    names = nullptr;
-  }
-}
-
-// ---- Instances
-
-void qlxToolkitAddObjInstance(const char *objectName, QlxObject *object) {
-  if (!objectName || !object) return;
-  if (!gToolkit.instances) gToolkit.instances = qlxIntlAllocStringToObjMap();
-  qlxIntlStringToObjMapPut(gToolkit.instances, objectName, object);
-}
-
-QlxObject *qlxToolkitGetObjInstance(const char *objectName) {
-  return qlxIntlStringToObjMapGet(gToolkit.instances, objectName);
-}
-
-void qlxToolkitRemObjInstance(const char *objectName) {
-  StringToObjMapNode *node = qlxIntlStringToObjMapGetNode(gToolkit.instances, objectName);
-  if (!node) return;
-  if (gToolkit.nextToClose == node) gToolkit.nextToClose = node->next;
-  qlxIntlStringToObjMapRemNode(gToolkit.instances, node);
-}
-
-QlxObject *qlxToolkitLogger(void) {
-  return gToolkit.open ? gToolkit.logger : nullptr;
-}
 
 // ---- Closing. Every object takes these steps, and none takes one before all have taken those
 // above it: handlers are closed while their formatters still have variables to make a trailer from,
 // and listeners go while everything that they look for is still registered.
-
-uint8_t qlxToolkitIsClosing(void) {
-  return gToolkit.closing;
-}
 
 static void freeVariables(QlxObject *object) {
   if (!object->objClass) return;
@@ -144,44 +48,37 @@ static constexpr void (*kClosingSteps[])(QlxObject *) = {
     qlxRetireObject,
 };
 
-// Takes one step with every object whose next step it is. A class's operation that runs meanwhile
-// may change the registry: who removes the next object moves the walk on. False: no object was
-// there.
-static bool takeStep(uint8_t step) {
-  bool any = false;
-  gToolkit.nextToClose = qlxIntlStringToObjMapIterator(gToolkit.instances);
-  while (const StringToObjMapNode *node = gToolkit.nextToClose) {
-    gToolkit.nextToClose = node->next;
-    if (closingStepsTaken(node->value) != step) continue;
-    const ObjectRef object{qlxIntlAcquireObject(node->value)};
-    countClosingStep(object.get());
-    kClosingSteps[step](object.get());
-    any = true;
-  }
-  return any;
+template <uint8_t number>
+static void takeStep(QlxObject *visited) {
+  const ObjectRef object{qlxIntlAcquireObject(visited)};
+  countClosingStep(object.get());
+  kClosingSteps[number](object.get());
+}
+
+template <uint8_t... number>
+static void takeAllSteps(std::integer_sequence<uint8_t, number...>) {
+  // An object that a step has made starts with the first one.
+  while ((qlxVisitInstances(number, takeStep<number>) || ...)) continue;
 }
 
 void qlxFreeInstancesMap(void) {
-  gToolkit.closing = 1;
-  // An object that a step has made starts with the first one.
-  for (uint8_t step = 0; step < std::size(kClosingSteps);) step = takeStep(step) ? 0 : step + 1;
+  qlxSetToolkitClosing(1);
+  takeAllSteps(std::make_integer_sequence<uint8_t, std::size(kClosingSteps)>{});
   for (QlxObject *&kept : gToolkit.kept) {
     const ObjectRef reference{kept};
     kept = nullptr;
   }
-  qlxIntlFreeStringToObjMap(gToolkit.instances);
-  gToolkit.instances = nullptr;
-  gToolkit.closing = 0;
+  qlxFreeInstances();
+  qlxSetToolkitClosing(0);
 }
 
 static void closeToolkit() {
   qlxCloseLogMgr();
   qlxFreeInstancesMap();
-  freeClasses();
-  qlxDropCachedEvent();
-  qlxDropFormatted();
-  qlxDropCachedFormats();
+  qlxFreeClassRegistry();
+  CxHooks::atClose();
   gToolkit.open = 0;
+  qlxSetToolkitLogger(nullptr);
 }
 
 // ---- Opening
@@ -210,7 +107,7 @@ static void initToolkitLogger() {
     gToolkit.kept[1] = console;
   }
   gToolkit.kept[0] = logger;
-  gToolkit.logger = logger;
+  qlxSetToolkitLogger(logger);
 }
 
 static uint8_t isOpen() {

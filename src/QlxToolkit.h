@@ -13,9 +13,6 @@ QLX_BEGIN_DECLS
  */
 void qlxFreeInstancesMap(void);
 
-/** @return 1 while that runs: the registry then keeps its objects alive, whoever lets go of them */
-uint8_t qlxToolkitIsClosing(void);
-
 QLX_END_DECLS
 
 #endif

@@ -2,36 +2,26 @@
 // class has no configuration change, so no key reaches its objects.
 #include <qlx/class/formatter.h>
 
-#include <algorithm>
 #include <cstring>
-#include <iterator>
 #include <string_view>
 
-#include <qlx/class/event.h>
 #include <qlx/class/message.h>
 #include <qlx/event.h>
 
+#include "QlxEvent.h"
+#include "QlxLevel.h"
 #include "object/QlxClasses.h"
+#include "object/QlxObjClass.h"
+#include "object/QlxObjectFields.h"
+#include "record/QlxBoundText.h"
 #include "record/QlxEventValues.h"
 #include "record/QlxFormatted.h"
-#include "QlxI18Msg.h"
 #include "record/QlxMsgId.h"
-#include "QlxObject.h"
 #include "record/QlxRecordText.h"
 
 using namespace std::string_view_literals;
 
 namespace {
-
-struct LevelWord {
-  int32_t level;
-  std::string_view word;  // five characters
-};
-
-constexpr LevelWord kLevelWords[] = {
-    {DEBUG_MAX, " MAX "}, {DEBUG_MID, " MID "}, {DEBUG_MIN, " MIN "}, {INFO, "INFO "},
-    {WARN, "WARN "},      {ERROR, "ERROR"},     {FATAL, "ERROR"},
-};
 
 // What a line is made from.
 struct Record {
@@ -45,12 +35,15 @@ struct Record {
 
 static void appendTime(RecordText &line, const Record &record) {
   line << "["sv;
-  line.date(record.formatter->kind2.dateTimeFormat, record.event->time) << "]"sv;
+  line.date({record.formatter->kind2.dateTimeFormat}, record.event->time) << "]"sv;
 }
 
+// In a column of five characters.
 static void appendLevel(RecordText &line, const Record &record) {
-  const auto *row = std::ranges::find(kLevelWords, record.event->level, &LevelWord::level);
-  line << (row != std::end(kLevelWords) ? row->word : "OTHER"sv);
+  const std::string_view word = qlxLevelWord(record.event->level);
+  if (word.size() == 3) line << " "sv;
+  line << word;
+  if (word.size() < 5) line << " "sv;
 }
 
 // Up to the first dot.
@@ -92,11 +85,12 @@ static constexpr void (*kFields[])(RecordText &line, const Record &record) = {
     appendSource, appendMessageId, appendText,
 };
 
-static bool appendLine(RecordText line, QlxObject *formatter, Event *event, va_list *args) {
+static bool appendLine(QlxObject *formatter, Event *event, va_list *args, RecordText &line) {
   if (!isKind(formatter, Formatter) || !event) return false;
   qlxUseFormatterLocale(event, formatter->kind3.locale);
-  const BoundText text{event, args};
-  const Record record{formatter, event, text.get(), qlxFindEventValues(event)};
+  BoundText bound;
+  const std::u16string_view text = bound.bind(event, args);
+  const Record record{formatter, event, text, qlxFindEventValues(event)};
   std::string_view before = "\x1e";  // a record separator (U+001E), then what is between fields
   for (const auto append : kFields) {
     line << before;
@@ -107,19 +101,11 @@ static bool appendLine(RecordText line, QlxObject *formatter, Event *event, va_l
   return line.isWholeFor(event);
 }
 
-uint8_t qlxVexTraceFormatterAppend(QlxObject *formatter, Event *event, va_list *args,
-                                   CxUStringBuff *record) {
-  return appendLine(RecordText{record}, formatter, event, args);
-}
-
-bool qlxVexTraceFormatterAppendAscii(QlxObject *formatter, Event *event, va_list *args,
-                                     CxAsciiLine *line) {
-  return appendLine(RecordText{line}, formatter, event, args);
-}
-
 UChar *QlxVexTraceUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {
-  return qlxFormatNew(qlxVexTraceFormatterAppend, formatter, event, args);
+  return qlxFormatNew(formatter, event, args, appendLine);
 }
+
+static constexpr QlxOwnClass kOwn = {.takesNotes = true, .append = appendLine};
 
 const ObjClass qlxVexTraceFormatterClass = {
     .kind = Formatter,
@@ -127,4 +113,5 @@ const ObjClass qlxVexTraceFormatterClass = {
     .description = nullptr,
     .op1 = {.fFormat = QlxVexTraceUFormatterFFormat},
     .op4 = {.fBindMsg = qlxIntlBindUI18Msg},
+    .own = &kOwn,
 };

@@ -13,6 +13,7 @@
 #include "record/QlxFormatted.h"
 #include "text/QlxFormatCache.h"
 #include "record/QlxLoggedEvent.h"
+#include "record/QlxCachedBuffer.h"
 #include "support/HostName.h"
 #include "support/ChainTest.h"
 #include "support/FailingMemory.h"
@@ -415,7 +416,7 @@ TEST_F(PDLoggerTest, WhateverFindsNoMemoryBeforeTheFirstListenerIsTold) {
         const std::string whole = Arrival::event;
         if (isFirstCall) qlxDropCachedEvent();
         qlxDropCachedFormats();
-        qlxDropFormatted();
+        qlxDropCachedBuffers();
         (memory.*fail)(nth);
         const CxStatus status = log();
         failures = memory.failures();
@@ -507,7 +508,7 @@ TEST_F(PDLoggerTest, AllItsMemoryIsGivenBackWhenItIsReleased) {
     EXPECT_GT(memory.live(), 0);
   }
   qlxDropCachedEvent();  // what is kept for the next call
-  qlxDropFormatted();
+  qlxDropCachedBuffers();
   EXPECT_EQ(memory.live(), 0);
 }
 

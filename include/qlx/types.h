@@ -194,6 +194,7 @@ struct ObjClass {
   void *(*fAllocVars)(void);
   void (*fFreeVars)(void *);
   void (*fCfgChange)(QlxObject *, const char *);
+  const struct QlxOwnClass *own; /**< the library's own; null in a host's record */
 };
 
 /** The header of every object. Changed only under the API lock. */

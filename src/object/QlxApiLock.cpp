@@ -10,8 +10,7 @@
 #include <qlx/system.h>
 #include <qlx/toolkit.h>
 
-#include "text/QlxFormatCache.h"
-#include "util/CxLook.h"
+#include "util/CxHooks.h"
 #include "util/CxThread.h"
 
 namespace {
@@ -29,17 +28,20 @@ bool heldByThisThread() {
 void beforeFork() {
   const bool held = heldByThisThread();
   if (held || qlxAPIMutexLock()) gTakenForFork = !held;
-  qlxFormatCacheLock();
+  CxHooks::beforeFork();
 }
 
-void afterForkInParent() {
-  qlxFormatCacheUnlock();
+void afterFork(bool isChild) {
+  CxHooks::afterFork(isChild);
   if (heldByThisThread() && gTakenForFork) qlxAPIMutexUnlock();
 }
 
+void afterForkInParent() {
+  afterFork(false);
+}
+
 void afterForkInChild() {
-  cxLookRestart();
-  afterForkInParent();
+  afterFork(true);
 }
 
 // Threads that make their first call at the same time may each make a mutex; the first one stays.

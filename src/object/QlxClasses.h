@@ -1,19 +1,24 @@
-// The built-in classes as data: one record each, at the end of the class's own file. The toolkit
-// registers them in the order of its list.
+// The built-in classes: one record each, at the end of the class's own file.
 #ifndef QLX_SRC_QLXCLASSES_H
 #define QLX_SRC_QLXCLASSES_H
 
 #include <qlx/types.h>
 
-extern const ObjClass qlxBasicLoggerClass;
-extern const ObjClass qlxPDLoggerClass;
-extern const ObjClass qlxLevelFilterClass;
-extern const ObjClass qlxMsgIdFilterClass;
-extern const ObjClass qlxConsoleHandlerClass;
-extern const ObjClass qlxFileHandlerClass;
-extern const ObjClass qlxMultiProcFileHandlerClass;
-extern const ObjClass qlxBasicFormatterClass;
-extern const ObjClass qlxPDXMLFormatterClass;
-extern const ObjClass qlxVexTraceFormatterClass;
+// The one list of them, in the order in which they are registered.
+#define QLX_BUILTIN_CLASSES(CLASS)    \
+  CLASS(qlxBasicLoggerClass)          \
+  CLASS(qlxPDLoggerClass)             \
+  CLASS(qlxLevelFilterClass)          \
+  CLASS(qlxMsgIdFilterClass)          \
+  CLASS(qlxConsoleHandlerClass)       \
+  CLASS(qlxFileHandlerClass)          \
+  CLASS(qlxMultiProcFileHandlerClass) \
+  CLASS(qlxBasicFormatterClass)       \
+  CLASS(qlxPDXMLFormatterClass)       \
+  CLASS(qlxVexTraceFormatterClass)
+
+#define QLX_DECLARE_CLASS(record) extern const ObjClass record;
+QLX_BUILTIN_CLASSES(QLX_DECLARE_CLASS)
+#undef QLX_DECLARE_CLASS
 
 #endif

@@ -1,16 +1,19 @@
-// Class records: making, registering and freeing them. A kind operation that the host leaves out is
-// filled with the library's default here and nowhere else.
 #include "QlxObjClass.h"
 
-#include <qlx/class/filter.h>
-#include <qlx/class/formatter.h>
-#include <qlx/class/handler.h>
+#include <array>
+
+#include <qlx/class/containers.h>
 #include <qlx/class/message.h>
 #include <qlx/memory.h>
-#include <qlx/object.h>
 
-#include "QlxLocked.h"
 #include "util/CxOwned.h"
+
+static constexpr int32_t kKinds = 4;  // Logger, Filter, Handler, Formatter: consecutive numbers
+
+static StringToObjClassMap *gClasses;             // owns the records
+static std::array<StringGroup *, kKinds> gNames;  // class names by kind
+
+// ---- Records
 
 void qlxFreeObjClass(ObjClass *objClass) {
   if (!objClass) return;
@@ -41,120 +44,53 @@ ObjClass *qlxInitObjectClass(const char *className, int32_t kind, I18Msg *descri
   return objClass.release();
 }
 
-void qlxIntlAddLoggerClass(const char *className, I18Msg *description, fAllocVars allocVars,
-                           fFreeVars freeVars, fCfgChange cfgChange, fLog log) {
-  ObjClass *objClass =
-      qlxInitObjectClass(className, Logger, description, allocVars, freeVars, cfgChange);
-  if (!objClass) return;
-  objClass->op1.fLog = log ? log : QlxBasicObjectFLog;
-  qlxToolkitAddClassDef(className, objClass);
+// ---- The registry
+
+bool qlxMakeClassRegistry(void) {
+  if (gClasses) return false;
+  gClasses = qlxIntlAllocStringToObjClassMap();
+  if (!gClasses) return false;
+  for (StringGroup *&names : gNames) names = qlxIntlAllocStringGroup();
+  return true;
 }
 
-void qlxIntlAddFilterClass(const char *className, I18Msg *description, fAllocVars allocVars,
-                           fFreeVars freeVars, fCfgChange cfgChange, fProcess process,
-                           fIsLoggable isLoggable, fLog log) {
-  ObjClass *objClass =
-      qlxInitObjectClass(className, Filter, description, allocVars, freeVars, cfgChange);
-  if (!objClass) return;
-  objClass->op1.fProcess = process ? process : QlxBasicFilterFProcess;
-  objClass->op2.fIsLoggable = isLoggable ? isLoggable : QlxLevelFilterFIsLoggable;
-  objClass->op3.fLog = log ? log : QlxBasicObjectFLog;
-  qlxToolkitAddClassDef(className, objClass);
+static StringGroup *namesOfKind(int32_t kind) {
+  return kind >= Logger && kind < Logger + kKinds ? gNames[static_cast<size_t>(kind - Logger)]
+                                                  : nullptr;
 }
 
-void qlxIntlAddHandlerClass(const char *className, I18Msg *description, fAllocVars allocVars,
-                            fFreeVars freeVars, fCfgChange cfgChange, fProcess process, fOpen open,
-                            fClose close) {
-  ObjClass *objClass =
-      qlxInitObjectClass(className, Handler, description, allocVars, freeVars, cfgChange);
-  if (!objClass) return;
-  objClass->op1.fProcess = process ? process : QlxBasicHandlerFProcess;
-  objClass->op2.fOpen = open ? open : QlxBasicHandlerFOpen;
-  objClass->op3.fClose = close ? close : QlxBasicHandlerFClose;
-  qlxToolkitAddClassDef(className, objClass);
+// A record may stand there under several names.
+static bool isListedFrom(const StringToObjClassMapNode *node, const ObjClass *objClass) {
+  while (node && node->value != objClass) node = node->next;
+  return node;
 }
 
-void qlxIntlAddUFormatterClass(const char *className, I18Msg *description, fAllocVars allocVars,
-                               fFreeVars freeVars, fCfgChange cfgChange, fFormat format,
-                               fGetHeader getHeader, fGetTrailer getTrailer, fBindMsg bindMsg) {
-  ObjClass *objClass =
-      qlxInitObjectClass(className, Formatter, description, allocVars, freeVars, cfgChange);
-  if (!objClass) return;
-  objClass->op1.fFormat = format ? format : QlxBasicUFormatterFFormat;
-  objClass->op2.fGetHeader = getHeader ? getHeader : QlxBasicFormatterFGetHeader;
-  objClass->op3.fGetTrailer = getTrailer ? getTrailer : QlxBasicFormatterFGetTrailer;
-  objClass->op4.fBindMsg = bindMsg ? bindMsg : qlxIntlBindUI18Msg;
-  qlxToolkitAddClassDef(className, objClass);
-}
-
-void qlxAddBuiltinClass(const ObjClass &c) {
-  switch (c.kind) {
-    case Logger:
-      return qlxIntlAddLoggerClass(c.name, c.description, c.fAllocVars, c.fFreeVars, c.fCfgChange,
-                                   c.op1.fLog);
-    case Filter:
-      return qlxIntlAddFilterClass(c.name, c.description, c.fAllocVars, c.fFreeVars, c.fCfgChange,
-                                   c.op1.fProcess, c.op2.fIsLoggable, c.op3.fLog);
-    case Handler:
-      return qlxIntlAddHandlerClass(c.name, c.description, c.fAllocVars, c.fFreeVars, c.fCfgChange,
-                                    c.op1.fProcess, c.op2.fOpen, c.op3.fClose);
-    case Formatter:
-      return qlxIntlAddUFormatterClass(c.name, c.description, c.fAllocVars, c.fFreeVars,
-                                       c.fCfgChange, c.op1.fFormat, c.op2.fGetHeader,
-                                       c.op3.fGetTrailer, c.op4.fBindMsg);
+void qlxRegisterClass(const char *className, ObjClass *objClass) {
+  if (!qlxToolkitGetClassDef(className) &&
+      qlxIntlStringToObjClassMapPut(gClasses, className, objClass)) {
+    qlxIntlStringGroupAdd(namesOfKind(objClass->kind), className);
+  } else if (!isListedFrom(qlxIntlStringToObjClassMapIterator(gClasses), objClass)) {
+    qlxFreeObjClass(objClass);
   }
 }
 
-StringGroupNode *qlxIntlGetLoggerClasses(void) {
-  return qlxToolkitFetchClassnames(Logger);
-}
-StringGroupNode *qlxIntlGetFilterClasses(void) {
-  return qlxToolkitFetchClassnames(Filter);
-}
-StringGroupNode *qlxIntlGetHandlerClasses(void) {
-  return qlxToolkitFetchClassnames(Handler);
-}
-StringGroupNode *qlxIntlGetFormatterClasses(void) {
-  return qlxToolkitFetchClassnames(Formatter);
+ObjClass *qlxToolkitGetClassDef(const char *className) {
+  return qlxIntlStringToObjClassMapGet(gClasses, className);
 }
 
-// Public functions
-
-void QlxAddLoggerClass(const char *className, I18Msg *description, fAllocVars allocVars,
-                       fFreeVars freeVars, fCfgChange cfgChange, fLog log) {
-  qlxLocked<qlxIntlAddLoggerClass>(className, description, allocVars, freeVars, cfgChange, log);
+StringGroupNode *qlxToolkitFetchClassnames(int32_t kind) {
+  return qlxIntlStringGroupIterator(namesOfKind(kind));
 }
 
-void QlxAddFilterClass(const char *className, I18Msg *description, fAllocVars allocVars,
-                       fFreeVars freeVars, fCfgChange cfgChange, fProcess process,
-                       fIsLoggable isLoggable, fLog log) {
-  qlxLocked<qlxIntlAddFilterClass>(className, description, allocVars, freeVars, cfgChange, process,
-                                   isLoggable, log);
-}
-
-void QlxAddHandlerClass(const char *className, I18Msg *description, fAllocVars allocVars,
-                        fFreeVars freeVars, fCfgChange cfgChange, fProcess process, fOpen open,
-                        fClose close) {
-  qlxLocked<qlxIntlAddHandlerClass>(className, description, allocVars, freeVars, cfgChange, process,
-                                    open, close);
-}
-
-void QlxAddUFormatterClass(const char *className, I18Msg *description, fAllocVars allocVars,
-                           fFreeVars freeVars, fCfgChange cfgChange, fFormat format,
-                           fGetHeader getHeader, fGetTrailer getTrailer, fBindMsg bindMsg) {
-  qlxLocked<qlxIntlAddUFormatterClass>(className, description, allocVars, freeVars, cfgChange,
-                                       format, getHeader, getTrailer, bindMsg);
-}
-
-StringGroupNode *QlxGetLoggerClasses(void) {
-  return qlxLocked<qlxIntlGetLoggerClasses>();
-}
-StringGroupNode *QlxGetFilterClasses(void) {
-  return qlxLocked<qlxIntlGetFilterClasses>();
-}
-StringGroupNode *QlxGetHandlerClasses(void) {
-  return qlxLocked<qlxIntlGetHandlerClasses>();
-}
-StringGroupNode *QlxGetFormatterClasses(void) {
-  return qlxLocked<qlxIntlGetFormatterClasses>();
+void qlxFreeClassRegistry(void) {
+  for (StringToObjClassMapNode *it = qlxIntlStringToObjClassMapIterator(gClasses); it;
+       it = it->next) {
+    if (!isListedFrom(it->next, it->value)) qlxFreeObjClass(it->value);
+  }
+  qlxIntlFreeStringToObjClassMap(gClasses);
+  gClasses = nullptr;
+  for (StringGroup *&names : gNames) {
+    qlxIntlFreeStringGroup(names);
+    names = nullptr;
+  }
 }

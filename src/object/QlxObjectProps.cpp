@@ -1,12 +1,14 @@
-// An object's own properties: the typed family over its property map. Every setter tells the
-// object's class of the key, also when storing failed.
-#include "QlxObject.h"
-
+// An object's own properties: the typed family over its property map, and a configuration's,
+// applied to it. Every setter tells the object's class of the key, also when storing failed.
 #include <qlx/class/containers.h>
+#include <qlx/class/config.h>
+#include <qlx/class/object.h>
+#include <qlx/config.h>
 #include <qlx/object.h>
 #include <qlx/props.h>
 
 #include "QlxLocked.h"
+#include "QlxLogManager.h"
 #include "QlxOperation.h"
 
 static StringToStringMap *propsOf(QlxObject *object) {
@@ -39,6 +41,11 @@ uint8_t qlxIntlSetObjPropBool(QlxObject *object, const char *key, uint8_t value)
   const uint8_t stored = QlxSetMapPropBool(qlxFetchObjPropMap(object), key, value);
   qlxNotifyObjCfgChange(object, key);
   return stored;
+}
+
+uint8_t qlxIntlLogMgrApplyCfg(QlxObject *object, const char *name) {
+  if (!object || !object->objClass) return 0;
+  return qlxVisitInherited(name, object, qlxIntlSetObjProp);
 }
 
 #define QLX_OBJECT_GETTER(Type, T)                                                \
@@ -80,4 +87,8 @@ uint8_t QlxSetObjProp(QlxObject *object, const char *key, const char *value) {
 
 uint8_t QlxSetObjPropBool(QlxObject *object, const char *key, uint8_t value) {
   return qlxLocked<qlxIntlSetObjPropBool>(object, key, value);
+}
+
+uint8_t QlxLogMgrApplyCfg(QlxObject *object, const char *name) {
+  return qlxLocked<qlxIntlLogMgrApplyCfg>(object, name);
 }

@@ -6,6 +6,9 @@
 
 #include <cxxabi.h>
 
+#include "QlxObjClass.h"
+#include "record/QlxLoggedEvent.h"
+
 [[noreturn]] static void end(const char *what, QlxOperationName name) {
   const char *className = name.objClass->name;
   std::fprintf(stderr, "qlx: %s left the operation %s of the class %s\n", what, name.operation,
@@ -16,6 +19,8 @@
 template <typename Result, typename... Args>
 Result qlxCall(QlxOperationName name, Result (*operation)(Args...),
                std::type_identity_t<Args>... args) noexcept {
+  const QlxOwnClass *own = name.objClass->own;
+  if (!own || !own->takesNotes) qlxSettleNotedEvent();
   try {
     return operation(args...);
   } catch (abi::__forced_unwind &) {

@@ -1,6 +1,9 @@
-// The one way to an operation of a class. A host's operation may be C++ that throws: an exception
-// that left it would leave the API lock held for ever, so it ends the process, with a line that
-// names the operation. What does not throw pays a call for this, nothing else.
+// The one way to an operation of a class.
+//
+// A host's operation may look at an event's properties, or log: what is noted of the source of the
+// event on its way becomes properties before any operation that is not marked as one that takes
+// notes (QlxOwnClass). And it may be C++ that throws: an exception that left it would leave the API
+// lock held for ever, so it ends the process, with a line that names the operation.
 #ifndef QLX_SRC_QLXOPERATION_H
 #define QLX_SRC_QLXOPERATION_H
 

@@ -9,18 +9,6 @@
 
 #include "QlxLoggedEvent.h"
 
-// In the order of the enumeration.
-static constexpr std::string_view kKeys[] = {
-    "qlx_prop_srcfile", "qlx_prop_srcfunction",
-    "qlx_prop_srcline", "organization",
-    "product",          "component",
-    "productInstance",  "client",
-    "server",           "serverFormat",
-    "correlationId",    "processId",
-    "threadId",
-};
-static_assert(std::size(kKeys) == static_cast<size_t>(EventKey::kNone));
-
 // A place of its own for each key, by its length and its last byte but one.
 static constexpr size_t kPlaces = 32;
 
@@ -32,15 +20,16 @@ static constexpr size_t placeOf(std::string_view key) {
 static constexpr auto kKeyAt = [] {
   std::array<EventKey, kPlaces> keys;
   keys.fill(EventKey::kNone);
-  for (size_t i = 0; i < std::size(kKeys); ++i) keys[placeOf(kKeys[i])] = static_cast<EventKey>(i);
+  for (size_t i = 0; i < std::size(kEventKeys); ++i)
+    keys[placeOf(kEventKeys[i])] = static_cast<EventKey>(i);
   return keys;
 }();
-static_assert(std::ranges::count(kKeyAt, EventKey::kNone) == kPlaces - std::size(kKeys));
+static_assert(std::ranges::count(kKeyAt, EventKey::kNone) == kPlaces - std::size(kEventKeys));
 
 EventKey qlxEventKeyOf(const char *text) {
   const std::string_view key{text};
   const EventKey found = kKeyAt[placeOf(key)];
-  const bool same = found != EventKey::kNone && key == kKeys[static_cast<size_t>(found)];
+  const bool same = found != EventKey::kNone && key == nameOf(found);
   return same ? found : EventKey::kNone;
 }
 

@@ -10,27 +10,12 @@
 
 #include <qlx/event.h>
 
-enum class EventKey : uint8_t {
-  kSourceFile,
-  kSourceFunction,
-  kSourceLine,  // a number: see EventValues::sourceLine
-  kOrganization,
-  kProduct,
-  kComponent,
-  kProductInstance,
-  kClient,
-  kServer,
-  kServerFormat,
-  kCorrelationId,
-  kProcessId,
-  kThreadId,
-  kNone,  // any other
-};
+#include "QlxEventKeys.h"
 
 // Texts are the event's own or the caller's; null for a key that is absent or has no value.
 struct EventValues {
   std::array<const char *, static_cast<size_t>(EventKey::kNone)> texts;
-  std::optional<int32_t> sourceLine;  // none when it is no number
+  std::optional<int32_t> sourceLine;  // a number; none when the property is none
   uint32_t keys;                      // a bit for each key that the event has, also without a value
 
   const char *operator[](EventKey key) const { return texts[static_cast<size_t>(key)]; }

@@ -2,16 +2,16 @@
 
 #include <cstring>
 #include <malloc.h>
+#include <utility>
 
 #include <qlx/class/containers.h>
-#include <qlx/class/event.h>
-#include <qlx/class/message.h>
 #include <qlx/memory.h>
 #include <qlx/system.h>
 
+#include "QlxEvent.h"
 #include "QlxProps.h"
 #include "util/CxDecimal.h"
-#include "util/CxStatus.h"
+#include "util/CxHooks.h"
 #include "util/CxUnits.h"
 #include "util/QlxMapTemplate.h"
 
@@ -87,14 +87,6 @@ static void takeBack(Char **cached, Char **from) {
   *from = nullptr;
 }
 
-void qlxMissMemory(Event *event) {
-  event->status = cxFailure(ENOMEM);
-}
-
-bool qlxMissedMemory(const Event *event) {
-  return event->status.kind == 'p' && event->status.code == ENOMEM;
-}
-
 // ---- Properties
 
 // The first cached node, with that key and value; null when there is none or memory ran out.
@@ -115,7 +107,8 @@ static void stampAnew(Event *event, const char *key, const char *value) {
   qlxMissMemory(event);
 }
 
-void qlxStampEvent(Event *event, const char *key, std::string_view value) {
+void qlxStampEvent(Event *event, EventKey which, std::string_view value) {
+  const char *key = nameOf(which);
   if (!event->props) std::swap(event->props, gCache.props);
   StringToStringMap *props = event->props;
   StringToStringMapNode *node = nullptr;
@@ -126,7 +119,7 @@ void qlxStampEvent(Event *event, const char *key, std::string_view value) {
   Nodes::linkAtTail(node);
 }
 
-void qlxStampEventInt(Event *event, const char *key, int32_t value) {
+void qlxStampEventInt(Event *event, EventKey key, int32_t value) {
   char digits[kMaxDecimalDigits + 2];
   char *const end = digits + sizeof digits - 1;
   *end = '\0';
@@ -147,22 +140,15 @@ const EventSource *qlxNotedEventSource(const Event *event) {
   return event && gNoted.event == event ? &gNoted.source : nullptr;
 }
 
-static void stampSource(Event *event, const EventSource &source) {
-  if (source.file) {
-    qlxStampEvent(event, "qlx_prop_srcfile", source.file);
-    qlxStampEventInt(event, "qlx_prop_srcline", source.line);
-  }
-  if (source.function) qlxStampEvent(event, "qlx_prop_srcfunction", source.function);
-}
-
-void qlxSettleEvent(Event *event) {
-  if (!qlxNotedEventSource(event)) return;
-  gNoted.event = nullptr;
-  stampSource(event, gNoted.source);
-}
-
 void qlxSettleNotedEvent(void) {
-  qlxSettleEvent(gNoted.event);
+  Event *event = std::exchange(gNoted.event, nullptr);
+  if (!event) return;
+  const EventSource &source = gNoted.source;
+  if (source.file) {
+    qlxStampEvent(event, EventKey::kSourceFile, source.file);
+    qlxStampEventInt(event, EventKey::kSourceLine, source.line);
+  }
+  if (source.function) qlxStampEvent(event, EventKey::kSourceFunction, source.function);
 }
 
 // ---- Properties taken back
@@ -280,3 +266,5 @@ void qlxDropCachedEvent(void) {
   freeNodes(gCache.nodes);
   gCache = {};
 }
+
+static const CxHooks gHooks{{.atClose = qlxDropCachedEvent}};

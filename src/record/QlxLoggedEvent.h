@@ -10,6 +10,8 @@
 
 #include <qlx/event.h>
 
+#include "QlxEventKeys.h"
+
 // Texts of the caller's; each may be null. The line goes with the file.
 struct EventSource {
   const char *file, *function;
@@ -21,24 +23,15 @@ QLX_BEGIN_DECLS
 // What is noted for an event and not among its properties yet, or null.
 const EventSource *qlxNotedEventSource(const Event *event);
 
-// Makes what is noted for an event its properties. To be called before anything but the library's
-// own code that asks for the note gets the event.
-void qlxSettleEvent(Event *event);
-
-// The same for whatever event something is noted for. To be called before a host's operation that
-// gets no event (a header, a trailer): it may log too, and reuse the caller's texts for that.
+// Makes what is noted properties of the event that it is noted for. To be called before anything
+// but the library's own code that asks for the note runs, also where that gets no event: it may log
+// too, and reuse the caller's texts for that.
 void qlxSettleNotedEvent(void);
-
-// Makes it the event's status that memory ran out, so that the log call's result tells it.
-void qlxMissMemory(Event *event);
-
-// Whether it is.
-bool qlxMissedMemory(const Event *event);
 
 // Sets a property as QlxSetEventProp() does, in a cached block where there is one.
 // The event is settled. It is its status when memory ran out.
-void qlxStampEvent(Event *event, const char *key, std::string_view value);
-void qlxStampEventInt(Event *event, const char *key, int32_t value);
+void qlxStampEvent(Event *event, EventKey key, std::string_view value);
+void qlxStampEventInt(Event *event, EventKey key, int32_t value);
 
 // Sets the message identifier, of an event that has none, in the same way. For want of memory it
 // stays without one.

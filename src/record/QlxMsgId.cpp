@@ -7,7 +7,8 @@
 #include <qlx/event.h>
 #include <qlx/memory.h>
 
-#include "QlxFormatted.h"
+#include "QlxBoundText.h"
+#include "QlxEvent.h"
 #include "QlxLoggedEvent.h"
 #include "util/CxOwned.h"
 
@@ -52,7 +53,8 @@ char *qlxPDXMLUGetMessageID(const UChar *text) {
 
 void qlxPDXMLUFormatterCacheMessageID(QlxObject *, Event *event, va_list *args) {
   if (!event || event->messageId) return;
-  const BoundText text{event, args};
+  BoundText bound;
+  const MessageId id = qlxMessageIdOfText(bound.bind(event, args));
   if (event->message && event->message->error == U_MEMORY_ALLOCATION_ERROR) qlxMissMemory(event);
-  qlxStampEventMessageId(event, qlxMessageIdOfText(text.get()).text);
+  qlxStampEventMessageId(event, id.text);
 }

@@ -1,37 +1,16 @@
 // The elements of an XML record that are made of an event's properties and of its message's bundle.
 // Deliberate: nothing is escaped, values stand as they are.
-#include "QlxPDXMLFormatter.h"
+#include "QlxPDXMLElements.h"
 
 #include <algorithm>
-#include <iterator>
 
 #include <qlx/event.h>
 
-#include "text/QlxFormatCache.h"
+#include "QlxLevel.h"
+#include "text/QlxBundleCache.h"
 #include "text/QlxPatternTypes.h"
 
 using namespace std::string_view_literals;
-
-// ---- Words
-
-namespace {
-
-struct LevelWord {
-  int32_t level;
-  std::string_view word;
-};
-
-constexpr LevelWord kLevelWords[] = {
-    {DEBUG_MAX, "MAX"}, {DEBUG_MID, "MID"}, {DEBUG_MIN, "MIN"}, {INFO, "INFO"},
-    {WARN, "WARN"},     {ERROR, "ERROR"},   {FATAL, "ERROR"},  // Deliberate: no word of its own
-};
-
-}  // namespace
-
-void qlxPDXMLAppendLevel(RecordText &out, int32_t level) {
-  const auto *row = std::ranges::find(kLevelWords, level, &LevelWord::level);
-  out << (row != std::end(kLevelWords) ? row->word : "OTHER"sv);
-}
 
 // ---- Product and source
 
@@ -137,7 +116,7 @@ void qlxPDXMLAppendTranslation(RecordText &out, const Event *event, const char *
 
 void qlxPDXMLEmitULevel(CxUStringBuff *record, int32_t level) {
   RecordText out(record);
-  qlxPDXMLAppendLevel(out, level);
+  out << qlxLevelWord(level);
 }
 
 void qlxPDXMLEmitUProductInfo(CxUStringBuff *record, Event *event, uint8_t component,

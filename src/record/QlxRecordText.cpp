@@ -1,13 +1,22 @@
 #include "QlxRecordText.h"
 
-#include "QlxFormatted.h"
-#include "QlxLoggedEvent.h"
+#include "QlxBoundText.h"
+#include "QlxEvent.h"
+#include "QlxI18Msg.h"
 
 RecordText &RecordText::number(QlxCachedNumber format, double number) {
   if (!line_) return by(qlxAppendCachedNumber, format, number);
-  CachedBuffer text;
-  if (!qlxAppendCachedNumber(text.get(), format, number)) return toLine(false);
-  return *this << std::u16string_view{text.get()->data, text.get()->length};
+  CachedBuffer digits;
+  if (!qlxAppendCachedNumber(digits.get(), format, number)) return toLine(false);
+  return *this << digits.text();
+}
+
+// A message that cannot be bound is empty; the message tells why.
+RecordText &RecordText::message(Event *event, va_list *args) {
+  if (line_) return *this << BoundText().bind(event, args);
+  qlxUseEventLocale(event);
+  if (text_ && !isLost(text_)) qlxIntlBindI18MsgTo(event->message, args, text_);
+  return *this;
 }
 
 bool RecordText::isWholeFor(Event *event) const {
@@ -15,7 +24,8 @@ bool RecordText::isWholeFor(Event *event) const {
   return isWhole();
 }
 
-void RecordText::lose() {
+void RecordText::losePiece() {
+  if (missing_) return qlxMissMemory(missing_);
   CxUStringBuffDiscard(text_);
   text_->capacity = 1;
 }

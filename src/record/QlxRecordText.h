@@ -1,5 +1,5 @@
-// A record that is being built is whole or nothing: when a piece cannot be appended, all that was
-// appended is dropped, and what comes later is not appended any more.
+// A record on its way to a handler: as UTF-16, or straight as bytes while all of it is ASCII. What
+// formatters write looks the same either way.
 #ifndef QLX_SRC_QLXRECORDTEXT_H
 #define QLX_SRC_QLXRECORDTEXT_H
 
@@ -8,19 +8,25 @@
 
 #include <qlx/buffers.h>
 
-#include "text/QlxFormatCache.h"
+#include "text/QlxDateCache.h"
+#include "text/QlxNumberCache.h"
 #include "util/CxAsciiLine.h"
 #include "util/CxDecimal.h"
 #include "util/CxUStringBuff.h"
 
 // Appends to what it does not own: to a buffer, which runs out of memory, or to a line of bytes,
-// which ends at a piece that is not ASCII or does not fit. A buffer itself remembers a loss, so
-// that several of these, one after the other, build one record; CxUStringBuffTakeUStr() gives null
-// then.
+// which ends at a piece that is not ASCII or does not fit.
+//
+// A record is whole or nothing: when a piece cannot be appended, all that was appended is dropped,
+// and what comes later is not appended any more. A buffer itself remembers a loss, so that several
+// of these, one after the other, build one record; CxUStringBuffTakeUStr() gives null then.
 class RecordText {
  public:
   explicit RecordText(CxUStringBuff *text) : text_(text) {}  // null: nothing is appended
   explicit RecordText(CxAsciiLine *line) : line_(line) {}    // with the default code page UTF-8
+
+  // From now on a piece that a buffer has no memory for is left out, and the event tells of it.
+  void leaveOutFor(Event *event) { missing_ = event; }
 
   // Words of the record's own, in ASCII.
   RecordText &operator<<(std::string_view words) {
@@ -47,20 +53,24 @@ class RecordText {
   RecordText &number(int32_t value) { return number(static_cast<uint64_t>(int64_t{value})); }
   RecordText &number(QlxCachedNumber format, double number);
 
-  RecordText &date(const char *pattern, double time) {
-    if (line_) return toLine(qlxAppendCachedDateAscii(line_, pattern, time));
-    return by(qlxAppendCachedDate, pattern, time);
+  RecordText &date(const DateStyle &style, double time) {
+    if (line_) return toLine(qlxAppendCachedDateAscii(line_, style, time));
+    return by(qlxAppendCachedDate, style, time);
   }
 
-  bool isWhole() const { return line_ ? !isLost_ : text_ && text_->data; }
+  // The event's message, bound by the library's own binder.
+  RecordText &message(Event *event, va_list *args);
 
-  // The same; the event tells when memory ran out.
+  bool isWhole() const { return line_ ? !isLost_ : text_ && text_->data; }
+  bool isEmpty() const { return line_ ? line_->length() == 0 : !text_ || text_->length == 0; }
+
+  // Whether it is whole; the event tells when memory ran out.
   bool isWholeFor(Event *event) const;
 
  private:
   // Room without a block is what no buffer has otherwise.
   static bool isLost(const CxUStringBuff *text) { return !text->data && text->capacity > 0; }
-  void lose();
+  void losePiece();
 
   RecordText &toLine(bool appended) {
     isLost_ |= !appended;
@@ -69,13 +79,14 @@ class RecordText {
   // Appends with a function that answers 0 when memory ran out.
   template <typename... Args>
   RecordText &by(uint8_t (*append)(CxUStringBuff *, Args...), std::type_identity_t<Args>... args) {
-    if (text_ && !isLost(text_) && !append(text_, args...)) lose();
+    if (text_ && !isLost(text_) && !append(text_, args...)) losePiece();
     return *this;
   }
 
   CxUStringBuff *text_ = nullptr;
   CxAsciiLine *line_ = nullptr;
-  bool isLost_ = false;  // of a line
+  bool isLost_ = false;       // of a line
+  Event *missing_ = nullptr;  // told of pieces that are left out; null: none may be
 };
 
 #endif

@@ -1,7 +1,7 @@
 // Resource bundles, cached by name and locale, and by the default locale, in which ICU looks for
 // them when it has no bundle of the locale. ICU keeps what it has loaded anyway, also when its data
 // directory is another one by now; cached is the handle.
-#include "QlxFormatCache.h"
+#include "QlxBundleCache.h"
 
 #include <algorithm>
 #include <array>
@@ -12,7 +12,9 @@
 
 #include <qlx/memory.h>
 
-#include "QlxPatternTypes.h"
+#include "QlxFormatCache.h"
+#include "QlxMessageCache.h"
+#include "util/CxHash.h"
 #include "util/CxOwned.h"
 #include "util/CxUnits.h"
 
@@ -45,6 +47,7 @@ static constexpr int kMaxCachedBundles = 16;
 
 static CachedBundle gBundles[kMaxCachedBundles];
 static uint64_t gUses;
+static CxLook gLook;
 
 static void freeTexts(BundleKey &key) {
   for (auto text : kKeyTexts) OslMemoryFree(const_cast<char *>(key.*text));
@@ -56,10 +59,12 @@ static void drop(CachedBundle &cached) {
   cached = {};
 }
 
-void qlxDropCachedBundles(void) {
+static void dropAll() {
   for (CachedBundle &cached : gBundles)
     if (cached.bundle) drop(cached);
 }
+
+static const CachedFormats gThese{dropAll, CachedFormats::kClose};
 
 static bool isSame(const BundleKey &a, const BundleKey &b) {
   return std::ranges::all_of(kKeyTexts, [&](auto text) { return qlxSameText(a.*text, b.*text); });
@@ -104,13 +109,8 @@ static void store(const BundleKey &key, icu::LocalUResourceBundlePointer &bundle
 
 // The place of a key's pattern; null: the key is too long for one.
 static BundlePattern *placeOf(CachedBundle *cached, const char *key) {
-  uint32_t hash = 2166136261U;  // FNV-1a
-  size_t length = 0;
-  for (; key[length] != 0; ++length) {
-    if (length + 1 == sizeof BundlePattern::key) return nullptr;
-    hash = (hash ^ static_cast<uint8_t>(key[length])) * 16777619U;
-  }
-  return &cached->patterns[hash % cached->patterns.size()];
+  if (std::strlen(key) >= sizeof BundlePattern::key) return nullptr;
+  return &cached->patterns[cxHashText(key) % cached->patterns.size()];
 }
 
 // The text ends at its first zero, where it has one.
@@ -137,14 +137,17 @@ static BundlePattern *patternOf(CachedBundle *cached, const char *key, BundlePat
 // Calls use(pattern) when there is one.
 template <typename Use>
 static void withPattern(const MessageName &message, UErrorCode *status, Use use) {
-  const BundleKey key{message.bundle, message.locale, qlxCheckCachedLocale()};
+  qlxCheckDefaults(kLocaleOnly, &gLook);
+  BundleKey key{message.bundle, message.locale, qlxDefaultLocale()};
   BundlePattern room{};
   if (CachedBundle *cached = find(key)) {
     cached->lastUse = ++gUses;
     if (BundlePattern *pattern = patternOf(cached, message.key, &room, status)) use(*pattern);
     return;
   }
-  // ICU looks in the default locale when there is no bundle of the other.
+  // ICU looks in the default locale when there is no bundle of the other. Its name is that of this
+  // moment: ICU, asked for no locale, would take the one of a moment later.
+  key.defaultLocale = uloc_getDefault();
   if (!qlxIsGoodLocale(key.defaultLocale)) *status = U_ILLEGAL_ARGUMENT_ERROR;
   if (U_FAILURE(*status)) return;
   const char *locale = key.locale ? key.locale : key.defaultLocale;
@@ -160,7 +163,7 @@ uint32_t qlxAppendBundleMessage(CxUStringBuff *text, const MessageName &message,
   const FormatCacheLock lock;
   uint32_t appended = 0;
   withPattern(message, status, [&](BundlePattern &pattern) {
-    appended = qlxAppendCachedMessageAt(text, &pattern.message, message.locale, pattern.text, args,
+    appended = qlxAppendCachedMessageAt(&pattern.message, text, message.locale, pattern.text, args,
                                         status);
   });
   return appended;

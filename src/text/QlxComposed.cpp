@@ -84,28 +84,27 @@ class Parser {
   }
 
   // The parts of an argument: its start, number, and, for a simple one, type and style.
-  ComposedType typeAt(int32_t start) const {
+  ArgType typeAt(int32_t start) const {
     const int32_t parts = parts_.getLimitPartIndex(start) - start;
     if (parts == 2 && parts_.getPart(start).getArgType() == UMSGPAT_ARG_TYPE_NONE) {
-      return ComposedType::kText;
+      return ArgType::kString;
     }
     if (parts < 3 || !is(start + 2, UMSGPAT_PART_TYPE_ARG_TYPE, u"number")) {
-      return ComposedType::kNone;
+      return ArgType::kNone;
     }
-    if (parts == 3) return ComposedType::kDouble;
+    if (parts == 3) return ArgType::kDouble;
     const bool integer = parts == 4 && is(start + 3, UMSGPAT_PART_TYPE_ARG_STYLE, u"integer");
-    return integer ? ComposedType::kInteger : ComposedType::kNone;
+    return integer ? ArgType::kInteger : ArgType::kNone;
   }
 
   bool addArgument(int32_t start) {
     const Part &number = parts_.getPart(start + 1);
-    const ComposedType type = typeAt(start);
-    if (type == ComposedType::kNone || number.getType() != UMSGPAT_PART_TYPE_ARG_NUMBER)
-      return false;
+    const ArgType type = typeAt(start);
+    if (type == ArgType::kNone || number.getType() != UMSGPAT_PART_TYPE_ARG_NUMBER) return false;
     const int32_t index = number.getValue();
     if (index >= kMaxComposedArguments) return false;
-    ComposedType &known = out_->types[index];
-    if (known != ComposedType::kNone && known != type) return false;
+    ArgType &known = out_->types[index];
+    if (known != ArgType::kNone && known != type) return false;
     known = type;
     ComposedPiece *piece = newPiece();
     if (piece) *piece = {nullptr, index, nullptr};
@@ -114,10 +113,10 @@ class Parser {
 
   bool hasAllArguments() {
     int32_t count = 0;
-    while (count < kMaxComposedArguments && out_->types[count] != ComposedType::kNone) ++count;
+    while (count < kMaxComposedArguments && out_->types[count] != ArgType::kNone) ++count;
     out_->argumentCount = count;
     for (; count < kMaxComposedArguments; ++count)
-      if (out_->types[count] != ComposedType::kNone) return false;
+      if (out_->types[count] != ArgType::kNone) return false;
     return true;
   }
 
@@ -139,15 +138,16 @@ bool takeFormats(QlxComposed *composed, const UMessageFormat *message) {
     if (piece.text) continue;
     if (next == count) return false;
     const icu::Format *format = formats[next++];
-    const bool isText = composed->types[piece.length] == ComposedType::kText;
+    const bool isText = composed->types[piece.length] == ArgType::kString;
     if (isText == (format != nullptr)) return false;
     piece.format = static_cast<const icu::NumberFormat *>(format);
   }
   return next == count;
 }
 
-ShapedNumber shapedType(ComposedType type) {
-  return type == ComposedType::kInteger ? ShapedNumber::kInteger : ShapedNumber::kDouble;
+// The place of a type of numbers among the shapes.
+size_t shapeOf(ArgType type) {
+  return type == ArgType::kInteger ? 0 : 1;
 }
 
 void takeShapes(QlxComposed *composed) {
@@ -155,8 +155,8 @@ void takeShapes(QlxComposed *composed) {
   for (int32_t i = 0; i < composed->pieceCount; ++i) {
     const ComposedPiece &piece = composed->pieces[i];
     if (!piece.format) continue;
-    const ShapedNumber type = shapedType(composed->types[piece.length]);
-    const auto place = static_cast<size_t>(type);
+    const ArgType type = composed->types[piece.length];
+    const size_t place = shapeOf(type);
     if (std::exchange(isTried[place], true)) continue;
     composed->isShaped[place] = qlxTakeNumberShape(&composed->shapes[place], piece.format, type);
   }
@@ -179,11 +179,11 @@ static bool readArguments(const QlxComposed *composed, va_list *args, Arguments 
   bool whole = true;
   for (int32_t i = 0; i < composed->argumentCount; ++i) {
     Argument &value = (*values)[static_cast<size_t>(i)];
-    if (composed->types[i] == ComposedType::kText) {
+    if (composed->types[i] == ArgType::kString) {
       value.text = va_arg(copy, const UChar *);
       whole = whole && value.text;
       value.length = value.text ? static_cast<uint32_t>(cxUnitsLength(value.text)) : 0;
-    } else if (composed->types[i] == ComposedType::kInteger) {
+    } else if (composed->types[i] == ArgType::kInteger) {
       value.integer = va_arg(copy, int32_t);
     } else {
       value.number = va_arg(copy, double);
@@ -228,25 +228,25 @@ class Composer {
   bool append(const ComposedPiece &piece) {
     if (piece.text) return appendUnits(piece.text, static_cast<uint32_t>(piece.length));
     const Argument &value = values_[static_cast<size_t>(piece.length)];
-    const ComposedType type = composed_.types[piece.length];
-    if (type == ComposedType::kText) return appendUnits(value.text, value.length);
+    const ArgType type = composed_.types[piece.length];
+    if (type == ArgType::kString) return appendUnits(value.text, value.length);
     return appendShaped(type, value) || appendFormatted(type, value, *piece.format);
   }
 
-  bool appendShaped(ComposedType type, const Argument &value) {
-    const auto place = static_cast<size_t>(shapedType(type));
+  bool appendShaped(ArgType type, const Argument &value) {
+    const size_t place = shapeOf(type);
     if (!composed_.isShaped[place] || !reserve(kMaxShapedUnits)) return false;
     const NumberShape &shape = composed_.shapes[place];
-    const UChar *behind = type == ComposedType::kInteger
+    const UChar *behind = type == ArgType::kInteger
                               ? qlxWriteShapedInteger(shape, value.integer, end())
                               : qlxWriteShapedDouble(shape, value.number, end());
     if (behind) text_->length = static_cast<uint32_t>(behind - text_->data);
     return behind;
   }
 
-  bool appendFormatted(ComposedType type, const Argument &value, const icu::NumberFormat &format) {
+  bool appendFormatted(ArgType type, const Argument &value, const icu::NumberFormat &format) {
     icu::UnicodeString number;
-    if (type == ComposedType::kInteger)
+    if (type == ArgType::kInteger)
       format.format(value.integer, number);
     else
       format.format(value.number, number);

@@ -17,8 +17,6 @@
 inline constexpr int32_t kMaxComposedPieces = 24;
 inline constexpr int32_t kMaxComposedArguments = 10;
 
-enum class ComposedType : uint8_t { kNone, kText, kInteger, kDouble };
-
 struct ComposedPiece {
   const UChar *text;                // a literal; null: an argument
   int32_t length;                   // of the literal, or the argument's number
@@ -29,9 +27,9 @@ struct QlxComposed {
   int32_t pieceCount;
   int32_t argumentCount;
   ComposedPiece pieces[kMaxComposedPieces];
-  ComposedType types[kMaxComposedArguments];
-  bool isShaped[2];       // by ShapedNumber; false: the formatters write the numbers
-  NumberShape shapes[2];  // by ShapedNumber; formatters of one type are all made alike
+  ArgType types[kMaxComposedArguments];
+  bool isShaped[2];       // of integers and of doubles; false: the formatters write the numbers
+  NumberShape shapes[2];  // the same; formatters of one type are all made alike
 };
 
 // Takes a pattern apart that `message` was made of; both outlive the result. False when the pattern

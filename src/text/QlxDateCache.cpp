@@ -1,5 +1,4 @@
-// Date formats, cached by pattern, each with the text of the last second it was asked for.
-#include "QlxFormatCache.h"
+#include "QlxDateCache.h"
 
 #include <algorithm>
 #include <array>
@@ -12,12 +11,12 @@
 #include <unicode/ucal.h>
 #include <unicode/uchar.h>
 #include <unicode/udat.h>
-#include <unicode/uloc.h>
 #include <unicode/ustring.h>
 
 #include <qlx/memory.h>
 #include <qlx/ustring.h>
 
+#include "QlxFormatCache.h"
 #include "util/CxOwned.h"
 #include "util/CxUnits.h"
 
@@ -26,7 +25,7 @@ static constexpr int32_t kMillisDigits = 3;
 
 struct CachedDate {
   UDateFormat *format;  // null: a free place, all zero
-  char *pattern;        // owned; null is the default pattern, which the offset from UTC follows
+  DateStyle style;      // with a copy of the pattern, owned; the offset from UTC follows a null one
   uint64_t lastUse;     // larger is later
   bool varies;          // texts of one second differ in more than three digits: none is kept
 
@@ -48,47 +47,66 @@ struct Moment {
 static CachedDate gDates[kMaxCachedDates];
 static UCalendar *gCalendar;  // null: not opened
 static uint64_t gUses;
+static CxLook gLook;
 
 static void drop(CachedDate &cached) {
   udat_close(cached.format);
-  OslMemoryFree(cached.pattern);
+  OslMemoryFree(const_cast<char *>(cached.style.pattern));
   CxUStringBuffDiscard(&cached.text);
   cached = {};
 }
 
-void qlxDropCachedDates(void) {
+static void dropAll() {
   for (CachedDate &cached : gDates)
     if (cached.format) drop(cached);
   ucal_close(std::exchange(gCalendar, nullptr));
 }
 
-static UDateFormat *openDate(const char *pattern, const char *locale, UErrorCode *status) {
-  const OwnedUStr own{CxUStringDupStrToUChar(pattern)};
-  if (pattern && !own) *status = U_MEMORY_ALLOCATION_ERROR;
-  return udat_open(UDAT_PATTERN, UDAT_PATTERN, qlxGoodLocale(locale), nullptr, -1,
-                   pattern ? own.get() : kDefaultPattern, -1, status);
+static const CachedFormats gThese{dropAll, CachedFormats::kDefaultsChange};
+
+static UDateFormat *openDate(const DateStyle &style, UErrorCode *status) {
+  const OwnedUStr pattern{CxUStringDupStrToUChar(style.pattern)};
+  if (style.pattern && !pattern) *status = U_MEMORY_ALLOCATION_ERROR;
+  return udat_open(UDAT_PATTERN, UDAT_PATTERN, qlxGoodLocale(qlxDefaultLocale()), nullptr, -1,
+                   pattern ? pattern.get() : kDefaultPattern, -1, status);
 }
 
-// Finds or opens the format of a pattern; null, with the reason, when that fails.
-static CachedDate *fetch(const char *pattern, const char *locale, UErrorCode *status) {
+static CachedDate *find(const DateStyle &style) {
   for (CachedDate &cached : gDates)
-    if (cached.format && qlxSameText(cached.pattern, pattern)) return &cached;
-  icu::LocalUDateFormatPointer format{openDate(pattern, locale, status)};
-  OwnedStr copy{OslStringDup(pattern)};
-  if (pattern && !copy) *status = U_MEMORY_ALLOCATION_ERROR;
+    if (cached.format && qlxSameText(cached.style.pattern, style.pattern)) return &cached;
+  return nullptr;
+}
+
+// Opens a format under the defaults of this moment; null, with the reason, when that fails.
+static CachedDate *add(const DateStyle &style, UErrorCode *status) {
+  qlxCheckDefaults(kEveryDefault, nullptr);
+  icu::LocalUDateFormatPointer format{openDate(style, status)};
+  OwnedStr pattern{OslStringDup(style.pattern)};
+  if (style.pattern && !pattern) *status = U_MEMORY_ALLOCATION_ERROR;
   if (U_FAILURE(*status)) return nullptr;
   CachedDate &place = *std::ranges::min_element(gDates, {}, &CachedDate::lastUse);
   drop(place);
   place.format = format.orphan();
-  place.pattern = copy.release();
+  place.style = {pattern.release()};
   return &place;
 }
 
+// The format of a style, found or opened.
+static CachedDate *fetch(const DateStyle &style, UErrorCode *status) {
+  qlxCheckDefaults(kEveryDefault, &gLook);
+  CachedDate *cached = find(style);
+  if (!cached) cached = add(style, status);
+  if (cached) cached->lastUse = ++gUses;
+  return cached;
+}
+
+// ---- The zone's clock
+
 // In the zone that was checked: the default one may be another by now.
 static UCalendar *openCalendar(UErrorCode *status) {
-  const char *locale = qlxGoodLocale(uloc_getDefault());
+  const char *locale = qlxGoodLocale(qlxDefaultLocale());
   UCalendar *calendar = ucal_open(nullptr, -1, locale, UCAL_TRADITIONAL, status);
-  const icu::TimeZone *zone = qlxCachedZone();
+  const icu::TimeZone *zone = qlxDefaultZone();
   if (calendar && zone) reinterpret_cast<icu::Calendar *>(calendar)->setTimeZone(*zone);
   return calendar;
 }
@@ -154,7 +172,7 @@ static uint8_t appendDate(CxUStringBuff *text, const CachedDate &cached, double 
                   : udat_format(format, time, room, units, nullptr, answer);
   });
   if (*status == U_MEMORY_ALLOCATION_ERROR) return 0;
-  return cached.pattern ? 1 : appendOffset(text, offsetAt(time));
+  return cached.style.pattern ? 1 : appendOffset(text, offsetAt(time));
 }
 
 // Three times the zero of a script's decimal digits, behind which the other nine stand in order.
@@ -204,12 +222,19 @@ static bool keep(CachedDate &cached, int64_t second) {
   return true;
 }
 
+// Writes the milliseconds over the zeros of the cached text's copy.
+template <typename Unit>
+static void addMillis(Unit *text, const CachedDate &cached, int32_t millis) {
+  if (cached.fraction < 0) return;
+  for (int32_t at = cached.fraction + kMillisDigits; millis > 0; millis /= 10) {
+    --at;
+    text[at] = static_cast<Unit>(text[at] + millis % 10);
+  }
+}
+
 static uint8_t appendCached(CxUStringBuff *text, const CachedDate &cached, int32_t millis) {
   if (!CxUStringBuffAppendUStr(text, cached.text.data)) return 0;
-  if (cached.fraction < 0) return 1;
-  UChar *digits = text->data + text->length - cached.text.length + cached.fraction;
-  for (int32_t at = kMillisDigits - 1; at >= 0; --at, millis /= 10)
-    digits[at] = static_cast<UChar>(digits[at] + millis % 10);
+  addMillis(text->data + text->length - cached.text.length, cached, millis);
   return 1;
 }
 
@@ -230,33 +255,20 @@ static uint8_t appendBy(CachedDate &cached, CxUStringBuff *text, double time) {
   return appendDate(text, cached, time, nullptr, &status);
 }
 
-// The place of a pattern under the defaults of this moment; null, with the reason, when there is
-// none.
-static CachedDate *fetchCurrent(const char *pattern, UErrorCode *status) {
-  const char *locale = qlxCheckCachedLocale();
-  qlxCheckCachedZone();
-  if (pattern) qlxCheckCachedCodePage();
-  CachedDate *cached = fetch(pattern, locale, status);
-  if (cached) cached->lastUse = ++gUses;
-  return cached;
-}
-
-uint8_t qlxAppendCachedDate(CxUStringBuff *text, const char *pattern, double time) {
+uint8_t qlxAppendCachedDate(CxUStringBuff *text, const DateStyle &style, double time) {
   const FormatCacheLock lock;
   UErrorCode status = U_ZERO_ERROR;
-  CachedDate *cached = fetchCurrent(pattern, &status);
+  CachedDate *cached = fetch(style, &status);
   return cached ? appendBy(*cached, text, time) : status != U_MEMORY_ALLOCATION_ERROR;
 }
 
-bool qlxAppendCachedDateAscii(CxAsciiLine *line, const char *pattern, double time) {
+bool qlxAppendCachedDateAscii(CxAsciiLine *line, const DateStyle &style, double time) {
   const FormatCacheLock lock;
   UErrorCode status = U_ZERO_ERROR;
-  CachedDate *cached = fetchCurrent(pattern, &status);
+  CachedDate *cached = fetch(style, &status);
   const std::optional<Moment> moment = cached ? momentOf(time) : std::nullopt;
   if (!moment || !keep(*cached, moment->second) || cached->asciiLength == 0) return false;
   std::array<char, 64> text = cached->ascii;
-  int32_t millis = moment->millis;
-  for (int32_t at = kMillisDigits - 1; cached->fraction >= 0 && at >= 0; --at, millis /= 10)
-    text[static_cast<size_t>(cached->fraction + at)] = static_cast<char>('0' + millis % 10);
+  addMillis(text.data(), *cached, moment->millis);
   return line->append({text.data(), cached->asciiLength});
 }

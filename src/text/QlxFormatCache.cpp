@@ -4,43 +4,116 @@
 
 #include <algorithm>
 #include <array>
-#include <cstring>
 #include <string_view>
+#include <utility>
 
 #include <unicode/localpointer.h>
 #include <unicode/locid.h>
 #include <unicode/ucnv.h>
 #include <unicode/uloc.h>
 
+#include "util/CxHooks.h"
 #include "util/CxThread.h"
+
+// ---- The lock
 
 static pthread_mutex_t gLock = PTHREAD_MUTEX_INITIALIZER;
 static CxCancellation gCancellation;  // of the thread that holds gLock, as it was before
 
-// What the cached formats were made under. A name that does not fit is kept cut, and so never found
-// the same: nothing is then cached for longer than a call.
+static void takeLock() {
+  const CxCancellation before = cxThreadDisableCancel();
+  pthread_mutex_lock(&gLock);
+  gCancellation = before;
+}
+
+static void giveLockBack() {
+  const CxCancellation before = gCancellation;
+  pthread_mutex_unlock(&gLock);
+  cxThreadRestoreCancel(before);
+}
+
+FormatCacheLock::FormatCacheLock() {
+  takeLock();
+}
+
+FormatCacheLock::~FormatCacheLock() {
+  giveLockBack();
+}
+
+static const CxHooks gHooks{{
+    .beforeFork = takeLock,
+    .afterFork = [](bool) { giveLockBack(); },
+    .atClose = qlxDropCachedFormats,
+}};
+
+// ---- The caches
+
+static constinit const CachedFormats *gFirst = nullptr;
+
+CachedFormats::CachedFormats(void (*drop)(), Until until)
+    : drop_(drop), until_(until), next_(std::exchange(gFirst, this)) {}
+
+void CachedFormats::dropAll(Until until) {
+  for (const CachedFormats *it = gFirst; it; it = it->next_)
+    if (it->until_ <= until) it->drop_();
+}
+
+// ---- The defaults
+
+// A name that does not fit is stored cut, and so never found the same: nothing is then cached for
+// longer than a call.
 static std::array<char, 256> gLocale;
 static std::array<char, 64> gCodePage;
 static icu::TimeZone *gZone;  // owned; null: not known
 
-static void dropAll() {
-  qlxDropCachedMessages();
-  qlxDropCachedDates();
-  qlxDropCachedNumbers();
-}
-
 template <size_t size>
 static void check(std::array<char, size> &known, const char *name) {
   if (std::strcmp(known.data(), name) == 0) return;
-  dropAll();
+  CachedFormats::dropAll(CachedFormats::kDefaultsChange);
   std::strncpy(known.data(), name, size - 1);
 }
 
-const char *qlxCheckCachedLocale(void) {
-  const char *name = uloc_getDefault();
-  check(gLocale, name);
-  return name;
+static bool isCut() {
+  return gLocale[gLocale.size() - 2] != '\0';
 }
+
+// Zones of one name may differ: a host may make them, and one that ICU does not know has the name
+// that the system gives it.
+static void checkZone() {
+  icu::LocalPointer<icu::TimeZone> zone{icu::TimeZone::createDefault()};
+  if (gZone && zone.isValid() && *zone == *gZone) return;
+  CachedFormats::dropAll(CachedFormats::kDefaultsChange);
+  delete gZone;
+  gZone = zone.orphan();
+}
+
+static bool isKnown(QlxDefaults which) {
+  const bool isLocaleKnown = gLocale[0] != '\0' && !isCut();
+  return (which == kZoneOnly || isLocaleKnown) && (which == kLocaleOnly || gZone);
+}
+
+void qlxCheckDefaults(QlxDefaults which, CxLook *look) {
+  if (look && isKnown(which) && !cxLookAgain(look)) return;
+  if (which != kZoneOnly) check(gLocale, uloc_getDefault());
+  if (which != kLocaleOnly) checkZone();
+  if (which == kEveryDefault) check(gCodePage, ucnv_getDefaultName());
+}
+
+const char *qlxDefaultLocale(void) {
+  return isCut() ? uloc_getDefault() : gLocale.data();
+}
+
+const icu::TimeZone *qlxDefaultZone(void) {
+  return gZone;
+}
+
+void qlxDropCachedFormats(void) {
+  const FormatCacheLock lock;
+  CachedFormats::dropAll(CachedFormats::kClose);
+  delete std::exchange(gZone, nullptr);
+}
+
+// ---- Names of locales
 
 // The parser itself minds the capacities of the language, the script, the country and each key.
 bool qlxIsGoodLocale(const char *name) {
@@ -53,42 +126,4 @@ bool qlxIsGoodLocale(const char *name) {
 
 const char *qlxGoodLocale(const char *name) {
   return qlxIsGoodLocale(name) ? name : "";
-}
-
-void qlxCheckCachedCodePage(void) {
-  check(gCodePage, ucnv_getDefaultName());
-}
-
-// Zones of one name may differ: a host may make them, and one that ICU does not know has the name
-// that the system gives it.
-void qlxCheckCachedZone(void) {
-  icu::LocalPointer<icu::TimeZone> zone{icu::TimeZone::createDefault()};
-  if (gZone && zone.isValid() && *zone == *gZone) return;
-  dropAll();
-  delete gZone;
-  gZone = zone.orphan();
-}
-
-const icu::TimeZone *qlxCachedZone(void) {
-  return gZone;
-}
-
-void qlxDropCachedFormats(void) {
-  const FormatCacheLock lock;
-  dropAll();
-  qlxDropCachedBundles();
-  delete gZone;
-  gZone = nullptr;
-}
-
-void qlxFormatCacheLock(void) {
-  const CxCancellation before = cxThreadDisableCancel();
-  pthread_mutex_lock(&gLock);
-  gCancellation = before;
-}
-
-void qlxFormatCacheUnlock(void) {
-  const CxCancellation before = gCancellation;
-  pthread_mutex_unlock(&gLock);
-  cxThreadRestoreCancel(before);
 }

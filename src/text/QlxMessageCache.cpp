@@ -1,5 +1,4 @@
-// Parsed message patterns, cached by pattern and locale.
-#include "QlxFormatCache.h"
+#include "QlxMessageCache.h"
 
 #include <algorithm>
 #include <array>
@@ -16,14 +15,16 @@
 #include <qlx/ustring.h>
 
 #include "QlxComposed.h"
+#include "QlxFormatCache.h"
 #include "QlxPatternNesting.h"
+#include "util/CxHash.h"
 #include "util/CxOwned.h"
 #include "util/CxUnits.h"
 
 struct PatternKey {
   const char *locale;  // null is the default locale, and not the same as ""
   std::u16string_view pattern;
-  uint32_t tag;  // of the pattern
+  uint32_t tag;  // cxHashEnds() of the pattern
 };
 
 enum class Composing : uint8_t { kUntried, kLeftToIcu, kDone };
@@ -41,6 +42,7 @@ struct CachedMessage {
 static CachedMessage gMessages[kMaxCachedMessages];
 static std::array<MessagePlace, kMaxCachedMessages> gLatest;  // by tag: the callers' patterns
 static uint64_t gUses;
+static CxLook gLocaleLook, gZoneLook;
 
 // Missing arguments read as zeros up to this many.
 static constexpr int32_t kMaxZeroArgs = 64;
@@ -52,30 +54,12 @@ static void drop(CachedMessage &cached) {
   cached = {};
 }
 
-void qlxDropCachedMessages(void) {
+static void dropAll() {
   for (CachedMessage &cached : gMessages)
     if (cached.format) drop(cached);
 }
 
-// Tells most patterns apart without reading all of them: from the length and the units at both ends
-// and in the middle.
-static uint32_t tagOf(std::u16string_view pattern) {
-  constexpr uint64_t kSpread = 0x9E3779B97F4A7C15;
-  constexpr size_t kUnits = sizeof(uint64_t) / sizeof(UChar);
-  uint64_t tag = pattern.size() * kSpread;
-  const auto add = [&](uint64_t units) { tag = (tag ^ units) * kSpread; };
-  if (pattern.size() < kUnits) {
-    for (const char16_t unit : pattern) add(unit);
-  } else {
-    const size_t last = pattern.size() - kUnits;
-    for (const size_t at : {size_t{0}, last / 2, last}) {
-      uint64_t units;
-      std::memcpy(&units, pattern.data() + at, sizeof units);
-      add(units);
-    }
-  }
-  return static_cast<uint32_t>(tag >> 32);
-}
+static const CachedFormats gThese{dropAll, CachedFormats::kDefaultsChange};
 
 static bool samePattern(std::u16string_view a, std::u16string_view b) {
   return a.size() == b.size() && std::memcmp(a.data(), b.data(), a.size() * sizeof(UChar)) == 0;
@@ -95,7 +79,7 @@ static CachedMessage *find(const PatternKey &key) {
 // Whether the defaults of this moment would give the same format.
 static bool isCurrent(const CachedMessage &cached) {
   if (!cached.usesZone) return true;
-  qlxCheckCachedZone();
+  qlxCheckDefaults(kZoneOnly, &gZoneLook);
   return cached.format;
 }
 
@@ -147,9 +131,9 @@ static bool isSafe(std::u16string_view pattern, const char *locale, const char *
 // moment later.
 static icu::LocalUMessageFormatPointer open(const PatternKey &key, bool usesZone,
                                             UErrorCode *status) {
-  const char *defaultLocale = qlxCheckCachedLocale();
+  qlxCheckDefaults(usesZone ? kEveryDefault : kLocaleOnly, nullptr);
+  const char *defaultLocale = qlxDefaultLocale();
   const char *locale = key.locale ? key.locale : defaultLocale;
-  if (usesZone) qlxCheckCachedZone();
   if (!isSafe(key.pattern, locale, defaultLocale, usesZone)) *status = U_ILLEGAL_ARGUMENT_ERROR;
   return icu::LocalUMessageFormatPointer{umsg_open(
       key.pattern.data(), static_cast<int32_t>(key.pattern.size()), locale, nullptr, status)};
@@ -163,7 +147,7 @@ static void store(const PatternKey &key, bool usesZone, icu::LocalUMessageFormat
   CachedMessage &place = *std::ranges::min_element(gMessages, {}, &CachedMessage::lastUse);
   drop(place);
   place.format = format.orphan();
-  place.key = {locale.release(), {pattern.release(), key.pattern.size()}, tagOf(key.pattern)};
+  place.key = {locale.release(), {pattern.release(), key.pattern.size()}, cxHashEnds(key.pattern)};
   place.usesZone = usesZone;
   place.serial = place.lastUse = ++gUses;
 }
@@ -257,7 +241,7 @@ static uint32_t appendParsed(CxUStringBuff *text, MessagePlace *known, PatternKe
                              va_list *args, UErrorCode *status) {
   CachedMessage *cached = known->cached;
   if (!cached || cached->serial != known->serial) {
-    key.tag = tagOf(key.pattern);
+    key.tag = cxHashEnds(key.pattern);
     cached = find(key);
   }
   if (cached && isCurrent(*cached)) {
@@ -275,24 +259,24 @@ static uint32_t appendParsed(CxUStringBuff *text, MessagePlace *known, PatternKe
 
 // A message that is known has no plain pattern.
 static bool isPlain(const MessagePlace &known, std::u16string_view pattern) {
-  return !known.cached && qlxIsPlainPattern(pattern.data(), pattern.size());
+  return !known.cached && qlxIsPlainPattern(pattern);
 }
 
-uint32_t qlxAppendCachedMessageAt(CxUStringBuff *text, MessagePlace *known, const char *locale,
+uint32_t qlxAppendCachedMessageAt(MessagePlace *place, CxUStringBuff *text, const char *locale,
                                   std::u16string_view pattern, va_list *args, UErrorCode *status) {
-  if (isPlain(*known, pattern)) return appendPlain(text, pattern, status);
-  return appendParsed(text, known, {locale, pattern, 0}, args, status);
+  if (isPlain(*place, pattern)) return appendPlain(text, pattern, status);
+  return appendParsed(text, place, {locale, pattern, 0}, args, status);
 }
 
 uint32_t qlxAppendCachedMessage(CxUStringBuff *text, const char *locale, const UChar *pattern,
                                 va_list *args, UErrorCode *status) {
   const FormatCacheLock lock;
   const std::u16string_view whole{pattern, cxUnitsLength(pattern)};
-  const PatternKey key{locale, whole, tagOf(whole)};
+  const PatternKey key{locale, whole, cxHashEnds(whole)};
   MessagePlace &latest = gLatest[key.tag % gLatest.size()];
   MessagePlace known = latest.cached && isAt(*latest.cached, key) ? latest : MessagePlace{};
   if (isPlain(known, whole)) return appendPlain(text, whole, status);
-  qlxCheckCachedLocale();
+  qlxCheckDefaults(kLocaleOnly, &gLocaleLook);
   const uint32_t appended = appendParsed(text, &known, key, args, status);
   latest = known;
   return appended;

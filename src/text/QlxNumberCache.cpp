@@ -1,11 +1,11 @@
-// The two formats in which the buffers write doubles, cached for the default locale.
-#include "QlxFormatCache.h"
+#include "QlxNumberCache.h"
 
 #include <string_view>
 
 #include <unicode/decimfmt.h>
 #include <unicode/unum.h>
 
+#include "QlxFormatCache.h"
 #include "util/CxDecimal.h"
 #include "util/CxUStringBuff.h"
 
@@ -20,12 +20,15 @@ static CachedNumber gNumbers[] = {{u"#", nullptr, false}, {u"#.#####", nullptr, 
 // Beyond this not every whole number is a double.
 static constexpr double kMaxWhole = 9007199254740992.0;
 
-void qlxDropCachedNumbers(void) {
+static void dropAll() {
   for (CachedNumber &cached : gNumbers) {
     unum_close(cached.format);
     cached.format = nullptr;
   }
 }
+
+static const CachedFormats gThese{dropAll, CachedFormats::kDefaultsChange};
+static CxLook gLook;
 
 // Any digit may be another one in the locale, and any locale may put signs around them. A format of
 // another class may have a word for any one number.
@@ -53,9 +56,9 @@ static void open(CachedNumber &cached, const char *locale) {
 
 uint8_t qlxAppendCachedNumber(CxUStringBuff *text, QlxCachedNumber which, double value) {
   const FormatCacheLock lock;
-  const char *locale = qlxCheckCachedLocale();
+  qlxCheckDefaults(kLocaleOnly, &gLook);
   CachedNumber &cached = gNumbers[which];
-  if (!cached.format) open(cached, locale);
+  if (!cached.format) open(cached, qlxDefaultLocale());
   if (!cached.format) return cxUStringBuffHasCapacity(text, 0);
   if (cached.plainDigits && value >= 0 && value < kMaxWhole) {
     const auto whole = static_cast<uint64_t>(value);
@@ -69,4 +72,14 @@ uint8_t qlxAppendCachedNumber(CxUStringBuff *text, QlxCachedNumber which, double
     return unum_formatDouble(cached.format, value, room, units, nullptr, answer);
   });
   return status != U_MEMORY_ALLOCATION_ERROR;
+}
+
+// Of the buffer's family; here because they are the ones that ask ICU.
+
+uint8_t CxUStringBuffAppendUDate(CxUStringBuff *buffer, double date) {
+  return buffer ? qlxAppendCachedNumber(buffer, kCachedWhole, date) : 0;
+}
+
+uint8_t CxUStringBuffAppendUDouble(CxUStringBuff *buffer, double value) {
+  return buffer ? qlxAppendCachedNumber(buffer, kCachedFraction, value) : 0;
 }

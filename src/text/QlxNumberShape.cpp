@@ -197,8 +197,8 @@ bool writesDouble(const NumberShape &shape, const icu::NumberFormat &format, dou
   return isWritten(expected, text, end);
 }
 
-bool isProved(const NumberShape &shape, const icu::NumberFormat &format, ShapedNumber type) {
-  if (type == ShapedNumber::kInteger)
+bool isProved(const NumberShape &shape, const icu::NumberFormat &format, ArgType type) {
+  if (type == ArgType::kInteger)
     return std::ranges::all_of(kIntegers,
                                [&](int32_t value) { return writesInteger(shape, format, value); });
   return std::ranges::all_of(kDoubles,
@@ -207,7 +207,7 @@ bool isProved(const NumberShape &shape, const icu::NumberFormat &format, ShapedN
 
 }  // namespace
 
-bool qlxTakeNumberShape(NumberShape *shape, const icu::NumberFormat *format, ShapedNumber type) {
+bool qlxTakeNumberShape(NumberShape *shape, const icu::NumberFormat *format, ArgType type) {
   *shape = {};
   if (!format || format->getDynamicClassID() != DecimalFormat::getStaticClassID()) return false;
   return take(*static_cast<const DecimalFormat *>(format), shape) &&

@@ -11,6 +11,8 @@
 
 #include <qlx/base.h>
 
+#include "QlxArgType.h"
+
 struct NumberAffix {
   uint8_t length;
   std::array<UChar, 7> units;
@@ -29,10 +31,8 @@ struct NumberShape {
 // More than any number that a shape writes has.
 inline constexpr uint32_t kMaxShapedUnits = 64;
 
-enum class ShapedNumber : uint8_t { kInteger, kDouble };
-
-// Takes the shape of a format for one type of numbers; false when it has none.
-bool qlxTakeNumberShape(NumberShape *shape, const icu::NumberFormat *format, ShapedNumber type);
+// Takes the shape of a format for integers or doubles; false when it has none.
+bool qlxTakeNumberShape(NumberShape *shape, const icu::NumberFormat *format, ArgType type);
 
 // Write a number at `out`, which has room for kMaxShapedUnits, and return its end; null when it is
 // left to the format. Every integer is written.

@@ -6,7 +6,7 @@
 
 #include <qlx/base.h>
 
-enum class ArgType : uint8_t { kNone, kString, kInteger, kDouble };
+#include "QlxArgType.h"
 
 using ArgTypes = std::array<ArgType, 10>;  // by argument index
 

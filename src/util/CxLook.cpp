@@ -1,11 +1,14 @@
 #include "CxLook.h"
 
+#include <atomic>
 #include <ctime>
+
+#include "CxHooks.h"
 
 static constexpr uint32_t kFirstLooks = 1024;  // of a process: one that logs little always looks
 static constexpr uint32_t kLooksATick = 16;
 
-static uint32_t gLooks;  // up to kFirstLooks
+static std::atomic<uint32_t> gLooks;  // up to kFirstLooks, or a little more
 
 static int64_t coarseClock() {
   timespec now = {};
@@ -16,8 +19,8 @@ static int64_t coarseClock() {
 int64_t (*cxLookTick)(void) = coarseClock;
 
 bool cxLookAgain(CxLook *look) {
-  if (gLooks < kFirstLooks) {
-    ++gLooks;
+  if (gLooks.load(std::memory_order_relaxed) < kFirstLooks) {
+    gLooks.fetch_add(1, std::memory_order_relaxed);
     return true;
   }
   const int64_t tick = cxLookTick();
@@ -28,5 +31,9 @@ bool cxLookAgain(CxLook *look) {
 }
 
 void cxLookRestart(void) {
-  gLooks = 0;
+  gLooks.store(0, std::memory_order_relaxed);
 }
+
+static const CxHooks gHooks{{.afterFork = [](bool isChild) {
+  if (isChild) cxLookRestart();
+}}};

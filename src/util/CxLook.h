@@ -4,7 +4,7 @@
 // clock (some milliseconds) look; the rest of that tick's records share the last look. So a change
 // is seen by the next record at any usual rate, and within one tick in a burst.
 //
-// All functions are called with the API lock held.
+// A look has one owner at a time: who asks has the lock that guards what is looked at.
 #ifndef QLX_SRC_CXLOOK_H
 #define QLX_SRC_CXLOOK_H
 
@@ -24,7 +24,7 @@ typedef struct CxLook {
 /** True: look now, which the caller does. False: what the last look showed still counts. */
 bool cxLookAgain(CxLook *look);
 
-/** Every record looks again, as in a new process. For the child of a fork, too. */
+/** Every record looks again, as in a new process: the child of a fork begins so. */
 void cxLookRestart(void);
 
 /** The tick of the clock; tests set one of their own. */

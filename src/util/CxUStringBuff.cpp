@@ -5,7 +5,6 @@
 #include <cstring>
 #include <string_view>
 
-#include "text/QlxFormatCache.h"
 #include "CxDecimal.h"
 #include "CxOwned.h"
 #include "CxStringBuff.h"
@@ -121,14 +120,6 @@ uint8_t CxUStringBuffAppendUInt64(CxUStringBuff *buffer, uint64_t value) {
   UChar *const end = digits + kMaxDecimalDigits;
   const UChar *first = cxDecimalBefore(end, value, u'0');
   return cxUStringBuffAppendUnits(buffer, first, static_cast<uint32_t>(end - first));
-}
-
-uint8_t CxUStringBuffAppendUDate(CxUStringBuff *buffer, double date) {
-  return buffer ? qlxAppendCachedNumber(buffer, kCachedWhole, date) : 0;
-}
-
-uint8_t CxUStringBuffAppendUDouble(CxUStringBuff *buffer, double value) {
-  return buffer ? qlxAppendCachedNumber(buffer, kCachedFraction, value) : 0;
 }
 
 UChar *CxUStringBuffTakeUStr(CxUStringBuff *buffer) {

@@ -67,8 +67,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {
   if (U_FAILURE(status)) return 0;
   change(&format, &input);
   NumberShape doubles, integers;
-  const bool hasDoubles = qlxTakeNumberShape(&doubles, &format, ShapedNumber::kDouble);
-  const bool hasIntegers = qlxTakeNumberShape(&integers, &format, ShapedNumber::kInteger);
+  const bool hasDoubles = qlxTakeNumberShape(&doubles, &format, ArgType::kDouble);
+  const bool hasIntegers = qlxTakeNumberShape(&integers, &format, ArgType::kInteger);
   while (!input.isEmpty()) {
     UChar text[kMaxShapedUnits];
     const auto number = input.take<double>();

@@ -3,6 +3,8 @@
 
 #include <qlx/class/containers.h>
 
+#include "object/QlxListeners.h"
+
 #include "support/FailingMemory.h"
 #include "support/HostTest.h"
 

@@ -2,6 +2,7 @@
 // table.
 #include <gtest/gtest.h>
 
+#include <cctype>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -52,6 +53,16 @@ std::set<std::string> firstGroups(const std::string &text, const char *pattern) 
   return found;
 }
 
+// A row begins with the key as a text, or with its name in the enumeration of events' keys.
+std::set<std::string> keysOfRows(const std::string &rows) {
+  std::set<std::string> keys = firstGroups(rows, R"re(\{"(\w+)",)re");
+  for (std::string key : firstGroups(rows, R"re(\{EventKey::k(\w+),)re")) {
+    key[0] = static_cast<char>(std::tolower(key[0]));
+    keys.insert(key);
+  }
+  return keys;
+}
+
 Keys keysOfTables() {
   static const std::regex table(R"((?:ConfigKey|Stamp) (k\w+)\[\] = \{([^;]*)\};)");
   Keys keys;
@@ -59,7 +70,7 @@ Keys keysOfTables() {
     if (entry.path().extension() != ".cpp") continue;
     const std::string source = contents(entry.path());
     for (std::sregex_iterator it(source.begin(), source.end(), table), end; it != end; ++it) {
-      keys[(*it)[1]] = firstGroups((*it)[2], R"re(\{"(\w+)",)re");
+      keys[(*it)[1]] = keysOfRows((*it)[2]);
     }
   }
   return keys;

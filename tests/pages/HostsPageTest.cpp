@@ -15,13 +15,13 @@
 #include <unicode/ucal.h>
 #include <unistd.h>
 
-#include "text/QlxFormatCache.h"
 #include "support/ChainTest.h"
 #include "support/Child.h"
 #include "support/FreshProcess.h"
 #include "support/OpenToolkit.h"
 #include "support/TempDir.h"
 #include "util/CxAsciiLine.h"
+#include "text/QlxDateCache.h"
 
 namespace {
 
@@ -115,7 +115,7 @@ constexpr double kTime = 1155725335123.0;  // 2006-08-16 10:48:55.123 UTC
 
 std::string hour() {
   CxAsciiLine line;
-  EXPECT_TRUE(qlxAppendCachedDateAscii(&line, "HH", kTime));
+  EXPECT_TRUE(qlxAppendCachedDateAscii(&line, {"HH"}, kTime));
   return std::string(line.data(), line.length());
 }
 

@@ -1,4 +1,7 @@
+#include "object/QlxObjClass.h"
+#include "record/QlxCachedBuffer.h"
 #include "record/QlxFormatted.h"
+#include "record/QlxRecordText.h"
 
 #include <algorithm>
 #include <cstdarg>
@@ -119,18 +122,26 @@ class FormattedTest : public ChainTest {
     va_list args;
     va_start(args, event);
     const ApiLock lock;
-    const FormattedBytes line{handler.get(), event, &args};
+    FormattedBytes line;
+    const bool has = line.format(handler.get(), event, &args);
     va_end(args);
-    return line ? std::string(line.data(), line.length()) : kNothing;
+    return has ? std::string(line.data(), line.length()) : kNothing;
   }
   std::string wide(Event *event, ...) {
     va_list args;
     va_start(args, event);
     const ApiLock lock;
     std::string line = kNothing;
-    if (const FormattedEvent text{handler.get(), event, &args}; text) {
-      EXPECT_EQ(text.length(), std::u16string(text.text()).size());
-      line = ::take(CxUStringDupUCharToStr(text.text()));
+    CachedBuffer buffer;
+    RecordText record{buffer.get()};
+    QlxObject *formatter = handler->kind2.formatter;
+    const QlxOwnClass *own = formatter ? formatter->objClass->own : nullptr;
+    if (!own) {
+      const OwnedUStr text{qlxIntlUHandlerDoFmt(handler.get(), event, &args)};
+      if (text) line = ::take(CxUStringDupUCharToStr(text.get()));
+    } else if (own->append(formatter, event, &args, record)) {
+      EXPECT_EQ(buffer.get()->length, std::u16string(buffer.get()->data).size());
+      line = ::take(CxUStringDupUCharToStr(buffer.get()->data));
     }
     va_end(args);
     return line;
@@ -330,10 +341,11 @@ TEST_F(FormattedTest, MayBeMadeWhileAnotherIsOnItsWay) {
   set("dateTimeFormat", "'c'");
   const EventPtr outer = eventOf(u"outer \u00e4"), inner = eventOf(u"inner, and longer \u00e4");
   const ApiLock lock;
-  const FormattedEvent first{handler.get(), outer.get(), nullptr};
-  const FormattedEvent second{handler.get(), inner.get(), nullptr};
-  EXPECT_EQ(std::u16string(first.text()), u"c outer \u00e4\n");
-  EXPECT_EQ(std::u16string(second.text()), u"c inner, and longer \u00e4\n");
+  FormattedBytes first, second;
+  EXPECT_TRUE(first.format(handler.get(), outer.get(), nullptr));
+  EXPECT_TRUE(second.format(handler.get(), inner.get(), nullptr));
+  EXPECT_EQ(std::string(first.data(), first.length()), "c outer \u00e4\n");
+  EXPECT_EQ(std::string(second.data(), second.length()), "c inner, and longer \u00e4\n");
 }
 
 }  // namespace

@@ -12,6 +12,7 @@
 
 #include "record/QlxFormatted.h"
 #include "text/QlxFormatCache.h"
+#include "record/QlxCachedBuffer.h"
 #include "support/ChainTest.h"
 #include "support/Child.h"
 #include "support/EveryFailure.h"
@@ -283,10 +284,10 @@ TEST_F(LoggedEventTest, StampsAnEventWithoutAndWithTheKey) {
   debug();
   const ApiLock lock;
   Event *event = QlxVaAllocUEvent(INFO, nullptr, nullptr, u"own");
-  qlxStampEvent(event, "key", "first");
-  qlxStampEventInt(event, "number", -2147483647 - 1);
-  qlxStampEvent(event, "key", "second");
-  EXPECT_EQ(propsOf(event), "key=second|number=-2147483648|");
+  qlxStampEvent(event, EventKey::kServer, "first");
+  qlxStampEventInt(event, EventKey::kThreadId, -2147483647 - 1);
+  qlxStampEvent(event, EventKey::kServer, "second");
+  EXPECT_EQ(propsOf(event), "server=second|threadId=-2147483648|");
   QlxFreeEvent(event);
 }
 
@@ -363,7 +364,7 @@ TEST_F(LoggedEventTest, IsWholeOrWithoutWhatNoMemoryWasFor) {
     {
       const ApiLock lock;
       qlxDropCachedEvent();
-      qlxDropFormatted();
+      qlxDropCachedBuffers();
       qlxDropCachedFormats();
     }
     onNext = nullptr;

@@ -1,4 +1,3 @@
-#include "QlxPDXMLFormatter.h"
 
 #include <gtest/gtest.h>
 
@@ -15,6 +14,7 @@
 #include "support/ResourceBundles.h"
 #include "support/Take.h"
 #include "util/CxOwned.h"
+#include "record/QlxPDXMLElements.h"
 
 namespace {
 

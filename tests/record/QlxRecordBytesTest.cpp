@@ -1,4 +1,6 @@
 // XML records and trace lines on their two ways: straight as bytes, and as UTF-16 that is narrowed.
+#include "object/QlxObjClass.h"
+#include "record/QlxCachedBuffer.h"
 #include "record/QlxFormatted.h"
 
 #include <cstdarg>
@@ -19,6 +21,7 @@
 #include "support/Take.h"
 #include "util/CxOwned.h"
 #include "util/CxUString.h"
+#include "text/QlxNumberCache.h"
 
 namespace {
 
@@ -116,12 +119,15 @@ class RecordBytesTest : public ChainTest {
   }
 
   std::string bytes(Event *event, va_list *args) {
-    const FormattedBytes line{handler.get(), event, args};
-    return line ? std::string(line.data(), line.length()) : kNothing;
+    FormattedBytes line;
+    const bool has = line.format(handler.get(), event, args);
+    return has ? std::string(line.data(), line.length()) : kNothing;
   }
   std::string wide(Event *event, va_list *args) {
-    const FormattedEvent text{handler.get(), event, args};
-    return text ? ::take(CxUStringDupUCharToStr(text.text())) : kNothing;
+    CachedBuffer buffer;
+    RecordText record{buffer.get()};
+    const bool has = formatter->objClass->own->append(formatter.get(), event, args, record);
+    return has ? ::take(CxUStringDupUCharToStr(buffer.get()->data)) : kNothing;
   }
   std::string own(Event *event, va_list *args) {
     const OwnedUStr text{qlxIntlUHandlerDoFmt(handler.get(), event, args)};
@@ -133,9 +139,8 @@ class RecordBytesTest : public ChainTest {
     va_start(args, event);
     const ApiLock lock;
     CxAsciiLine line;
-    const bool xml = formatter->objClass->op1.fFormat == QlxPDXMLUFormatterFFormat;
-    const auto append = xml ? qlxPDXMLFormatterAppendAscii : qlxVexTraceFormatterAppendAscii;
-    const bool straight = append(formatter.get(), event, &args, &line);
+    RecordText record{&line};
+    const bool straight = formatter->objClass->own->append(formatter.get(), event, &args, record);
     va_end(args);
     return straight;
   }
@@ -176,7 +181,7 @@ class RecordBytesTest : public ChainTest {
     const std::string ascii = bytes(event.get(), nullptr);
     EXPECT_EQ(wide(event.get(), nullptr), ascii);
     EXPECT_NE(qlxNotedEventSource(event.get()), nullptr) << "nobody looked at the properties";
-    qlxSettleEvent(event.get());
+    qlxSettleNotedEvent();
     EXPECT_EQ(bytes(event.get(), nullptr), ascii);
     EXPECT_EQ(wide(event.get(), nullptr), ascii);
     return ascii;
@@ -306,8 +311,8 @@ TEST_F(RecordBytesTest, NeedNoMemoryOnceTheirKindWasMade) {
     const ApiLock lock;
     for (int i = 0; i < 3; ++i) bytes(event.get(), nullptr);
     FailingMemory memory;
-    const FormattedBytes line{handler.get(), event.get(), nullptr};
-    EXPECT_TRUE(line);
+    FormattedBytes line;
+    EXPECT_TRUE(line.format(handler.get(), event.get(), nullptr));
     EXPECT_EQ(memory.attempts(), 0U);
   }
 }

@@ -1,5 +1,5 @@
 // ICU's process-wide defaults for a test that changes them: locale, time zone and code page are put
-// back at its end.
+// back at its end. A change is seen by the next record, be it the thousandth of a burst.
 #ifndef QLX_TESTS_ICUDEFAULTS_H
 #define QLX_TESTS_ICUDEFAULTS_H
 
@@ -8,6 +8,8 @@
 #include <unicode/ucal.h>
 #include <unicode/ucnv.h>
 #include <unicode/uloc.h>
+
+#include "util/CxLook.h"
 
 class IcuDefaults {
  public:
@@ -27,16 +29,19 @@ class IcuDefaults {
   static bool setLocale(const char *locale) {
     UErrorCode status = U_ZERO_ERROR;
     uloc_setDefault(locale, &status);
+    cxLookRestart();
     return U_SUCCESS(status);
   }
   static bool setZone(const UChar *zone) {
     UErrorCode status = U_ZERO_ERROR;
     ucal_setDefaultTimeZone(zone, &status);
+    cxLookRestart();
     return U_SUCCESS(status);
   }
   // False when this build of ICU has UTF-8 for good.
   static bool setCodePage(const char *name) {
     ucnv_setDefaultName(name);
+    cxLookRestart();
     return ucnv_compareNames(ucnv_getDefaultName(), name) == 0;
   }
 

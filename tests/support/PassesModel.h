@@ -13,6 +13,7 @@
 
 #include "object/QlxLocked.h"
 #include "QlxObject.h"
+#include "object/QlxListeners.h"
 #include "support/Choices.h"
 #include "support/ModelToolkit.h"
 

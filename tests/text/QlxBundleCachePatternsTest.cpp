@@ -1,6 +1,8 @@
 // What is remembered of the keys of a held bundle: their patterns, and where the messages of these
 // are held, against parsing the pattern anew for every call.
 #include "text/QlxFormatCache.h"
+#include "text/QlxMessageCache.h"
+#include "text/QlxBundleCache.h"
 
 #include <gtest/gtest.h>
 

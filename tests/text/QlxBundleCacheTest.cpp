@@ -1,5 +1,7 @@
 // Patterns of held bundles against the reference: opening the bundle anew for every call.
 #include "text/QlxFormatCache.h"
+#include "text/QlxBundleCache.h"
+#include "text/QlxDateCache.h"
 
 #include <dlfcn.h>
 #include <gtest/gtest.h>
@@ -274,7 +276,7 @@ TEST_F(BundleCacheTest, IcuMayCleanUpAfterTheToolkitIsClosed) {
       EXPECT_EQ(of("hello", "de"), (Result{u"deutsch value", 0}));
       CxUStringBuff text{};
       CxUStringBuffAppendUDouble(&text, 1.5);
-      qlxAppendCachedDate(&text, nullptr, 0);
+      qlxAppendCachedDate(&text, {nullptr}, 0);
       CxUStringBuffDiscard(&text);
       const FailingMemory memory;
       QlxCloseToolkit();

@@ -19,8 +19,8 @@
 
 #include <qlx/buffers.h>
 
-#include "text/QlxFormatCache.h"
 #include "util/CxUStringBuff.h"
+#include "text/QlxMessageCache.h"
 
 #include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"

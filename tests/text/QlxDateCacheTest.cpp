@@ -20,6 +20,9 @@
 #include <unicode/uloc.h>
 
 #include "util/CxAsciiLine.h"
+#include "text/QlxMessageCache.h"
+#include "text/QlxDateCache.h"
+#include "util/CxLook.h"
 
 #include "support/Child.h"
 #include "support/FailingMemory.h"
@@ -49,13 +52,13 @@ bool isAscii(const std::u16string &text) {
 std::optional<std::string> bytesOf(const char *pattern, double time) {
   CxAsciiLine line;
   EXPECT_TRUE(line.append("[")) << "dates stand behind other text";
-  if (!qlxAppendCachedDateAscii(&line, pattern, time)) return std::nullopt;
+  if (!qlxAppendCachedDateAscii(&line, {pattern}, time)) return std::nullopt;
   return std::string(line.data() + 1, line.length() - 1);
 }
 
 std::u16string unitsOf(const char *pattern, double time) {
   CxUStringBuff text{};
-  EXPECT_EQ(qlxAppendCachedDate(&text, pattern, time), 1);
+  EXPECT_EQ(qlxAppendCachedDate(&text, {pattern}, time), 1);
   const std::u16string made(text.data, text.length);
   CxUStringBuffDiscard(&text);
   return made;
@@ -153,7 +156,7 @@ TEST_F(DateCacheTest, ALineWithoutRoomRefusesTheDate) {
   for (const uint32_t room : {0, 11, 12}) {
     CxAsciiLine line;
     ASSERT_TRUE(line.append(std::string(4096 - room, 'x')));
-    EXPECT_EQ(qlxAppendCachedDateAscii(&line, "HH:mm:ss.SSS", kTime), room == 12);
+    EXPECT_EQ(qlxAppendCachedDateAscii(&line, {"HH:mm:ss.SSS"}, kTime), room == 12);
     EXPECT_EQ(line.length(), room == 12 ? 4096U : 4096 - room);
   }
 }
@@ -184,6 +187,7 @@ TEST_F(DateCacheTest, TwoZonesOfOneNameAreToldApart) {
   for (int round = 0; round < 3; ++round)
     for (const int32_t hours : {1, 2}) {
       icu::TimeZone::adoptDefault(new icu::SimpleTimeZone(hours * 3'600'000, u"Same"));
+      cxLookRestart();
       const std::string hour = std::to_string(10 + hours);
       EXPECT_EQ(bytesOf("HH:mm", kTime), hour + ":48");
       EXPECT_EQ(unitsOf("HH:mm", kTime), anew("HH:mm", kTime));
@@ -225,6 +229,7 @@ TEST_F(DateCacheTest, AZoneWithAPartOfASecondTellsTheTimeAtItsMilliseconds) {
       }
       ASSERT_TRUE(U_SUCCESS(status));
       icu::TimeZone::adoptDefault(zone);
+      cxLookRestart();
       for (const char *pattern : kWithinASecond)
         for (const double millis : {0, 1, 499, 500, 876, 999, 0, 877})
           compare(pattern, kTime - 123 + millis);
@@ -245,6 +250,7 @@ void setZoneThatChanges(int32_t first, UDate at, int32_t second, UDate again, in
   zone->complete(status);
   ASSERT_TRUE(U_SUCCESS(status)) << u_errorName(status);
   icu::TimeZone::adoptDefault(zone);
+  cxLookRestart();
 }
 
 TEST_F(DateCacheTest, AnOffsetThatChangesWithinASecondDoesSoAtItsMillisecond) {

@@ -21,6 +21,8 @@
 
 #include "object/QlxLocked.h"
 #include "util/CxOwned.h"
+#include "text/QlxMessageCache.h"
+#include "text/QlxDateCache.h"
 
 #include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"
@@ -216,7 +218,7 @@ std::u16string anewDate(const char *pattern, double time) {
 
 std::u16string heldDate(const char *pattern, double time) {
   CxUStringBuff text{};
-  EXPECT_EQ(qlxAppendCachedDate(&text, pattern, time), 1);
+  EXPECT_EQ(qlxAppendCachedDate(&text, {pattern}, time), 1);
   const std::u16string result = text.data ? text.data : u"<null>";
   CxUStringBuffDiscard(&text);
   return result;
@@ -620,7 +622,8 @@ TEST_F(FormatCacheTest, WithoutMemoryThereIsTheWholeTextOrNone) {
       for (const double fraction : {0.0, 0.5})
         for (const char *pattern : {static_cast<const char *>(nullptr), "HH:mm:ss.SSS"}) {
           CxUStringBuff text{};
-          const uint8_t appended = qlxAppendCachedDate(&text, pattern, 1155725335123.0 + fraction);
+          const uint8_t appended =
+              qlxAppendCachedDate(&text, {pattern}, 1155725335123.0 + fraction);
           const std::u16string whole = pattern ? date.substr(11, 12) : date;
           EXPECT_EQ(appended ? std::u16string(text.data) : whole, whole);
           CxUStringBuffDiscard(&text);

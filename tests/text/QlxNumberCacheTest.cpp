@@ -22,6 +22,7 @@
 #include <qlx/buffers.h>
 
 #include "object/QlxLocked.h"
+#include "text/QlxMessageCache.h"
 
 #include "support/Child.h"
 #include "support/FailingMemory.h"

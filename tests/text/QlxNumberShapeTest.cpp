@@ -70,7 +70,7 @@ std::string written(const NumberShape &shape, double value) {
   return end ? toUtf8(text, end) : kLeft;
 }
 
-NumberShape shapeOf(const icu::NumberFormat &format, ShapedNumber type = ShapedNumber::kDouble) {
+NumberShape shapeOf(const icu::NumberFormat &format, ArgType type = ArgType::kDouble) {
   NumberShape shape;
   EXPECT_TRUE(qlxTakeNumberShape(&shape, &format, type));
   return shape;
@@ -78,7 +78,7 @@ NumberShape shapeOf(const icu::NumberFormat &format, ShapedNumber type = ShapedN
 
 bool hasShape(const icu::NumberFormat &format) {
   NumberShape shape;
-  return qlxTakeNumberShape(&shape, &format, ShapedNumber::kDouble);
+  return qlxTakeNumberShape(&shape, &format, ArgType::kDouble);
 }
 
 // ---- Comparing
@@ -108,7 +108,7 @@ Written compareDoubles(const icu::NumberFormat &format, int64_t count, uint64_t 
 }
 
 void compareIntegers(const icu::NumberFormat &format, int64_t count, uint64_t seed) {
-  const NumberShape shape = shapeOf(format, ShapedNumber::kInteger);
+  const NumberShape shape = shapeOf(format, ArgType::kInteger);
   RandomNumbers values(seed);
   for (int64_t i = 0; i < count && !::testing::Test::HasFailure(); ++i) {
     const int32_t value = values.integer();
@@ -209,7 +209,7 @@ TEST(QlxNumberShapeTest, FormatsOfOtherClassesHaveNoShape) {
   EXPECT_FALSE(hasShape(*doublesOf("de@numbers=roman")));
   EXPECT_FALSE(hasShape(icu::RuleBasedNumberFormat(icu::URBNF_SPELLOUT, "en", status)));
   NumberShape shape;
-  EXPECT_FALSE(qlxTakeNumberShape(&shape, nullptr, ShapedNumber::kInteger));
+  EXPECT_FALSE(qlxTakeNumberShape(&shape, nullptr, ArgType::kInteger));
 }
 
 TEST(QlxNumberShapeTest, UnusualPatternsHaveNoShape) {
@@ -290,7 +290,7 @@ TEST(QlxNumberShapeTest, AFormatThatWritesAnyNumberOtherwiseHasNoShape) {
     UErrorCode status = U_ZERO_ERROR;
     const OtherThanItSays format(status, integers);
     NumberShape shape;
-    EXPECT_EQ(qlxTakeNumberShape(&shape, &format, ShapedNumber::kDouble), integers);
-    EXPECT_EQ(qlxTakeNumberShape(&shape, &format, ShapedNumber::kInteger), !integers);
+    EXPECT_EQ(qlxTakeNumberShape(&shape, &format, ArgType::kDouble), integers);
+    EXPECT_EQ(qlxTakeNumberShape(&shape, &format, ArgType::kInteger), !integers);
   }
 }

@@ -21,6 +21,8 @@
 #include "support/ResourceBundles.h"
 #include "support/Take.h"
 #include "util/CxOwned.h"
+#include "text/QlxMessageCache.h"
+#include "text/QlxBundleCache.h"
 
 namespace {
 

@@ -13,6 +13,7 @@
 #include "record/QlxFormatted.h"
 #include "text/QlxFormatCache.h"
 #include "record/QlxLoggedEvent.h"
+#include "record/QlxCachedBuffer.h"
 #include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"
 #include "support/ResourceBundles.h"
@@ -76,7 +77,7 @@ class IncompleteRecordTest : public ::testing::Test {
       if (!isCold) return;
       qlxDropCachedFormats();
       qlxDropCachedEvent();
-      qlxDropFormatted();
+      qlxDropCachedBuffers();
     };
     ASSERT_TRUE(isSuccess(call(logger, bundle.c_str())));
     const std::string whole = record();

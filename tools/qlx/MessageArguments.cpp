@@ -13,9 +13,7 @@
 #include <qlx/memory.h>
 #include <qlx/ustring.h>
 
-namespace {
-enum class Type { text, integer, number };
-}
+#include "text/QlxArgType.h"
 
 // As the library finds it: the bundle as it is named, else by the part after its last "/".
 static std::optional<icu::UnicodeString> findPattern(const char *bundle, const char *key) {
@@ -38,25 +36,25 @@ static icu::UnicodeString word(const icu::MessagePattern &pattern, int32_t part)
 
 // The type of the argument whose parts start at `part`: the start, its number, and for
 // {n,type,style} the type and the style.
-static Type typeOf(const icu::MessagePattern &pattern, int32_t part) {
+static ArgType typeOf(const icu::MessagePattern &pattern, int32_t part) {
   const UMessagePatternArgType type = pattern.getPart(part).getArgType();
-  if (type == UMSGPAT_ARG_TYPE_NONE || type == UMSGPAT_ARG_TYPE_SELECT) return Type::text;
+  if (type == UMSGPAT_ARG_TYPE_NONE || type == UMSGPAT_ARG_TYPE_SELECT) return ArgType::kString;
   const bool hasStyle = pattern.getPartType(part + 3) == UMSGPAT_PART_TYPE_ARG_STYLE;
   const bool isInteger = type == UMSGPAT_ARG_TYPE_SIMPLE && hasStyle &&
                          word(pattern, part + 2) == u"number" &&
                          word(pattern, part + 3) == u"integer";
-  return isInteger ? Type::integer : Type::number;
+  return isInteger ? ArgType::kInteger : ArgType::kDouble;
 }
 
-static std::vector<Type> argumentTypes(const icu::UnicodeString &text) {
+static std::vector<ArgType> argumentTypes(const icu::UnicodeString &text) {
   UErrorCode status = U_ZERO_ERROR;
   const icu::MessagePattern pattern(text, nullptr, status);
-  std::vector<Type> types;
+  std::vector<ArgType> types;
   if (U_FAILURE(status) || pattern.hasNamedArguments()) return types;
   for (int32_t part = 0; part < pattern.countParts(); ++part) {
     if (pattern.getPartType(part) != UMSGPAT_PART_TYPE_ARG_START) continue;
     const size_t number = pattern.getPart(part + 1).getValue();
-    if (number >= types.size()) types.resize(number + 1, Type::text);
+    if (number >= types.size()) types.resize(number + 1, ArgType::kString);
     types[number] = typeOf(pattern, part);
   }
   return types;
@@ -71,9 +69,9 @@ static std::optional<MessageArgument> readNumber(const std::string &word) {
   return number;
 }
 
-static std::optional<MessageArgument> readWord(const std::string &word, Type type) {
-  if (type == Type::integer) return readNumber<int32_t>(word);
-  if (type == Type::number) return readNumber<double>(word);
+static std::optional<MessageArgument> readWord(const std::string &word, ArgType type) {
+  if (type == ArgType::kInteger) return readNumber<int32_t>(word);
+  if (type == ArgType::kDouble) return readNumber<double>(word);
   UChar *text = CxUStringDupStrToUChar(word.c_str());
   const std::u16string result(text ? text : u"");
   OslMemoryFree(text);
@@ -86,7 +84,7 @@ std::optional<std::vector<MessageArgument>> readMessageArguments(
   std::vector<MessageArgument> arguments;
   const auto pattern = findPattern(bundle, key);
   if (!pattern) return arguments;
-  const std::vector<Type> types = argumentTypes(*pattern);
+  const std::vector<ArgType> types = argumentTypes(*pattern);
   if (types.size() > words.size() || types.size() > kMaxMessageArguments) {
     const size_t most = std::min(words.size(), kMaxMessageArguments);
     problem = "the message has " + std::to_string(types.size()) + " arguments, not " +
@@ -97,7 +95,7 @@ std::optional<std::vector<MessageArgument>> readMessageArguments(
     const auto argument = readWord(words[i], types[i]);
     if (!argument) {
       problem = "argument {" + std::to_string(i) + "} is " +
-                (types[i] == Type::integer ? "a whole number" : "a number") + ", not \"" +
+                (types[i] == ArgType::kInteger ? "a whole number" : "a number") + ", not \"" +
                 words[i] + "\"";
       return std::nullopt;
     }

@@ -1,12 +1,12 @@
 // The emitters of an XML record's elements. A null event has no properties and no message. When
 // memory runs out the record is lost as a whole (QlxRecordText.h).
-#ifndef QLX_SRC_QLXPDXMLFORMATTER_H
-#define QLX_SRC_QLXPDXMLFORMATTER_H
+#ifndef QLX_SRC_QLXPDXMLELEMENTS_H
+#define QLX_SRC_QLXPDXMLELEMENTS_H
 
 #include <qlx/class/formatter.h>
 
-#include "record/QlxEventValues.h"
-#include "record/QlxRecordText.h"
+#include "QlxEventValues.h"
+#include "QlxRecordText.h"
 
 QLX_BEGIN_DECLS
 
@@ -34,7 +34,6 @@ struct ProductElements {
   bool component, product, instance, server;  // those that are selected
 };
 
-void qlxPDXMLAppendLevel(RecordText &out, int32_t level);
 void qlxPDXMLAppendProducts(RecordText &out, const EventValues &values,
                             const ProductElements &selected);
 bool qlxPDXMLAppendSource(RecordText &out, const EventValues &values);

@@ -31,6 +31,21 @@ static constexpr EventKey kLineKeys[] = {
 
 // ---- Settings
 
+// Null for a host's class, which may have variables of its own, and for an object of another kind.
+static QlxFormatterVars *varsOf(const QlxObject *formatter) {
+  const bool isOwn = isKind(formatter, Formatter) && formatter->objClass->own;
+  return isOwn ? static_cast<QlxFormatterVars *>(formatter->vars) : nullptr;
+}
+
+static void *allocVars(void) {
+  return OslMemoryCalloc(1, sizeof(QlxFormatterVars));
+}
+
+static void applyUtc(QlxObject *formatter, const char *key) {
+  if (QlxFormatterVars *vars = varsOf(formatter))
+    vars->isUtc = qlxIntlGetObjPropBool(formatter, key, nullptr);  // absent: 0
+}
+
 // Replaces a setting by the object's property; an empty value is kept as such.
 template <auto Setting>
 static void applySetting(QlxObject *formatter, const char *key) {
@@ -53,6 +68,7 @@ static constexpr ConfigKey kFormatterKeys[] = {
     {"separator", applySetting<separatorOf>},
     {"dateTimeFormat", applySetting<dateTimeFormatOf>},
     {"locale", applySetting<localeOf>},
+    {"utc", applyUtc},
 };
 
 void QlxBasicFormatterFCfgChange(QlxObject *formatter, const char *key) {
@@ -64,7 +80,8 @@ void QlxBasicFormatterFCfgChange(QlxObject *formatter, const char *key) {
 
 DateStyle qlxDateStyleOf(const QlxObject *formatter) {
   if (!isKind(formatter, Formatter)) return {};
-  return {formatter->kind2.dateTimeFormat};
+  const QlxFormatterVars *vars = varsOf(formatter);
+  return {formatter->kind2.dateTimeFormat, vars && vars->isUtc == 1};
 }
 
 // ---- A line
@@ -135,6 +152,8 @@ const ObjClass qlxBasicFormatterClass = {
     .op2 = {.fGetHeader = QlxBasicFormatterFGetHeader},
     .op3 = {.fGetTrailer = QlxBasicFormatterFGetTrailer},
     .op4 = {.fBindMsg = qlxIntlBindUI18Msg},
+    .fAllocVars = allocVars,
+    .fFreeVars = OslMemoryFree,
     .fCfgChange = QlxBasicFormatterFCfgChange,
     .own = &kOwn,
 };

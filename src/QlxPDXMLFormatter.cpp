@@ -21,7 +21,7 @@ using namespace std::string_view_literals;
 
 namespace {
 
-struct PDXMLVars {
+struct PDXMLVars : QlxFormatterVars {
   uint8_t firstRecord;      // 1 at first and after each header: the next record has the preamble
   uint8_t singleComponent;  // these four: 1 writes the element once, in the preamble
   uint8_t singleProduct;
@@ -33,9 +33,16 @@ struct PDXMLVars {
 
 }  // namespace
 
-// Null for an object of another kind, which has something else in the same place.
+static bool appendRecord(QlxObject *formatter, Event *event, va_list *args, RecordText &out);
+
+static constexpr QlxOwnClass kOwn = {.takesNotes = true, .append = appendRecord};
+
+// Null for an object of another kind or class of the library, which has something else in the same
+// place.
 static PDXMLVars *varsOf(QlxObject *formatter) {
-  return isKind(formatter, Formatter) ? static_cast<PDXMLVars *>(formatter->vars) : nullptr;
+  if (!isKind(formatter, Formatter)) return nullptr;
+  const QlxOwnClass *own = formatter->objClass->own;
+  return own && own != &kOwn ? nullptr : static_cast<PDXMLVars *>(formatter->vars);
 }
 
 void *QlxPDXMLFormatterFAllocVars(void) {
@@ -188,8 +195,6 @@ static bool appendRecord(QlxObject *formatter, Event *event, va_list *args, Reco
 UChar *QlxPDXMLUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args) {
   return qlxFormatNew(formatter, event, args, appendRecord);
 }
-
-static constexpr QlxOwnClass kOwn = {.takesNotes = true, .append = appendRecord};
 
 const ObjClass qlxPDXMLFormatterClass = {
     .kind = Formatter,

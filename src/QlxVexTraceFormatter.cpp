@@ -35,7 +35,7 @@ struct Record {
 
 static void appendTime(RecordText &line, const Record &record) {
   line << "["sv;
-  line.date({record.formatter->kind2.dateTimeFormat}, record.event->time) << "]"sv;
+  line.date({record.formatter->kind2.dateTimeFormat, false}, record.event->time) << "]"sv;
 }
 
 // In a column of five characters.

@@ -67,13 +67,17 @@ static const CachedFormats gThese{dropAll, CachedFormats::kDefaultsChange};
 static UDateFormat *openDate(const DateStyle &style, UErrorCode *status) {
   const OwnedUStr pattern{CxUStringDupStrToUChar(style.pattern)};
   if (style.pattern && !pattern) *status = U_MEMORY_ALLOCATION_ERROR;
-  return udat_open(UDAT_PATTERN, UDAT_PATTERN, qlxGoodLocale(qlxDefaultLocale()), nullptr, -1,
-                   pattern ? pattern.get() : kDefaultPattern, -1, status);
+  return udat_open(UDAT_PATTERN, UDAT_PATTERN, qlxGoodLocale(qlxDefaultLocale()),
+                   style.isUtc ? u"UTC" : nullptr, -1, pattern ? pattern.get() : kDefaultPattern,
+                   -1, status);
 }
 
 static CachedDate *find(const DateStyle &style) {
-  for (CachedDate &cached : gDates)
-    if (cached.format && qlxSameText(cached.style.pattern, style.pattern)) return &cached;
+  for (CachedDate &cached : gDates) {
+    const bool isSame = cached.format && cached.style.isUtc == style.isUtc &&
+                        qlxSameText(cached.style.pattern, style.pattern);
+    if (isSame) return &cached;
+  }
   return nullptr;
 }
 
@@ -87,7 +91,7 @@ static CachedDate *add(const DateStyle &style, UErrorCode *status) {
   CachedDate &place = *std::ranges::min_element(gDates, {}, &CachedDate::lastUse);
   drop(place);
   place.format = format.orphan();
-  place.style = {pattern.release()};
+  place.style = {pattern.release(), style.isUtc};
   return &place;
 }
 
@@ -123,8 +127,9 @@ static int32_t offsetOf(const UCalendar *calendar, UErrorCode *status) {
   return zone + ucal_get(calendar, UCAL_DST_OFFSET, status);
 }
 
-// The default zone's offset from UTC at a time, in milliseconds.
-static int32_t offsetAt(double time) {
+// A style's offset from UTC at a time, in milliseconds.
+static int32_t offsetAt(const DateStyle &style, double time) {
+  if (style.isUtc) return 0;
   UErrorCode status = U_ZERO_ERROR;
   const int32_t offset = offsetOf(calendarAt(time, &status), &status);
   return U_SUCCESS(status) ? offset : 0;
@@ -132,7 +137,8 @@ static int32_t offsetAt(double time) {
 
 // Whether the zone's clock goes on by a second when UTC does, and at the same moment. A zone may
 // have parts of a second, or change within one.
-static bool isSteady(double second) {
+static bool isSteady(const DateStyle &style, double second) {
+  if (style.isUtc) return true;
   constexpr double kLastMillis = 999;
   UErrorCode status = U_ZERO_ERROR;
   const UCalendar *calendar = calendarAt(second, &status);
@@ -172,7 +178,7 @@ static uint8_t appendDate(CxUStringBuff *text, const CachedDate &cached, double 
                   : udat_format(format, time, room, units, nullptr, answer);
   });
   if (*status == U_MEMORY_ALLOCATION_ERROR) return 0;
-  return cached.style.pattern ? 1 : appendOffset(text, offsetAt(time));
+  return cached.style.pattern ? 1 : appendOffset(text, offsetAt(cached.style, time));
 }
 
 // Three times the zero of a script's decimal digits, behind which the other nine stand in order.
@@ -207,7 +213,7 @@ static bool keep(CachedDate &cached, int64_t second) {
   const icu::LocalUFieldPositionIteratorPointer fields{ufieldpositer_open(&status)};
   if (U_FAILURE(status)) return false;
   const double time = static_cast<double>(second) * 1000;
-  if (!isSteady(time)) return false;
+  if (!isSteady(cached.style, time)) return false;
   if (!appendDate(&cached.text, cached, time, fields.getAlias(), &status)) return false;
   const std::optional<int32_t> fraction = findFraction(cached.text, fields.getAlias());
   cached.varies = U_FAILURE(status) || !fraction;

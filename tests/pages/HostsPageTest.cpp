@@ -115,7 +115,7 @@ constexpr double kTime = 1155725335123.0;  // 2006-08-16 10:48:55.123 UTC
 
 std::string hour() {
   CxAsciiLine line;
-  EXPECT_TRUE(qlxAppendCachedDateAscii(&line, {"HH"}, kTime));
+  EXPECT_TRUE(qlxAppendCachedDateAscii(&line, {"HH", false}, kTime));
   return std::string(line.data(), line.length());
 }
 

@@ -276,7 +276,7 @@ TEST_F(BundleCacheTest, IcuMayCleanUpAfterTheToolkitIsClosed) {
       EXPECT_EQ(of("hello", "de"), (Result{u"deutsch value", 0}));
       CxUStringBuff text{};
       CxUStringBuffAppendUDouble(&text, 1.5);
-      qlxAppendCachedDate(&text, {nullptr}, 0);
+      qlxAppendCachedDate(&text, {nullptr, false}, 0);
       CxUStringBuffDiscard(&text);
       const FailingMemory memory;
       QlxCloseToolkit();

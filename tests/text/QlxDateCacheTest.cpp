@@ -52,13 +52,13 @@ bool isAscii(const std::u16string &text) {
 std::optional<std::string> bytesOf(const char *pattern, double time) {
   CxAsciiLine line;
   EXPECT_TRUE(line.append("[")) << "dates stand behind other text";
-  if (!qlxAppendCachedDateAscii(&line, {pattern}, time)) return std::nullopt;
+  if (!qlxAppendCachedDateAscii(&line, {pattern, false}, time)) return std::nullopt;
   return std::string(line.data() + 1, line.length() - 1);
 }
 
 std::u16string unitsOf(const char *pattern, double time) {
   CxUStringBuff text{};
-  EXPECT_EQ(qlxAppendCachedDate(&text, {pattern}, time), 1);
+  EXPECT_EQ(qlxAppendCachedDate(&text, {pattern, false}, time), 1);
   const std::u16string made(text.data, text.length);
   CxUStringBuffDiscard(&text);
   return made;
@@ -156,7 +156,7 @@ TEST_F(DateCacheTest, ALineWithoutRoomRefusesTheDate) {
   for (const uint32_t room : {0, 11, 12}) {
     CxAsciiLine line;
     ASSERT_TRUE(line.append(std::string(4096 - room, 'x')));
-    EXPECT_EQ(qlxAppendCachedDateAscii(&line, {"HH:mm:ss.SSS"}, kTime), room == 12);
+    EXPECT_EQ(qlxAppendCachedDateAscii(&line, {"HH:mm:ss.SSS", false}, kTime), room == 12);
     EXPECT_EQ(line.length(), room == 12 ? 4096U : 4096 - room);
   }
 }

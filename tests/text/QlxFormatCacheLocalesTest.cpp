@@ -58,7 +58,7 @@ Bound bind(const char *locale, const UChar *pattern, ...) {
 
 std::u16string date(const char *pattern) {
   CxUStringBuff text{};
-  EXPECT_EQ(qlxAppendCachedDate(&text, {pattern}, 1155725335123.0), 1);
+  EXPECT_EQ(qlxAppendCachedDate(&text, {pattern, false}, 1155725335123.0), 1);
   const std::u16string made = text.data ? text.data : u"";
   CxUStringBuffDiscard(&text);
   return made;
@@ -278,7 +278,7 @@ TEST_F(CachedLocalesTest, NoDefaultNameEndsTheProcess) {
       if (!IcuDefaults::setLocale(names.next().c_str())) continue;
       for (const char *pattern : {"'x'", static_cast<const char *>(nullptr)}) {
         CxUStringBuff text{};
-        qlxAppendCachedDate(&text, {pattern}, 0.0);
+        qlxAppendCachedDate(&text, {pattern, false}, 0.0);
         CxUStringBuffDiscard(&text);
       }
       for (const UChar *pattern : kDelicate) bind(nullptr, pattern, 1.0);

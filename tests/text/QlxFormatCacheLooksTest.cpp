@@ -41,7 +41,7 @@ uint32_t append(CxUStringBuff *text, const UChar *pattern, ...) {
 
 std::u16string hour() {
   CxUStringBuff text{};
-  qlxAppendCachedDate(&text, {"HH"}, 0);
+  qlxAppendCachedDate(&text, {"HH", false}, 0);
   return take(&text);
 }
 std::u16string hourOfAMessage() {
@@ -144,7 +144,7 @@ TEST_F(DefaultsInABurstTest, CountTogetherForAFormatThatIsNew) {
   useUp(hour);
   setZone(u"Asia/Tokyo");
   CxUStringBuff text{};
-  qlxAppendCachedDate(&text, {nullptr}, 0);
+  qlxAppendCachedDate(&text, {nullptr, false}, 0);
   EXPECT_EQ(take(&text), u"1970-01-01 09:00:00.000+09:00");
   EXPECT_EQ(hour(), u"09");
 }

@@ -218,7 +218,7 @@ std::u16string anewDate(const char *pattern, double time) {
 
 std::u16string heldDate(const char *pattern, double time) {
   CxUStringBuff text{};
-  EXPECT_EQ(qlxAppendCachedDate(&text, {pattern}, time), 1);
+  EXPECT_EQ(qlxAppendCachedDate(&text, {pattern, false}, time), 1);
   const std::u16string result = text.data ? text.data : u"<null>";
   CxUStringBuffDiscard(&text);
   return result;
@@ -623,7 +623,7 @@ TEST_F(FormatCacheTest, WithoutMemoryThereIsTheWholeTextOrNone) {
         for (const char *pattern : {static_cast<const char *>(nullptr), "HH:mm:ss.SSS"}) {
           CxUStringBuff text{};
           const uint8_t appended =
-              qlxAppendCachedDate(&text, {pattern}, 1155725335123.0 + fraction);
+              qlxAppendCachedDate(&text, {pattern, false}, 1155725335123.0 + fraction);
           const std::u16string whole = pattern ? date.substr(11, 12) : date;
           EXPECT_EQ(appended ? std::u16string(text.data) : whole, whole);
           CxUStringBuffDiscard(&text);

@@ -11,7 +11,8 @@
 
 QLX_BEGIN_DECLS
 
-/** The basic formatter's keys: "separator", "dateTimeFormat", "locale", and the common ones. */
+/** The basic formatter's keys: "separator", "dateTimeFormat", "locale", the common ones, and "utc",
+ *  which has no effect on an object of a host's class: its variables are the class's own. */
 QLX_API void QlxBasicFormatterFCfgChange(QlxObject *formatter, const char *key);
 
 /**
@@ -33,9 +34,10 @@ QLX_API char *QlxBasicFormatterFGetHeader(QlxObject *formatter);
 QLX_API char *QlxBasicFormatterFGetTrailer(QlxObject *formatter);
 
 /**
- * Formats a time in the default locale and zone by the formatter's "dateTimeFormat", or, when the
- * formatter is null or has none, as "yyyy-MM-dd HH:mm:ss.SSS" with the offset from UTC. Takes no
- * lock, and needs none while no other thread may change the formatter.
+ * Formats a time in the default locale, in the default zone or with "utc" in UTC, by the
+ * formatter's "dateTimeFormat", or, when the formatter is null or has none, as "yyyy-MM-dd
+ * HH:mm:ss.SSS" with the offset from UTC. Takes no lock, and needs none while no other thread may
+ * change the formatter.
  *
  * Deliberate: the minutes of the offset keep their sign and only the hours decide the sign before
  * it: -330 minutes are "-05:-30", -30 are "+00:-30".
@@ -56,8 +58,8 @@ QLX_API void *QlxPDXMLFormatterFAllocVars(void);
 QLX_API void QlxPDXMLFormatterFFreeVars(void *vars);
 /** The six flags, and the basic formatter's keys. Without variables the flags have no effect. */
 QLX_API void QlxPDXMLFormatterFCfgChange(QlxObject *formatter, const char *key);
-/** @return the record; null for a null event, for a formatter without variables or of another kind,
- *          and when memory ran out */
+/** @return the record; null for a null event, for a formatter without variables, of another kind,
+ *          or of another class of the library, and when memory ran out */
 QLX_API UChar *QlxPDXMLUFormatterFFormat(QlxObject *formatter, Event *event, va_list *args);
 /** The next record has the preamble of single elements before it. @return null */
 QLX_API char *QlxPDXMLFormatterFGetHeader(QlxObject *formatter);

@@ -15,10 +15,8 @@
 #include "object/QlxClasses.h"
 #include "object/QlxObjClass.h"
 #include "object/QlxConfigKeys.h"
-#include "file/QlxFileNames.h"
 #include "QlxObject.h"
 #include "QlxProps.h"
-#include "file/QlxRolling.h"
 #include "util/CxStatus.h"
 
 static constexpr const char *kFirstFileName = "default.log";
@@ -37,7 +35,7 @@ static void nameActiveFile(QlxFileHandlerVars *vars, const char *name) {
   OslMemoryFree(vars->fullName);
   vars->fullName = qlxFHGenerationName(vars, vars->generation);
   if (vars->basePart && !vars->fullName) vars->nameError = ENOMEM;
-  vars->stuck = vars->log.torn = vars->log.taken = 0;  // those were of another file
+  vars->stuck = vars->torn = vars->taken = 0;  // those were of another file
 }
 
 static void closeFile(QlxFileHandlerVars *vars) {
@@ -48,7 +46,7 @@ static void closeFile(QlxFileHandlerVars *vars) {
 void *QlxFileHandlerFAllocVars(void) {
   auto *vars = static_cast<QlxFileHandlerVars *>(OslMemoryCalloc(1, sizeof(QlxFileHandlerVars)));
   if (!vars) return nullptr;
-  vars->file = vars->log.reserve = -1;
+  vars->file = vars->reserve = -1;
   vars->maxBytes = kFirstMaxBytes;
   vars->maxFiles = kDefaultMaxFiles;
   vars->filePermission = kFirstFilePermission;
@@ -82,7 +80,7 @@ QlxFileHandlerVars *qlxFileHandlerVars(QlxObject *handler) {
 
 bool qlxFileHandlerIsFull(const QlxFileHandlerVars *vars) {
   // Deliberate: a negative limit is as unsigned the largest of all, and 0 is always reached.
-  return vars->log.rolls && vars->maxFiles > 1 &&
+  return vars->rolls && vars->maxFiles > 1 &&
          vars->size >= static_cast<uint64_t>(int64_t{vars->maxBytes});
 }
 
@@ -106,7 +104,7 @@ void qlxFileHandlerMakeDirectory(const QlxFileHandlerVars *vars) {
 }
 
 static CxStatus openFile(QlxFileHandlerVars *vars) {
-  return qlxLogFileOpen(vars, vars->appending == 1 ? O_APPEND : O_TRUNC);
+  return qlxLogFileOpen(vars, vars->fullName, vars->appending == 1 ? O_APPEND : O_TRUNC);
 }
 
 void qlxFileHandlerDoRollover(QlxFileHandlerVars *vars) {
@@ -125,19 +123,19 @@ static bool rollOver(QlxObject *handler, QlxFileHandlerVars *vars) {
 // file under its name is not noticed, what is open goes on. Between two looks own bytes are
 // counted; what the count calls full is measured.
 static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
-  if (!cxLookAgain(&vars->log.look) && !qlxFileHandlerIsFull(vars)) return true;
+  if (!cxLookAgain(&vars->look) && !qlxFileHandlerIsFull(vars)) return true;
   const CxStatus status = qlxLogFileMeasure(vars);
   if (qlxFailed(status)) {
     qlxKeepFailure(nullptr, status);
     closeFile(vars);
-    vars->log.taken = 1;
+    vars->taken = 1;
     return false;
   }
-  if (!vars->log.rolls) return true;
+  if (!vars->rolls) return true;
   const CxStatus there = qlxLeadsToFile(vars->fullName);
   if (qlxFailed(there)) {
     QlxFileHandlerFClose(handler);
-    vars->log.taken |= there.code != ENOENT;  // it may be there with all that was written
+    vars->taken |= there.code != ENOENT;  // it may be there with all that was written
     return false;
   }
   return !qlxFileHandlerIsFull(vars) || !rollOver(handler, vars);
@@ -220,7 +218,7 @@ static QlxFileHandlerVars *closeForChange(QlxObject *handler) {
   return qlxFileHandlerVars(handler);
 }
 
-template <int32_t QlxFileHandlerVars::*Field, int32_t Absent>
+template <auto Field, int32_t Absent>
 static void applyInt(QlxObject *handler, const char *key) {
   uint8_t found = 0;
   const int32_t value = qlxIntlGetObjPropInt(handler, key, &found);

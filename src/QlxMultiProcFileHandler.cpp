@@ -17,10 +17,7 @@
 
 #include "object/QlxClasses.h"
 #include "object/QlxObjClass.h"
-#include "file/QlxFileNames.h"
 #include "QlxObject.h"
-#include "file/QlxRolling.h"
-#include "file/QlxSharedLock.h"
 #include "util/CxFile.h"
 #include "util/CxStatus.h"
 
@@ -152,12 +149,31 @@ void qlxMultiProcFileHandlerDoRollover(QlxFileHandlerVars *vars) {
   if (mayRoll(vars)) rollOver(vars, nullptr);
 }
 
+// ---- The semaphore, with its failures reported
+
+static uint8_t succeeds(CxStatus status) {
+  qlxKeepFailure(nullptr, status);
+  return !qlxFailed(status);
+}
+
+uint8_t qlxMultiProcFileHandlerInitSem(QlxFileHandlerVars *vars) {
+  return vars && succeeds(qlxSharedLockSetUp(vars));
+}
+
+uint8_t qlxMultiProcFileHandlerLockSem(QlxFileHandlerVars *vars) {
+  return vars && succeeds(qlxSharedLockTake(vars));
+}
+
+void qlxMultiProcFileHandlerUnlockSem(QlxFileHandlerVars *vars) {
+  if (vars) qlxKeepFailure(nullptr, qlxSharedLockGiveBack(vars));
+}
+
 // ---- Opening and closing
 
 // Deliberate: appends also when "appending" is off.
 static CxStatus openFile(QlxFileHandlerVars *vars) {
   qlxFileHandlerMakeDirectory(vars);
-  const CxStatus status = qlxLogFileOpen(vars, O_APPEND);
+  const CxStatus status = qlxLogFileOpen(vars, vars->fullName, O_APPEND);
   vars->opened = !qlxFailed(status);
   if (vars->opened == 1) qlxLogFileReserve(vars);
   return status;

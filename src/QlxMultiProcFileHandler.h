@@ -6,18 +6,16 @@
 
 QLX_BEGIN_DECLS
 
-/** Makes the semaphore set of the key, free, or attaches to it as it is. @return 1, or 0 */
+// As qlxSharedLockSetUp(), qlxSharedLockTake() and qlxSharedLockGiveBack(), which say what they do;
+// here their failures are reported, and null is none to lock.
+
+/** Makes the semaphore set, or attaches to it. @return 1, or 0 for null and when that failed */
 uint8_t qlxMultiProcFileHandlerInitSem(QlxFileHandlerVars *vars);
 
-/**
- * Waits for the semaphore. Deliberate: after the eleventh interruption it goes on without, so that
- * a record is rather written unserialised than lost.
- *
- * @return 1, or 0 for null and when waiting failed
- */
+/** Waits for the semaphore. @return 1, or 0 for null and when waiting failed */
 uint8_t qlxMultiProcFileHandlerLockSem(QlxFileHandlerVars *vars);
 
-/** Gives the semaphore back, unless it is free already: its value never rises above 1. */
+/** Gives the semaphore back, unless it is free already. */
 void qlxMultiProcFileHandlerUnlockSem(QlxFileHandlerVars *vars);
 
 /** Moves the generations up by one and empties the active file into the first. */

@@ -5,15 +5,16 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <iterator>
 
-#include <qlx/class/props.h>
 #include <qlx/files.h>
 #include <qlx/memory.h>
 #include <qlx/system.h>
 #include <qlx/toolkit.h>
 
+#include "QlxProblems.h"
 #include "util/CxOwned.h"
 #include "util/CxStatus.h"
 
@@ -55,11 +56,11 @@ static void replacePart(char **part, char *text) {
   *part = text;
 }
 
-static void clearParts(QlxFileHandlerVars *vars) {
-  replacePart(&vars->dirPart, nullptr);
-  replacePart(&vars->basePart, nullptr);
-  replacePart(&vars->extPart, nullptr);
-  vars->generation = 0;
+static void clearParts(QlxLogNames *names) {
+  replacePart(&names->dirPart, nullptr);
+  replacePart(&names->basePart, nullptr);
+  replacePart(&names->extPart, nullptr);
+  names->generation = 0;
 }
 
 // Cuts what begins at `place` off its text; the new copy is null when memory ran out.
@@ -72,7 +73,7 @@ static char *cutOff(char *place) {
 static int32_t cutNumber(char *stem) {
   char *digits = stem + OslStringLen(stem);
   while (digits > stem && digits[-1] >= '0' && digits[-1] <= '9') --digits;
-  const int32_t number = qlxPropStrToInt32(digits, nullptr);  // without digits 0
+  const auto number = static_cast<int32_t>(strtol(digits, nullptr, 10));  // without digits 0
   *digits = '\0';
   return number;
 }
@@ -84,30 +85,30 @@ static void getCurrentDirectory(QlxFileName buffer) {
   std::replace(buffer, buffer + OslStringLen(buffer), '\\', '/');  // as in the name
 }
 
-void qlxFHGetFileNameParts(const char *name, QlxFileHandlerVars *vars) {
-  if (!vars) return;
-  clearParts(vars);
-  vars->nameError = OslStringLen(name) > kMaxNameBytes ? ENAMETOOLONG : 0;
-  if (!name || vars->nameError != 0) return;
+void qlxFHGetFileNameParts(const char *name, QlxLogNames *names) {
+  if (!names) return;
+  clearParts(names);
+  names->nameError = OslStringLen(name) > kMaxNameBytes ? ENAMETOOLONG : 0;
+  if (!name || names->nameError != 0) return;
   QlxFileName stem;
   qlxGetNativePath(name, stem);
 
   // Deliberate: a dot in a directory's name, with none in the file's, makes all behind it the
   // extension.
   char *dot = OslStringRChr(stem, '.');
-  if (dot) vars->extPart = OslStringDup(dot + 1);
+  if (dot) names->extPart = OslStringDup(dot + 1);
   if (dot) *dot = '\0';
-  vars->generation = cutNumber(stem);
+  names->generation = cutNumber(stem);
   // Deliberate: the base keeps the separator before it, so that names with one get "//".
   char *separator = OslStringRChr(stem, '/');
-  vars->basePart = cutOff(separator ? separator : stem);
+  names->basePart = cutOff(separator ? separator : stem);
   if (!*stem) getCurrentDirectory(stem);
-  if (*stem) vars->dirPart = OslStringDup(stem);
+  if (*stem) names->dirPart = OslStringDup(stem);
 
-  const bool complete = vars->basePart && (!dot || vars->extPart) && (!*stem || vars->dirPart);
+  const bool complete = names->basePart && (!dot || names->extPart) && (!*stem || names->dirPart);
   if (complete) return;
-  clearParts(vars);  // half a name could be that of somebody else's file
-  vars->nameError = ENOMEM;
+  clearParts(names);  // half a name could be that of somebody else's file
+  names->nameError = ENOMEM;
 }
 
 // ---- Putting a name together
@@ -123,30 +124,30 @@ void qlxSetFileNameParts(char **out, const char *dir, const char *base, int32_t 
   *out = QlxStrACat(static_cast<int32_t>(std::size(parts)), parts, nullptr);
 }
 
-char *qlxFHGenerationName(const QlxFileHandlerVars *vars, int32_t generation) {
+char *qlxFHGenerationName(const QlxLogNames *names, int32_t generation) {
   char *name = nullptr;
-  qlxSetFileNameParts(&name, vars->dirPart, vars->basePart, generation, vars->extPart);
+  qlxSetFileNameParts(&name, names->dirPart, names->basePart, generation, names->extPart);
   return name;
 }
 
-uint8_t qlxFHWriteName(const QlxFileHandlerVars *vars, int32_t generation, QlxFileName name) {
+uint8_t qlxFHWriteName(const QlxLogNames *names, int32_t generation, QlxFileName name) {
   const auto orNone = [](const char *part) { return part ? part : ""; };
   char number[kMaxNumberBytes] = "";
   if (generation != 0) OslStringSprintf(number, "%d", generation);
   name[0] = '\0';
-  if (!vars->basePart) return 0;
-  const int length = snprintf(name, sizeof(QlxFileName), "%s%s%s%s%s%s", orNone(vars->dirPart),
-                              vars->dirPart ? "/" : "", vars->basePart, number,
-                              vars->extPart ? "." : "", orNone(vars->extPart));
+  if (!names->basePart) return 0;
+  const int length = snprintf(name, sizeof(QlxFileName), "%s%s%s%s%s%s", orNone(names->dirPart),
+                              names->dirPart ? "/" : "", names->basePart, number,
+                              names->extPart ? "." : "", orNone(names->extPart));
   const bool fits = length >= 0 && static_cast<uint32_t>(length) <= kMaxNameBytes;
   if (!fits) name[0] = '\0';
   return fits;
 }
 
-CxStatus qlxFHCheckNames(const QlxFileHandlerVars *vars) {
-  if (vars->nameError != 0) return cxFailure(vars->nameError);
+CxStatus qlxFHCheckNames(const QlxLogNames *names) {
+  if (names->nameError != 0) return cxFailure(names->nameError);
   QlxFileName longest;
-  const int32_t last = vars->maxFiles > 1 ? vars->maxFiles - 1 : 0;
-  const bool fits = !vars->fullName || qlxFHWriteName(vars, last, longest);
+  const int32_t last = names->maxFiles > 1 ? names->maxFiles - 1 : 0;
+  const bool fits = !names->fullName || qlxFHWriteName(names, last, longest);
   return cxStatusOf(fits ? 0 : ENAMETOOLONG);
 }

@@ -10,14 +10,14 @@
 
 #include <qlx/files.h>
 
-#include "QlxFileHandler.h"
+#include "QlxProblems.h"
 #include "util/CxFile.h"
 #include "util/CxStatus.h"
 
 static constexpr int kHighNumber = 500;
 static constexpr int kFirstFreeNumber = STDERR_FILENO + 1;
 
-static QlxFileHandlerVars *gOpen;  // linked by log.next
+static QlxLogFile *gOpen;  // linked by next
 
 // ---- What a path or a descriptor leads to
 
@@ -72,22 +72,22 @@ static bool isDescriptorsName(const char *name) {
 // ---- Numbers
 
 // A number that another handler, or this one, had before its host closed it, is its no more.
-static void claim(QlxFileHandlerVars *vars, CxFile number, CxFile *place) {
-  for (QlxFileHandlerVars *each = gOpen; each; each = each->log.next) {
+static void claim(QlxLogFile *log, CxFile number, CxFile *place) {
+  for (QlxLogFile *each = gOpen; each; each = each->next) {
     if (each->file == number) each->file = -1;
-    if (each->log.reserve == number) each->log.reserve = -1;
+    if (each->reserve == number) each->reserve = -1;
   }
-  if (vars->file == number) vars->file = -1;
-  if (vars->log.reserve == number) vars->log.reserve = -1;
+  if (log->file == number) log->file = -1;
+  if (log->reserve == number) log->reserve = -1;
   *place = number;
 }
 
 // False when it is not among them.
-static bool unlinkFromOpen(const QlxFileHandlerVars *vars) {
-  QlxFileHandlerVars **link = &gOpen;
-  while (*link && *link != vars) link = &(*link)->log.next;
+static bool unlinkFromOpen(const QlxLogFile *log) {
+  QlxLogFile **link = &gOpen;
+  while (*link && *link != log) link = &(*link)->next;
   if (!*link) return false;
-  *link = vars->log.next;
+  *link = log->next;
   return true;
 }
 
@@ -111,124 +111,124 @@ CxStatus qlxOpenHigh(CxFile *file, const char *name, int32_t flags, uint32_t mod
 // ---- Opening, measuring, closing
 
 // A FIFO without a reader, or a terminal without a line, would keep the caller waiting.
-static CxStatus openName(QlxFileHandlerVars *vars, int32_t existing, CxFile *file) {
+static CxStatus openName(QlxLogFile *log, const char *name, int32_t existing, CxFile *file) {
   Found found = {};
-  const bool exists = !qlxFailed(find(AT_FDCWD, vars->fullName, 0, &found));
-  const bool isFile = !exists || (found.isRegular && !isDescriptorsName(vars->fullName));
-  if (vars->log.taken) existing = O_APPEND;
+  const bool exists = !qlxFailed(find(AT_FDCWD, name, 0, &found));
+  const bool isFile = !exists || (found.isRegular && !isDescriptorsName(name));
+  if (log->taken) existing = O_APPEND;
   const int32_t flags = isFile ? O_CREAT | O_RDWR | existing : O_WRONLY | O_APPEND | O_NONBLOCK;
-  const CxStatus status = qlxOpenHigh(file, vars->fullName, flags, vars->filePermission);
-  vars->log.rolls = isFile;
+  const CxStatus status = qlxOpenHigh(file, name, flags, log->filePermission);
+  log->rolls = isFile;
   return status;
 }
 
-static void takeSize(QlxFileHandlerVars *vars, const Found &found) {
-  vars->size = static_cast<uint64_t>(found.size);
-  if (found.size == 0) vars->log.torn = 0;
+static void takeSize(QlxLogFile *log, const Found &found) {
+  log->size = static_cast<uint64_t>(found.size);
+  if (found.size == 0) log->torn = 0;
 }
 
-static CxStatus note(QlxFileHandlerVars *vars) {
+static CxStatus note(QlxLogFile *log) {
   Found found;
-  const CxStatus status = findOpen(vars->file, &found);
+  const CxStatus status = findOpen(log->file, &found);
   if (qlxFailed(status)) return status;
-  vars->log.device = found.device;
-  vars->log.inode = found.inode;
-  takeSize(vars, found);
+  log->device = found.device;
+  log->inode = found.inode;
+  takeSize(log, found);
   if (found.isRegular) return kCxSuccess;
-  vars->log.rolls = 0;
-  return cxStatusOfCall(fcntl(vars->file, F_SETFL, O_APPEND | O_NONBLOCK) == 0);
+  log->rolls = 0;
+  return cxStatusOfCall(fcntl(log->file, F_SETFL, O_APPEND | O_NONBLOCK) == 0);
 }
 
-CxStatus qlxLogFileOpen(QlxFileHandlerVars *vars, int32_t existing) {
-  qlxLogFileClose(vars);  // a formatter that logs while it makes the header has opened it, too
+CxStatus qlxLogFileOpen(QlxLogFile *log, const char *name, int32_t existing) {
+  qlxLogFileClose(log);  // a formatter that logs while it makes the header has opened it, too
   CxFile file = -1;
-  CxStatus status = openName(vars, existing, &file);
+  CxStatus status = openName(log, name, existing, &file);
   if (qlxFailed(status)) return status;
-  claim(vars, file, &vars->file);
-  status = note(vars);
+  claim(log, file, &log->file);
+  status = note(log);
   if (qlxFailed(status)) {
-    CxFileClose(&vars->file);
+    CxFileClose(&log->file);
     return status;
   }
-  vars->log.next = gOpen;
-  gOpen = vars;
-  vars->log.look = {};
-  vars->log.taken = 0;
+  log->next = gOpen;
+  gOpen = log;
+  log->look = {};
+  log->taken = 0;
   return kCxSuccess;
 }
 
 // EBADF also for a number that leads to another file now.
-static CxStatus findOurs(const QlxFileHandlerVars *vars, CxFile file, Found *found) {
+static CxStatus findOurs(const QlxLogFile *log, CxFile file, Found *found) {
   const CxStatus status = findOpen(file, found);
   if (qlxFailed(status)) return status;
-  const bool isOurs = found->device == vars->log.device && found->inode == vars->log.inode;
+  const bool isOurs = found->device == log->device && found->inode == log->inode;
   return isOurs ? status : cxFailure(EBADF);
 }
 
-CxStatus qlxLogFileMeasure(QlxFileHandlerVars *vars) {
+CxStatus qlxLogFileMeasure(QlxLogFile *log) {
   Found found;
-  const CxStatus status = findOurs(vars, vars->file, &found);
+  const CxStatus status = findOurs(log, log->file, &found);
   if (qlxFailed(status)) return status;
-  takeSize(vars, found);
+  takeSize(log, found);
   return kCxSuccess;
 }
 
-CxStatus qlxLogFileClose(QlxFileHandlerVars *vars) {
-  if (!unlinkFromOpen(vars)) return kCxSuccess;  // it was not open
-  qlxLogFileSpend(vars);
-  const bool isOurs = !qlxFailed(qlxLogFileMeasure(vars));
-  if (isOurs) return CxFileClose(&vars->file);
-  vars->log.taken = 1;
-  vars->file = -1;
+CxStatus qlxLogFileClose(QlxLogFile *log) {
+  if (!unlinkFromOpen(log)) return kCxSuccess;  // it was not open
+  qlxLogFileSpend(log);
+  const bool isOurs = !qlxFailed(qlxLogFileMeasure(log));
+  if (isOurs) return CxFileClose(&log->file);
+  log->taken = 1;
+  log->file = -1;
   return kCxSuccess;
 }
 
 // ---- Writing
 
-static CxStatus endTornLine(QlxFileHandlerVars *vars) {
-  if (!vars->log.torn) return kCxSuccess;
-  const CxStatus status = cxFileWriteAll(&vars->file, "\n", 1, &vars->size);
-  vars->log.torn = qlxFailed(status);
+static CxStatus endTornLine(QlxLogFile *log) {
+  if (!log->torn) return kCxSuccess;
+  const CxStatus status = cxFileWriteAll(&log->file, "\n", 1, &log->size);
+  log->torn = qlxFailed(status);
   return status;
 }
 
 // What somebody appended behind the piece stays, and so does the piece then.
-static void cutOff(QlxFileHandlerVars *vars, uint64_t piece) {
-  const off_t end = vars->log.rolls ? lseek(vars->file, 0, SEEK_CUR) : -1;
+static void cutOff(QlxLogFile *log, uint64_t piece) {
+  const off_t end = log->rolls ? lseek(log->file, 0, SEEK_CUR) : -1;
   const off_t start = end - static_cast<off_t>(piece);
-  const bool isLast = end >= 0 && start >= 0 && !qlxFailed(qlxLogFileMeasure(vars)) &&
-                      vars->size == static_cast<uint64_t>(end);
-  const auto cut = [&] { return cxStatusOfCall(ftruncate(vars->file, start) == 0); };
-  vars->log.torn = !isLast || qlxFailed(cxUntilDone(cut));
-  if (vars->log.torn) return (void)endTornLine(vars);  // other processes do not know of the piece
-  vars->size = static_cast<uint64_t>(start);
-  lseek(vars->file, start, SEEK_SET);
+  const bool isLast = end >= 0 && start >= 0 && !qlxFailed(qlxLogFileMeasure(log)) &&
+                      log->size == static_cast<uint64_t>(end);
+  const auto cut = [&] { return cxStatusOfCall(ftruncate(log->file, start) == 0); };
+  log->torn = !isLast || qlxFailed(cxUntilDone(cut));
+  if (log->torn) return (void)endTornLine(log);  // other processes do not know of the piece
+  log->size = static_cast<uint64_t>(start);
+  lseek(log->file, start, SEEK_SET);
 }
 
-CxStatus qlxLogFileWrite(QlxFileHandlerVars *vars, const char *bytes, uint32_t length) {
+CxStatus qlxLogFileWrite(QlxLogFile *log, const char *bytes, uint32_t length) {
   if (length == 0) return kCxSuccess;
   uint64_t written = 0;
-  CxStatus status = endTornLine(vars);
-  if (!qlxFailed(status)) status = cxFileWriteAll(&vars->file, bytes, length, &written);
-  vars->size += written;
+  CxStatus status = endTornLine(log);
+  if (!qlxFailed(status)) status = cxFileWriteAll(&log->file, bytes, length, &written);
+  log->size += written;
   if (!qlxFailed(status)) return status;
-  vars->log.look = {};
-  if (written > 0) cutOff(vars, written);
+  log->look = {};
+  if (written > 0) cutOff(log, written);
   return status;
 }
 
 // ---- The number in reserve
 
-void qlxLogFileReserve(QlxFileHandlerVars *vars) {
-  if (vars->log.reserve >= 0) return;
-  int number = duplicateFrom(kHighNumber, vars->file);
-  if (number == -1) number = duplicateFrom(kFirstFreeNumber, vars->file);
-  if (number != -1) claim(vars, number, &vars->log.reserve);
+void qlxLogFileReserve(QlxLogFile *log) {
+  if (log->reserve >= 0) return;
+  int number = duplicateFrom(kHighNumber, log->file);
+  if (number == -1) number = duplicateFrom(kFirstFreeNumber, log->file);
+  if (number != -1) claim(log, number, &log->reserve);
 }
 
-bool qlxLogFileSpend(QlxFileHandlerVars *vars) {
-  CxFile reserve = vars->log.reserve;
-  vars->log.reserve = -1;
+bool qlxLogFileSpend(QlxLogFile *log) {
+  CxFile reserve = log->reserve;
+  log->reserve = -1;
   Found found;
-  return !qlxFailed(findOurs(vars, reserve, &found)) && !qlxFailed(CxFileClose(&reserve));
+  return !qlxFailed(findOurs(log, reserve, &found)) && !qlxFailed(CxFileClose(&reserve));
 }

@@ -13,18 +13,18 @@
 
 QLX_BEGIN_DECLS
 
-typedef struct QlxFileHandlerVars QlxFileHandlerVars;
-
-// What the variables of a handler have for it beside the descriptor.
-typedef struct QlxLogFile {
-  uint64_t device, inode;    // of what was opened
-  uint8_t rolls;             // 1: a regular file that may be renamed and truncated
-  uint8_t torn;              // 1: ends in a piece of a record
-  uint8_t taken;             // 1: the descriptor was, or it seems so: what it had written is kept
-  CxFile reserve;            // a number to give up when there are none left; -1: none
-  CxLook look;               // at the path and at the descriptor
-  QlxFileHandlerVars *next;  // all handlers with an open file, in no order
-} QlxLogFile;
+struct QlxLogFile {
+  CxFile file;              // -1: closed
+  CxFile reserve;           // a number to give up when there are none left; -1: none
+  uint64_t size;            // bytes in the file: measured before, counted in a write
+  uint64_t device, inode;   // of what was opened
+  uint32_t filePermission;  // of a newly made file, less the process's mask: the nine lowest bits
+  uint8_t rolls;            // 1: a regular file that may be renamed and truncated
+  uint8_t torn;             // 1: ends in a piece of a record
+  uint8_t taken;            // 1: the descriptor was, or it seems so: what it had written is kept
+  CxLook look;              // at the path and at the descriptor
+  QlxLogFile *next;         // all that are open, in no order
+};
 
 /**
  * Opens a file with a number that hosts do not expect: beyond 500 where the limit allows, never one
@@ -32,22 +32,22 @@ typedef struct QlxLogFile {
  */
 CxStatus qlxOpenHigh(CxFile *file, const char *name, int32_t flags, uint32_t mode);
 
-/** Opens the active file, with O_APPEND or O_TRUNC as `existing`, and measures it. After a
+/** Opens the file of a name, with O_APPEND or O_TRUNC as `existing`, and measures it. After a
  * descriptor that was taken away it appends: what was written is no old file's. */
-CxStatus qlxLogFileOpen(QlxFileHandlerVars *vars, int32_t existing);
+CxStatus qlxLogFileOpen(QlxLogFile *log, const char *name, int32_t existing);
 
 /** Sets the size to that of the open file, which has other writers' bytes too. EBADF also when the
  *  number leads to another file now. */
-CxStatus qlxLogFileMeasure(QlxFileHandlerVars *vars);
+CxStatus qlxLogFileMeasure(QlxLogFile *log);
 
 /** Closes what is ours, and forgets the number in any case. */
-CxStatus qlxLogFileClose(QlxFileHandlerVars *vars);
+CxStatus qlxLogFileClose(QlxLogFile *log);
 
 /**
  * Writes all of it; the size counts what was written. A piece of it that was written before a
  * failure is cut off again; where that cannot be, the next bytes start on a line of their own.
  */
-CxStatus qlxLogFileWrite(QlxFileHandlerVars *vars, const char *bytes, uint32_t length);
+CxStatus qlxLogFileWrite(QlxLogFile *log, const char *bytes, uint32_t length);
 
 /** Success for a name that leads to a regular file, ENOENT for one that does not; another error
  *  leaves it open. */
@@ -55,8 +55,8 @@ CxStatus qlxLeadsToFile(const char *name);
 
 /** Keeps a number to give up when there are none left; qlxLogFileSpend() gives it up, and answers
  *  whether there was one. Closing the file gives it up too. */
-void qlxLogFileReserve(QlxFileHandlerVars *vars);
-bool qlxLogFileSpend(QlxFileHandlerVars *vars);
+void qlxLogFileReserve(QlxLogFile *log);
+bool qlxLogFileSpend(QlxLogFile *log);
 
 QLX_END_DECLS
 

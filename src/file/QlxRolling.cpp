@@ -15,24 +15,24 @@
 #include <qlx/files.h>
 #include <qlx/memory.h>
 
-#include "QlxFileNames.h"
+#include "QlxProblems.h"
 #include "util/CxOwned.h"
 #include "util/CxStatus.h"
 
 // Up to so many generations each is tried; for more of them the directory says which are there.
 static constexpr int32_t kMostTried = 100;
 
-static bool succeedsUnlessMissing(QlxFileHandlerVars *vars, Event *event, CxStatus status) {
+static bool succeedsUnlessMissing(const QlxLogNames *files, Event *event, CxStatus status) {
   if (!qlxFailed(status) || status.code == ENOENT) return true;
-  qlxKeepRollover(event, status, vars->fullName);
+  qlxKeepRollover(event, status, files->fullName);
   return false;
 }
 
-static bool removeGeneration(QlxFileHandlerVars *vars, int32_t generation, Event *event) {
+static bool removeGeneration(const QlxLogNames *files, int32_t generation, Event *event) {
   QlxFileName name;
-  qlxFHWriteName(vars, generation, name);
+  qlxFHWriteName(files, generation, name);
   const CxStatus status = cxUntilDone([&] { return CxFileNameRemove(name); });
-  return succeedsUnlessMissing(vars, event, status);
+  return succeedsUnlessMissing(files, event, status);
 }
 
 static CxStatus renameOver(const char *from, const char *to) {
@@ -56,16 +56,16 @@ static CxStatus renameIntoGap(const char *from, const char *to) {
 
 using Rename = CxStatus(const char *from, const char *to);
 
-static bool moveUp(QlxFileHandlerVars *vars, int32_t generation, Rename *move, Event *event) {
+static bool moveUp(const QlxLogNames *files, int32_t generation, Rename *move, Event *event) {
   QlxFileName from, to;
-  qlxFHWriteName(vars, generation, from);
-  qlxFHWriteName(vars, generation + 1, to);
-  return succeedsUnlessMissing(vars, event, move(from, to));
+  qlxFHWriteName(files, generation, from);
+  qlxFHWriteName(files, generation + 1, to);
+  return succeedsUnlessMissing(files, event, move(from, to));
 }
 
-static bool exists(const QlxFileHandlerVars *vars, int32_t generation) {
+static bool exists(const QlxLogNames *files, int32_t generation) {
   QlxFileName name;
-  qlxFHWriteName(vars, generation, name);
+  qlxFHWriteName(files, generation, name);
   struct stat info;
   return lstat(name, &info) == 0 || errno != ENOENT;
 }
@@ -122,65 +122,65 @@ static int32_t numberOf(std::string_view name, std::string_view base, const char
 }
 
 // False when the directory cannot be read, or memory ran out.
-static bool listGenerations(const QlxFileHandlerVars *vars, Numbers *numbers) {
-  if (OslStringChr(vars->extPart, '/')) return false;  // each is in a directory of its own
-  const Directory directory{opendir(vars->dirPart ? vars->dirPart : ".")};
+static bool listGenerations(const QlxLogNames *files, Numbers *numbers) {
+  if (OslStringChr(files->extPart, '/')) return false;  // each is in a directory of its own
+  const Directory directory{opendir(files->dirPart ? files->dirPart : ".")};
   if (!directory) return false;
-  const std::string_view base{vars->basePart + (vars->basePart[0] == '/')};
+  const std::string_view base{files->basePart + (files->basePart[0] == '/')};
   for (;;) {
     errno = 0;
     const dirent *entry = readdir(directory.get());
     if (!entry) return errno == 0;
-    const int32_t number = numberOf(entry->d_name, base, vars->extPart);
-    if (number > 0 && number < vars->maxFiles && !numbers->add(number)) return false;
+    const int32_t number = numberOf(entry->d_name, base, files->extPart);
+    if (number > 0 && number < files->maxFiles && !numbers->add(number)) return false;
   }
 }
 
 // ---- Moving
 
-static bool shiftTried(QlxFileHandlerVars *vars, Event *event) {
-  for (int32_t i = vars->maxFiles - 2; i >= 1; --i) {
-    if (!moveUp(vars, i, renameOver, event)) return false;
+static bool shiftTried(const QlxLogNames *files, Event *event) {
+  for (int32_t i = files->maxFiles - 2; i >= 1; --i) {
+    if (!moveUp(files, i, renameOver, event)) return false;
   }
   return true;
 }
 
-static bool shiftListed(QlxFileHandlerVars *vars, Numbers &numbers, Event *event) {
+static bool shiftListed(const QlxLogNames *files, Numbers &numbers, Event *event) {
   std::sort(numbers.begin(), numbers.end(), std::greater<>());
   for (const int32_t number : numbers) {
-    if (number < vars->maxFiles - 1 && !moveUp(vars, number, renameOver, event)) return false;
+    if (number < files->maxFiles - 1 && !moveUp(files, number, renameOver, event)) return false;
   }
   return true;
 }
 
-bool qlxShiftGenerations(QlxFileHandlerVars *vars, Event *event) {
-  if (vars->maxFiles < 2) return false;
+bool qlxShiftGenerations(const QlxLogNames *files, Event *event) {
+  if (files->maxFiles < 2) return false;
   Numbers numbers;
-  const bool fewEnough = vars->maxFiles <= kMostTried;
-  if (!fewEnough && !listGenerations(vars, &numbers)) return qlxFreeFirstGeneration(vars, event);
-  removeGeneration(vars, vars->maxFiles - 1, event);  // what stays is replaced
-  return fewEnough ? shiftTried(vars, event) : shiftListed(vars, numbers, event);
+  const bool fewEnough = files->maxFiles <= kMostTried;
+  if (!fewEnough && !listGenerations(files, &numbers)) return qlxFreeFirstGeneration(files, event);
+  removeGeneration(files, files->maxFiles - 1, event);  // what stays is replaced
+  return fewEnough ? shiftTried(files, event) : shiftListed(files, numbers, event);
 }
 
-bool qlxFreeFirstGeneration(QlxFileHandlerVars *vars, Event *event) {
-  if (vars->maxFiles < 2) return false;
-  const int32_t last = vars->maxFiles - 1;
+bool qlxFreeFirstGeneration(const QlxLogNames *files, Event *event) {
+  if (files->maxFiles < 2) return false;
+  const int32_t last = files->maxFiles - 1;
   int32_t gap = 1;
-  while (gap < last && exists(vars, gap)) ++gap;
-  if (gap == last && !removeGeneration(vars, last, event)) return false;
+  while (gap < last && exists(files, gap)) ++gap;
+  if (gap == last && !removeGeneration(files, last, event)) return false;
   for (int32_t i = gap - 1; i >= 1; --i) {
-    if (!moveUp(vars, i, renameIntoGap, event)) return false;
+    if (!moveUp(files, i, renameIntoGap, event)) return false;
   }
   return true;
 }
 
 // What the system will say, as far as that can be foretold: else each process of a service that is
 // started again and again would find it out at the cost of a generation.
-static bool mayMoveActiveFile(const QlxFileHandlerVars *vars) {
+static bool mayMoveActiveFile(const QlxLogNames *files) {
   QlxFileName name;
-  qlxFHWriteName(vars, 0, name);
+  qlxFHWriteName(files, 0, name);
   struct statx file, directory;
-  const char *const parent = vars->dirPart ? vars->dirPart : ".";
+  const char *const parent = files->dirPart ? files->dirPart : ".";
   if (statx(AT_FDCWD, name, AT_SYMLINK_NOFOLLOW, STATX_UID, &file) != 0) return true;
   if (file.stx_attributes & (STATX_ATTR_APPEND | STATX_ATTR_IMMUTABLE)) return false;
   if (statx(AT_FDCWD, parent, 0, STATX_MODE | STATX_UID, &directory) != 0) return true;
@@ -189,11 +189,11 @@ static bool mayMoveActiveFile(const QlxFileHandlerVars *vars) {
   return isOwner || !(directory.stx_mode & S_ISVTX);
 }
 
-bool qlxMoveActiveFile(QlxFileHandlerVars *vars) {
-  if (vars->maxFiles < 2) return false;
-  vars->stuck = vars->stuck || !mayMoveActiveFile(vars);
-  const auto makeRoom = vars->stuck ? qlxFreeFirstGeneration : qlxShiftGenerations;
-  const auto move = vars->stuck ? renameIntoGap : renameOver;
-  vars->stuck = !makeRoom(vars, nullptr) || !moveUp(vars, 0, move, nullptr);
-  return !vars->stuck;
+bool qlxMoveActiveFile(QlxGenerations *files) {
+  if (files->maxFiles < 2) return false;
+  files->stuck = files->stuck || !mayMoveActiveFile(files);
+  const auto makeRoom = files->stuck ? qlxFreeFirstGeneration : qlxShiftGenerations;
+  const auto move = files->stuck ? renameIntoGap : renameOver;
+  files->stuck = !makeRoom(files, nullptr) || !moveUp(files, 0, move, nullptr);
+  return !files->stuck;
 }

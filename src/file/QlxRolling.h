@@ -10,19 +10,23 @@
 #ifndef QLX_SRC_QLXROLLING_H
 #define QLX_SRC_QLXROLLING_H
 
-#include "QlxFileHandler.h"
+#include "QlxFileNames.h"
 
 QLX_BEGIN_DECLS
 
+struct QlxGenerations : QlxLogNames {
+  uint8_t stuck;  // 1: the last rollover could not move or empty the active file
+};
+
 /** Moves all but the active file. False when a move failed. */
-bool qlxShiftGenerations(QlxFileHandlerVars *vars, Event *event);
+bool qlxShiftGenerations(const QlxLogNames *files, Event *event);
 
 /** Moves the generations below the lowest gap; without a gap the oldest goes first. False when the
  *  first generation is still there. */
-bool qlxFreeFirstGeneration(QlxFileHandlerVars *vars, Event *event);
+bool qlxFreeFirstGeneration(const QlxLogNames *files, Event *event);
 
 /** Moves all, the active file too, which may be open. False when that stays where it is. */
-bool qlxMoveActiveFile(QlxFileHandlerVars *vars);
+bool qlxMoveActiveFile(QlxGenerations *files);
 
 QLX_END_DECLS
 

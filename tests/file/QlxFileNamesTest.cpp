@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 #include <cerrno>
-#include <memory>
 #include <string>
 
 #include <sys/stat.h>
@@ -26,14 +25,14 @@ std::string currentDirectory() {
   return std::filesystem::current_path();
 }
 
-struct FreeVars {
-  void operator()(QlxFileHandlerVars *vars) const { QlxFileHandlerFFreeVars(vars); }
+struct Names : QlxLogNames {
+  Names() : QlxLogNames{} {}
+  ~Names() {
+    for (char *part : {dirPart, basePart, extPart}) OslMemoryFree(part);
+  }
+  Names(const Names &) = delete;
+  Names &operator=(const Names &) = delete;
 };
-using Vars = std::unique_ptr<QlxFileHandlerVars, FreeVars>;
-
-Vars makeVars() {
-  return Vars{static_cast<QlxFileHandlerVars *>(QlxFileHandlerFAllocVars())};
-}
 
 // ---- The digit before the last dot
 
@@ -79,13 +78,13 @@ class FileNameParts : public ::testing::TestWithParam<PartsCase> {};
 
 TEST_P(FileNameParts, AreTakenApart) {
   const PartsCase &wanted = GetParam();
-  const Vars vars = makeVars();
-  qlxFHGetFileNameParts(wanted.name, vars.get());
-  const std::string dir = show(vars->dirPart);
+  Names names;
+  qlxFHGetFileNameParts(wanted.name, &names);
+  const std::string dir = show(names.dirPart);
   EXPECT_EQ(dir == currentDirectory() ? "<cwd>" : dir, wanted.dir);
-  EXPECT_EQ(show(vars->basePart), wanted.base);
-  EXPECT_EQ(vars->generation, wanted.generation);
-  EXPECT_EQ(show(vars->extPart), wanted.ext);
+  EXPECT_EQ(show(names.basePart), wanted.base);
+  EXPECT_EQ(names.generation, wanted.generation);
+  EXPECT_EQ(show(names.extPart), wanted.ext);
 }
 
 INSTANTIATE_TEST_SUITE_P(
@@ -110,28 +109,25 @@ INSTANTIATE_TEST_SUITE_P(
         PartsCase{"app0", "<cwd>", "app", 0, "<null>"},
         PartsCase{"a1/b2.c3", "a1", "/b", 2, "c3"}));
 
-TEST(FileNames, LeaveThePartsEmptyForNullWhateverLogInternalErrsSays) {
-  const Vars vars = makeVars();
-  for (uint8_t flag : {1, 0}) {
-    qlxFHGetFileNameParts("logs/app3.log", vars.get());
-    vars->logInternalErrs = flag;
-    qlxFHGetFileNameParts(nullptr, vars.get());
-    EXPECT_EQ(vars->dirPart, nullptr);
-    EXPECT_EQ(vars->basePart, nullptr);
-    EXPECT_EQ(vars->extPart, nullptr);
-    EXPECT_EQ(vars->generation, 0);
-  }
+TEST(FileNames, LeaveThePartsEmptyForNull) {
+  Names names;
+  qlxFHGetFileNameParts("logs/app3.log", &names);
+  qlxFHGetFileNameParts(nullptr, &names);
+  EXPECT_EQ(names.dirPart, nullptr);
+  EXPECT_EQ(names.basePart, nullptr);
+  EXPECT_EQ(names.extPart, nullptr);
+  EXPECT_EQ(names.generation, 0);
 }
 
 TEST(FileNames, HaveAtMost256Bytes) {
-  const Vars vars = makeVars();
+  Names names;
   const std::string longest = "d/" + std::string(254, 'x');
-  qlxFHGetFileNameParts(longest.c_str(), vars.get());
-  EXPECT_EQ(show(vars->basePart), "/" + std::string(254, 'x'));
-  EXPECT_EQ(show(vars->dirPart), "d");
-  qlxFHGetFileNameParts((longest + "x").c_str(), vars.get());
-  EXPECT_EQ(vars->basePart, nullptr);
-  EXPECT_EQ(vars->dirPart, nullptr);
+  qlxFHGetFileNameParts(longest.c_str(), &names);
+  EXPECT_EQ(show(names.basePart), "/" + std::string(254, 'x'));
+  EXPECT_EQ(show(names.dirPart), "d");
+  qlxFHGetFileNameParts((longest + "x").c_str(), &names);
+  EXPECT_EQ(names.basePart, nullptr);
+  EXPECT_EQ(names.dirPart, nullptr);
 }
 
 TEST(FileNames, IgnoreNullVariables) {
@@ -144,35 +140,35 @@ TEST(FileNames, HaveNoDirectoryWhenTheWorkingDirectoryIsGone) {
   std::filesystem::create_directory(gone);
   const WorkingDir here{gone};
   std::filesystem::remove(gone);
-  const Vars vars = makeVars();
-  ASSERT_NE(vars, nullptr);
-  EXPECT_EQ(vars->dirPart, nullptr);
-  EXPECT_EQ(show(vars->fullName), "default.log");
+  Names names;
+  qlxFHGetFileNameParts("default.log", &names);
+  EXPECT_EQ(names.dirPart, nullptr);
+  EXPECT_EQ(take(qlxFHGenerationName(&names, 0)), "default.log");
 }
 
 TEST(FileNames, AreAllOrNothingWhenMemoryRunsOut) {
-  const Vars vars = makeVars();
+  Names names;
   for (uint64_t nth = 1;; ++nth) {
-    qlxFHGetFileNameParts("x1/y2.z3", vars.get());
+    qlxFHGetFileNameParts("x1/y2.z3", &names);
     uint64_t failures;
     {
       FailingMemory memory;
       memory.failOnce(nth);
-      qlxFHGetFileNameParts("logs/app4.log", vars.get());
+      qlxFHGetFileNameParts("logs/app4.log", &names);
       failures = memory.failures();
     }
     if (failures == 0) {
       EXPECT_EQ(nth, 4u);  // three parts
       break;
     }
-    EXPECT_EQ(vars->dirPart, nullptr);
-    EXPECT_EQ(vars->basePart, nullptr);
-    EXPECT_EQ(vars->extPart, nullptr);
-    EXPECT_EQ(vars->generation, 0);
-    EXPECT_EQ(qlxFHCheckNames(vars.get()).code, ENOMEM);
+    EXPECT_EQ(names.dirPart, nullptr);
+    EXPECT_EQ(names.basePart, nullptr);
+    EXPECT_EQ(names.extPart, nullptr);
+    EXPECT_EQ(names.generation, 0);
+    EXPECT_EQ(qlxFHCheckNames(&names).code, ENOMEM);
   }
-  EXPECT_EQ(show(vars->dirPart), "logs");
-  EXPECT_EQ(qlxFHCheckNames(vars.get()).kind, '-');
+  EXPECT_EQ(show(names.dirPart), "logs");
+  EXPECT_EQ(qlxFHCheckNames(&names).kind, '-');
 }
 
 // ---- Putting together

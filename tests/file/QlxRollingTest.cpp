@@ -11,7 +11,7 @@
 
 #include <qlx/class/handler.h>
 
-#include "file/QlxFileNames.h"
+#include "QlxFileHandler.h"
 #include "support/FailingMemory.h"
 #include "support/SystemCalls.h"
 #include "support/TempDir.h"

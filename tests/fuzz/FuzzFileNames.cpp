@@ -17,38 +17,38 @@ static std::string_view text(const char *part) {
   return part ? part : "";
 }
 
-static std::string generationName(const QlxFileHandlerVars &vars, int32_t generation) {
-  return take(qlxFHGenerationName(&vars, generation));
+static std::string generationName(const QlxLogNames &names, int32_t generation) {
+  return take(qlxFHGenerationName(&names, generation));
 }
 
 // What follows the base must be the number and the extension.
-static void checkRest(std::string_view rest, const QlxFileHandlerVars &vars) {
+static void checkRest(std::string_view rest, const QlxLogNames &names) {
   const size_t digits = std::min(rest.find_first_not_of("0123456789"), rest.size());
-  if (vars.generation != 0) require(digits > 0);
+  if (names.generation != 0) require(digits > 0);
   rest.remove_prefix(digits);
-  require(vars.extPart ? rest == "." + std::string(vars.extPart) : rest.empty());
+  require(names.extPart ? rest == "." + std::string(names.extPart) : rest.empty());
 }
 
 static void checkParts(const std::string &name) {
-  QlxFileHandlerVars vars = {};
-  qlxFHGetFileNameParts(name.c_str(), &vars);
-  require((vars.basePart != nullptr) == (name.size() <= 256));
-  if (vars.basePart) {
+  QlxLogNames names = {};
+  qlxFHGetFileNameParts(name.c_str(), &names);
+  require((names.basePart != nullptr) == (name.size() <= 256));
+  if (names.basePart) {
     char native[257];
     qlxGetNativePath(name.c_str(), native);
     std::string_view rest = native;
-    const std::string_view base = vars.basePart;
+    const std::string_view base = names.basePart;
     // A directory that is not in the name is the working directory.
-    const std::string_view dir = text(vars.dirPart);
+    const std::string_view dir = text(names.dirPart);
     const std::string inName = std::string(dir) + std::string(base);
     rest.remove_prefix(rest.starts_with(inName) ? inName.size() : base.size());
     require(base.empty() || base.back() < '0' || base.back() > '9');
-    checkRest(rest, vars);
-    const std::string names[] = {generationName(vars, 0), generationName(vars, 1),
-                                 generationName(vars, 10)};
-    require(names[0] != names[1] && names[1] != names[2] && names[0] != names[2]);
+    checkRest(rest, names);
+    const std::string all[] = {generationName(names, 0), generationName(names, 1),
+                               generationName(names, 10)};
+    require(all[0] != all[1] && all[1] != all[2] && all[0] != all[2]);
   }
-  for (char *part : {vars.dirPart, vars.basePart, vars.extPart}) OslMemoryFree(part);
+  for (char *part : {names.dirPart, names.basePart, names.extPart}) OslMemoryFree(part);
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size) {

@@ -81,7 +81,7 @@ class BurstTest : public FileHandlerTest {
   // So many records that those of this tick share the last look.
   void burst() {
     log(u"first");
-    lookOften(&vars()->log.look);
+    lookOften(&vars()->look);
     for (int i = 0; i < kLooksATick; ++i) log(u"looking");
   }
 

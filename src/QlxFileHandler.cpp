@@ -12,11 +12,11 @@
 #include <qlx/memory.h>
 #include <qlx/toolkit.h>
 
+#include "QlxObject.h"
+#include "QlxProps.h"
 #include "object/QlxClasses.h"
 #include "object/QlxObjClass.h"
 #include "object/QlxConfigKeys.h"
-#include "QlxObject.h"
-#include "QlxProps.h"
 #include "util/CxStatus.h"
 
 static constexpr const char *kFirstFileName = "default.log";

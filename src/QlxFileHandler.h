@@ -5,24 +5,21 @@
 #include <qlx/class/handler.h>
 #include <qlx/types.h>
 
-#include "file/QlxLogFile.h"
 #include "file/QlxProblems.h"
-#include "file/QlxRolling.h"
+#include "file/QlxSharedFile.h"
 #include "file/QlxSharedLock.h"
 #include "record/QlxFormatted.h"
 
 QLX_BEGIN_DECLS
 
 // What the modules of src/file know of the file, and the settings that are the handlers' own.
-struct QlxFileHandlerVars : QlxGenerations, QlxLogFile, QlxSharedLock {
+struct QlxFileHandlerVars : QlxSharedFile, QlxSharedLock {
   uint8_t opened;           // 1 while the active file is open and has its header
   int32_t maxBytes;         // a file of this size is full; compares as unsigned, so -1 is never
   char *encoding;           // owned: "fileEncoding", kept without effect; null at first
   uint32_t dirPermission;   // of a newly made directory, exactly: the nine lowest bits
   uint8_t appending;        // 1: keep what an existing file holds; 0: empty it on every open
   uint8_t logInternalErrs;  // kept without effect
-  uint8_t keepFullFile;     // 1: a file that could not be copied is not emptied
-  int64_t stuckSince;       // tick of the last try of a shared file's rollover that failed
 };
 
 /** Removes the oldest generation and moves every other file, the active one too, up by one. The

@@ -35,7 +35,7 @@ static void nameActiveFile(QlxFileHandlerVars *vars, const char *name) {
   OslMemoryFree(vars->fullName);
   vars->fullName = qlxFHGenerationName(vars, vars->generation);
   if (vars->basePart && !vars->fullName) vars->nameError = ENOMEM;
-  vars->stuck = vars->torn = vars->taken = 0;  // those were of another file
+  vars->rollFailed = vars->torn = vars->keepWritten = 0;  // those were of another file
 }
 
 static void closeFile(QlxFileHandlerVars *vars) {
@@ -128,14 +128,14 @@ static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
   if (qlxFailed(status)) {
     qlxKeepFailure(nullptr, status);
     closeFile(vars);
-    vars->taken = 1;
+    vars->keepWritten = 1;
     return false;
   }
   if (!vars->rolls) return true;
   const CxStatus there = qlxLeadsToFile(vars->fullName);
   if (qlxFailed(there)) {
     QlxFileHandlerFClose(handler);
-    vars->taken |= there.code != ENOENT;  // it may be there with all that was written
+    vars->keepWritten |= there.code != ENOENT;  // it may be there with all that was written
     return false;
   }
   return !qlxFileHandlerIsFull(vars) || !rollOver(handler, vars);

@@ -483,7 +483,7 @@ TEST_F(MultiProcFileHandlerTest, EmptiesTheFileAlsoWhenTheDiskIsTooFullForTheCop
     EXPECT_FALSE(dir.has("disk/app1.log"));
     EXPECT_EQ(dir.read("disk/app.log").size(), whole * 1000 + 8 + 5);
     set("keepFullFile", "false");
-    vars()->stuck = 0;
+    vars()->rollFailed = 0;
     EXPECT_EQ(logged(u"next"), failure(ENOSPC));
     EXPECT_EQ(dir.read("disk/app1.log"), "");
     EXPECT_EQ(dir.read("disk/app.log"), "next\n");

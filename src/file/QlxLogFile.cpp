@@ -1,3 +1,4 @@
+// What a path and a descriptor lead to, the numbers of descriptors, and the steps on the open file.
 #include "QlxLogFile.h"
 
 #include <cerrno>
@@ -115,7 +116,7 @@ static CxStatus openName(QlxLogFile *log, const char *name, int32_t existing, Cx
   Found found = {};
   const bool exists = !qlxFailed(find(AT_FDCWD, name, 0, &found));
   const bool isFile = !exists || (found.isRegular && !isDescriptorsName(name));
-  if (log->taken) existing = O_APPEND;
+  if (log->keepWritten) existing = O_APPEND;
   const int32_t flags = isFile ? O_CREAT | O_RDWR | existing : O_WRONLY | O_APPEND | O_NONBLOCK;
   const CxStatus status = qlxOpenHigh(file, name, flags, log->filePermission);
   log->rolls = isFile;
@@ -153,7 +154,7 @@ CxStatus qlxLogFileOpen(QlxLogFile *log, const char *name, int32_t existing) {
   log->next = gOpen;
   gOpen = log;
   log->look = {};
-  log->taken = 0;
+  log->keepWritten = 0;
   return kCxSuccess;
 }
 
@@ -178,7 +179,7 @@ CxStatus qlxLogFileClose(QlxLogFile *log) {
   qlxLogFileSpend(log);
   const bool isOurs = !qlxFailed(qlxLogFileMeasure(log));
   if (isOurs) return CxFileClose(&log->file);
-  log->taken = 1;
+  log->keepWritten = 1;
   log->file = -1;
   return kCxSuccess;
 }

@@ -1,6 +1,7 @@
-// The open log file of a handler: a descriptor that the process's host may close, and put a file of
-// its own in its place. So it has a high number, and what it leads to is compared with what was
-// opened before it is measured, truncated or closed; one that is no longer ours is left alone.
+// The open log file of a handler: opened, measured, written and closed here, and nowhere else. Its
+// descriptor is one that the process's host may close, and put a file of its own in its place. So
+// it has a high number, and what it leads to is compared with what was opened before it is
+// measured, truncated or closed; one that is no longer ours is left alone.
 //
 // What is no regular file (a FIFO, a device, a terminal) is opened once, written without waiting,
 // and otherwise left as it is: no rollover, no truncation, no look.
@@ -21,7 +22,7 @@ struct QlxLogFile {
   uint32_t filePermission;  // of a newly made file, less the process's mask: the nine lowest bits
   uint8_t rolls;            // 1: a regular file that may be renamed and truncated
   uint8_t torn;             // 1: ends in a piece of a record
-  uint8_t taken;            // 1: the descriptor was, or it seems so: what it had written is kept
+  uint8_t keepWritten;      // 1: what the name leads to may be what this wrote: not to be emptied
   CxLook look;              // at the path and at the descriptor
   QlxLogFile *next;         // all that are open, in no order
 };
@@ -32,8 +33,8 @@ struct QlxLogFile {
  */
 CxStatus qlxOpenHigh(CxFile *file, const char *name, int32_t flags, uint32_t mode);
 
-/** Opens the file of a name, with O_APPEND or O_TRUNC as `existing`, and measures it. After a
- * descriptor that was taken away it appends: what was written is no old file's. */
+/** Opens the file of a name, with O_APPEND or O_TRUNC as `existing`, and measures it. With
+ * keepWritten, as after a descriptor that was taken away, it appends whatever `existing` says. */
 CxStatus qlxLogFileOpen(QlxLogFile *log, const char *name, int32_t existing);
 
 /** Sets the size to that of the open file, which has other writers' bytes too. EBADF also when the

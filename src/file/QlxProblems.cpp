@@ -1,3 +1,4 @@
+// Failures are reported, stored in their event, and counted for qlxIntlGetHandlerProblems().
 #include "QlxProblems.h"
 
 #include <qlx/class/handler.h>

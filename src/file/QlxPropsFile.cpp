@@ -1,3 +1,5 @@
+// Opening, refusing what may never end, and reading to the end; what the bytes say is read
+// elsewhere.
 #include "QlxPropsFile.h"
 
 #include <algorithm>

@@ -1,3 +1,4 @@
+// The generations that are there, found by trying or by the directory, and the moves of each.
 #include "QlxRolling.h"
 
 #include <algorithm>
@@ -191,9 +192,9 @@ static bool mayMoveActiveFile(const QlxLogNames *files) {
 
 bool qlxMoveActiveFile(QlxGenerations *files) {
   if (files->maxFiles < 2) return false;
-  files->stuck = files->stuck || !mayMoveActiveFile(files);
-  const auto makeRoom = files->stuck ? qlxFreeFirstGeneration : qlxShiftGenerations;
-  const auto move = files->stuck ? renameIntoGap : renameOver;
-  files->stuck = !makeRoom(files, nullptr) || !moveUp(files, 0, move, nullptr);
-  return !files->stuck;
+  files->rollFailed = files->rollFailed || !mayMoveActiveFile(files);
+  const auto makeRoom = files->rollFailed ? qlxFreeFirstGeneration : qlxShiftGenerations;
+  const auto move = files->rollFailed ? renameIntoGap : renameOver;
+  files->rollFailed = !makeRoom(files, nullptr) || !moveUp(files, 0, move, nullptr);
+  return !files->rollFailed;
 }

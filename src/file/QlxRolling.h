@@ -15,7 +15,7 @@
 QLX_BEGIN_DECLS
 
 struct QlxGenerations : QlxLogNames {
-  uint8_t stuck;  // 1: the last rollover could not move or empty the active file
+  uint8_t rollFailed;  // 1: the active file could not be moved or emptied when it was full
 };
 
 /** Moves all but the active file. False when a move failed. */

@@ -1,3 +1,4 @@
+// The copy of a shared file, the emptying of it, and when one that stays full is tried again.
 #include "QlxSharedFile.h"
 
 #include <array>
@@ -117,13 +118,13 @@ bool qlxSharedFileCopyAndEmpty(QlxSharedFile *shared, Event *event) {
 // ---- A file that stays full
 
 bool qlxSharedFileWaits(const QlxSharedFile *shared) {
-  return shared->stuck && cxLookTick() - shared->lastRollTry < kNanosecondsBetweenTries;
+  return shared->rollFailed && cxLookTick() - shared->lastRollTry < kNanosecondsBetweenTries;
 }
 
 void qlxSharedFileRollOver(QlxSharedFile *shared, Event *event) {
-  const bool mayComeAgain = shared->keepFullFile || shared->stuck;
+  const bool mayComeAgain = shared->keepFullFile || shared->rollFailed;
   const auto makeRoom = mayComeAgain ? qlxFreeFirstGeneration : qlxShiftGenerations;
   const bool hasRoom = makeRoom(shared, event) || !shared->keepFullFile;
-  shared->stuck = !hasRoom || !qlxSharedFileCopyAndEmpty(shared, event);
+  shared->rollFailed = !hasRoom || !qlxSharedFileCopyAndEmpty(shared, event);
   shared->lastRollTry = cxLookTick();
 }

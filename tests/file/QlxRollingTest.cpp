@@ -165,10 +165,10 @@ TEST_F(Generations, GoOnWhereAMoveFailed) {
   dir.write("app1.log", "1");
   dir.write("app2.log", "2");
   dir.write("app4.log", "4");
-  vars->stuck = 1;  // 3 was moved, and the move of 2 failed
+  vars->rollFailed = 1;  // 3 was moved, and the move of 2 failed
   EXPECT_TRUE(qlxMoveActiveFile(vars.get()));
   EXPECT_EQ(contents(), "-0124");
-  EXPECT_EQ(vars->stuck, 0);
+  EXPECT_EQ(vars->rollFailed, 0);
 }
 
 TEST_F(Generations, MoveTheActiveFileAloneOnceThatIsAllThatIsLeft) {
@@ -176,7 +176,7 @@ TEST_F(Generations, MoveTheActiveFileAloneOnceThatIsAllThatIsLeft) {
   dir.write("app.log", "0");
   dir.write("app2.log", "2");
   dir.write("app3.log", "3");
-  vars->stuck = 1;
+  vars->rollFailed = 1;
   EXPECT_TRUE(qlxMoveActiveFile(vars.get()));
   EXPECT_EQ(contents(), "-023-");
 }
@@ -184,7 +184,7 @@ TEST_F(Generations, MoveTheActiveFileAloneOnceThatIsAllThatIsLeft) {
 // What the look for a gap saw need not be true any more when the file is moved.
 TEST_F(Generations, NeverReplaceAFileThatTookTheGapMeanwhile) {
   vars->maxFiles = 3;
-  vars->stuck = 1;
+  vars->rollFailed = 1;
   dir.write("app.log", "0");
   FileThatAppears appears{dir.path("app1.log"), "1"};
   EXPECT_FALSE(qlxMoveActiveFile(vars.get()));

@@ -1,4 +1,5 @@
-// The table of docs/architecture.md against the sources: every module has its place there.
+// The table of docs/architecture.md against the sources: every module has its place there. And
+// src/file/README.md: what the modules of that folder include.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -40,6 +41,32 @@ std::set<std::string> modules() {
 
 TEST(ArchitecturePageTest, HasEveryModuleInItsTableAndNoOther) {
   EXPECT_EQ(namesOfTheTable(), modules());
+}
+
+// Headers of the project that are included with their folder, or stand beside the source.
+std::set<std::string> includesOf(const std::filesystem::path &source) {
+  std::ifstream in(source);
+  static const std::regex include("#include \"(.+)\"");
+  std::set<std::string> found;
+  std::smatch match;
+  for (std::string line; std::getline(in, line);) {
+    if (std::regex_match(line, match, include)) found.insert(match[1]);
+  }
+  return found;
+}
+
+TEST(ArchitecturePageTest, HasNothingAboveThemInWhatTheFilesOfSrcFileInclude) {
+  int sources = 0;
+  for (const auto &entry : std::filesystem::directory_iterator(root() / "src/file")) {
+    if (entry.path().extension() == ".md") continue;
+    ++sources;
+    for (const std::string &name : includesOf(entry.path())) {
+      const bool isBeside = name.find('/') == std::string::npos &&
+                            std::filesystem::exists(entry.path().parent_path() / name);
+      EXPECT_TRUE(isBeside || name.starts_with("util/")) << entry.path() << " includes " << name;
+    }
+  }
+  EXPECT_GT(sources, 10);
 }
 
 }  // namespace

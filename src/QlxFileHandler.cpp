@@ -116,12 +116,25 @@ static bool rollOver(QlxObject *handler, QlxFileHandlerVars *vars) {
   if (!qlxMoveActiveFile(vars)) return false;
   QlxFileHandlerFClose(handler);  // the trailer goes into the full file
   vars->size = 0;
+  vars->keepWritten |= vars->followName;  // another writer may be the first in the new file
   return true;
 }
 
-// Whether the open file can take the next event; if not it is closed. Deliberate: another regular
-// file under its name is not noticed, what is open goes on. Between two looks own bytes are
-// counted; what the count calls full is measured.
+// Closes a file to which its name leads no more. Deliberate: without followName another regular
+// file under the name is not noticed, what is open goes on. With it what stands there is somebody
+// else's, and appended to.
+static bool leaveIfNotNamed(QlxObject *handler, QlxFileHandlerVars *vars) {
+  bool isOther = false;
+  const CxStatus there = qlxLogFileFindName(vars, vars->fullName, &isOther);
+  if (!qlxFailed(there) && !(isOther && vars->followName)) return false;
+  QlxFileHandlerFClose(handler);
+  const bool mayBeThere = there.code != ENOENT;  // with all that was written
+  vars->keepWritten |= mayBeThere || vars->followName;
+  return true;
+}
+
+// Whether the open file can take the next event; if not it is closed. Between two looks own bytes
+// are counted; what the count calls full is measured.
 static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
   if (!cxLookAgain(&vars->look) && !qlxFileHandlerIsFull(vars)) return true;
   const CxStatus status = qlxLogFileMeasure(vars);
@@ -132,12 +145,7 @@ static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
     return false;
   }
   if (!vars->rolls) return true;
-  const CxStatus there = qlxLeadsToFile(vars->fullName);
-  if (qlxFailed(there)) {
-    QlxFileHandlerFClose(handler);
-    vars->keepWritten |= there.code != ENOENT;  // it may be there with all that was written
-    return false;
-  }
+  if (leaveIfNotNamed(handler, vars)) return false;
   return !qlxFileHandlerIsFull(vars) || !rollOver(handler, vars);
 }
 
@@ -240,10 +248,11 @@ static void applyLogInternalErrs(QlxObject *handler, const char *) {
   qlxFileHandlerVars(handler)->logInternalErrs = appendingProperty(handler);
 }
 
-static void applyKeepFullFile(QlxObject *handler, const char *key) {
+template <auto Field>
+static void applyBool(QlxObject *handler, const char *key) {
   uint8_t found = 0;
   const uint8_t value = qlxIntlGetObjPropBool(handler, key, &found);
-  closeForChange(handler)->keepFullFile = found ? value : 0;
+  closeForChange(handler)->*Field = found ? value : 0;
 }
 
 static void applyFileName(QlxObject *handler, const char *key) {
@@ -292,7 +301,8 @@ static constexpr ConfigKey kFileHandlerKeys[] = {
     {"fileEncoding", applyEncoding},
     {"MPFileSemKey", applyInt<&QlxFileHandlerVars::semKey, 0>},
     {"logInternalErrs", applyLogInternalErrs},
-    {"keepFullFile", applyKeepFullFile},
+    {"keepFullFile", applyBool<&QlxFileHandlerVars::keepFullFile>},
+    {"followName", applyBool<&QlxFileHandlerVars::followName>},
 };
 
 void QlxFileHandlerFCfgChange(QlxObject *handler, const char *key) {

@@ -19,6 +19,7 @@ struct QlxFileHandlerVars : QlxSharedFile, QlxSharedLock {
   char *encoding;           // owned: "fileEncoding", kept without effect; null at first
   uint32_t dirPermission;   // of a newly made directory, exactly: the nine lowest bits
   uint8_t appending;        // 1: keep what an existing file holds; 0: empty it on every open
+  uint8_t followName;       // 1: go on in another regular file that took the name
   uint8_t logInternalErrs;  // kept without effect
 };
 

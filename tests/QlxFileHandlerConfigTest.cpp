@@ -129,7 +129,8 @@ TEST_F(FileHandlerTest, ClosesForEveryKeyButTwo) {
   const char *const keys[] = {"fileName",     "maxFileSize",  "maxFileBytes",   "maxFiles",
                               "appending",    "fileEncoding", "filePermission", "dirPermission",
                               "MPFileSemKey", "logging",      "listenerNames",  "formatterName",
-                              "description",  "unknown",      "FileName"};
+                              "description",  "keepFullFile", "followName",     "unknown",
+                              "FileName"};
   for (const char *key : keys) {
     set("fileName", dir.path("app.log"));
     log(u"1");

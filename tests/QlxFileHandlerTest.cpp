@@ -33,6 +33,8 @@ TEST_F(FileHandlerTest, StartsWithItsInitialValues) {
   EXPECT_EQ(fresh->semKey, 31821);
   EXPECT_EQ(fresh->semId, -1);
   EXPECT_EQ(fresh->logInternalErrs, 1);
+  EXPECT_EQ(fresh->keepFullFile, 0);
+  EXPECT_EQ(fresh->followName, 0);
   EXPECT_FALSE(dir.has("default.log"));
   QlxFileHandlerFFreeVars(fresh);
 }

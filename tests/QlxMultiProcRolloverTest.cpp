@@ -144,6 +144,17 @@ TEST_F(MultiProcFileHandlerTest, GoesOnInADeletedActiveFile) {
   EXPECT_EQ(dir.read("app.log"), "three\n");
 }
 
+// All its processes would have to follow at the same record.
+TEST_F(MultiProcFileHandlerTest, GoesOnInItsFileWhateverFollowNameSays) {
+  set("followName", "true");
+  log(u"1");
+  std::filesystem::rename(dir.path("app.log"), dir.path("old.log"));
+  dir.write("app.log", "other\n");
+  EXPECT_EQ(logged(u"2"), kSuccess);
+  EXPECT_EQ(dir.read("old.log"), "1\n2\n");
+  EXPECT_EQ(dir.read("app.log"), "other\n");
+}
+
 TEST_F(MultiProcFileHandlerTest, RollsADeletedActiveFileOver) {
   set("maxFileBytes", "8");
   log(u"one");

@@ -50,9 +50,14 @@ static CxStatus findOpen(CxFile file, Found *found) {
   return file < 0 ? cxFailure(EBADF) : find(file, "", AT_EMPTY_PATH, found);
 }
 
-CxStatus qlxLeadsToFile(const char *name) {
-  Found found;
+static bool isOpenFile(const QlxLogFile *log, const Found &found) {
+  return found.device == log->device && found.inode == log->inode;
+}
+
+CxStatus qlxLogFileFindName(const QlxLogFile *log, const char *name, bool *isOther) {
+  Found found = {};
   const CxStatus status = find(AT_FDCWD, name, 0, &found);
+  *isOther = !qlxFailed(status) && !isOpenFile(log, found);
   return qlxFailed(status) || found.isRegular ? status : cxFailure(ENOENT);
 }
 
@@ -132,6 +137,7 @@ static CxStatus note(QlxLogFile *log) {
   Found found;
   const CxStatus status = findOpen(log->file, &found);
   if (qlxFailed(status)) return status;
+  if (!isOpenFile(log, found)) log->torn = 0;  // that was another file
   log->device = found.device;
   log->inode = found.inode;
   takeSize(log, found);
@@ -162,8 +168,7 @@ CxStatus qlxLogFileOpen(QlxLogFile *log, const char *name, int32_t existing) {
 static CxStatus findOurs(const QlxLogFile *log, CxFile file, Found *found) {
   const CxStatus status = findOpen(file, found);
   if (qlxFailed(status)) return status;
-  const bool isOurs = found->device == log->device && found->inode == log->inode;
-  return isOurs ? status : cxFailure(EBADF);
+  return isOpenFile(log, *found) ? status : cxFailure(EBADF);
 }
 
 CxStatus qlxLogFileMeasure(QlxLogFile *log) {

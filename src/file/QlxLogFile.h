@@ -51,8 +51,8 @@ CxStatus qlxLogFileClose(QlxLogFile *log);
 CxStatus qlxLogFileWrite(QlxLogFile *log, const char *bytes, uint32_t length);
 
 /** Success for a name that leads to a regular file, ENOENT for one that does not; another error
- *  leaves it open. */
-CxStatus qlxLeadsToFile(const char *name);
+ *  leaves it open. `isOther` becomes whether it leads to something else than the open file. */
+CxStatus qlxLogFileFindName(const QlxLogFile *log, const char *name, bool *isOther);
 
 /** Keeps a number to give up when there are none left; qlxLogFileSpend() gives it up, and answers
  *  whether there was one. Closing the file gives it up too. */

@@ -108,7 +108,7 @@ static CxStatus openFile(QlxFileHandlerVars *vars) {
 }
 
 void qlxFileHandlerDoRollover(QlxFileHandlerVars *vars) {
-  if (vars && !qlxFailed(qlxFHCheckNames(vars))) qlxMoveActiveFile(vars);
+  if (vars && !cxFailed(qlxFHCheckNames(vars))) qlxMoveActiveFile(vars);
 }
 
 // False when the full file has to take the next event too.
@@ -126,7 +126,7 @@ static bool rollOver(QlxObject *handler, QlxFileHandlerVars *vars) {
 static bool leaveIfNotNamed(QlxObject *handler, QlxFileHandlerVars *vars) {
   bool isOther = false;
   const CxStatus there = qlxLogFileFindName(vars, vars->fullName, &isOther);
-  if (!qlxFailed(there) && !(isOther && vars->followName)) return false;
+  if (!cxFailed(there) && !(isOther && vars->followName)) return false;
   QlxFileHandlerFClose(handler);
   const bool mayBeThere = there.code != ENOENT;  // with all that was written
   vars->keepWritten |= mayBeThere || vars->followName;
@@ -138,7 +138,7 @@ static bool leaveIfNotNamed(QlxObject *handler, QlxFileHandlerVars *vars) {
 static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
   if (!cxLookAgain(&vars->look) && !qlxFileHandlerIsFull(vars)) return true;
   const CxStatus status = qlxLogFileMeasure(vars);
-  if (qlxFailed(status)) {
+  if (cxFailed(status)) {
     qlxKeepFailure(nullptr, status);
     closeFile(vars);
     vars->keepWritten = 1;
@@ -152,11 +152,11 @@ static bool staysOpen(QlxObject *handler, QlxFileHandlerVars *vars) {
 // Opens the active file with room for an event, behind its header.
 static CxStatus openForEvent(QlxObject *handler, QlxFileHandlerVars *vars) {
   CxStatus status = openFile(vars);
-  if (!qlxFailed(status) && qlxFileHandlerIsFull(vars)) {
+  if (!cxFailed(status) && qlxFileHandlerIsFull(vars)) {
     vars->opened = 1;  // what is open is closed with its trailer
     if (rollOver(handler, vars)) status = openFile(vars);
   }
-  if (qlxFailed(status)) return status;
+  if (cxFailed(status)) return status;
   return writeFrame(vars, qlxIntlHandlerGetFmtHeader(handler));
 }
 
@@ -165,12 +165,12 @@ CxStatus QlxFileHandlerFOpenWithErr(QlxObject *handler) {
   if (!vars) return kCxSuccess;
   if (vars->opened == 1 && staysOpen(handler, vars)) return kCxSuccess;
   CxStatus status = qlxFHCheckNames(vars);
-  if (!qlxFailed(status) && !vars->fullName) return status;
-  if (!qlxFailed(status)) {
+  if (!cxFailed(status) && !vars->fullName) return status;
+  if (!cxFailed(status)) {
     qlxFileHandlerMakeDirectory(vars);
     status = openForEvent(handler, vars);
   }
-  if (qlxFailed(status)) {
+  if (cxFailed(status)) {
     qlxKeepFailure(nullptr, status);
     closeFile(vars);
   } else {
@@ -186,7 +186,7 @@ void QlxFileHandlerFOpen(QlxObject *handler) {
 void QlxFileHandlerFClose(QlxObject *handler) {
   QlxFileHandlerVars *vars = qlxFileHandlerVars(handler);
   if (!vars || vars->opened != 1) return;
-  const bool isOurs = !qlxFailed(qlxLogFileMeasure(vars));
+  const bool isOurs = !cxFailed(qlxLogFileMeasure(vars));
   if (isOurs) qlxKeepFailure(nullptr, writeFrame(vars, qlxIntlHandlerGetFmtTrailer(handler)));
   closeFile(vars);
 }
@@ -196,7 +196,7 @@ static CxStatus writeAnew(QlxObject *handler, QlxFileHandlerVars *vars,
                           const FormattedBytes &text) {
   closeFile(vars);
   const CxStatus status = QlxFileHandlerFOpenWithErr(handler);
-  return qlxFailed(status) ? status : qlxFileHandlerWriteText(vars, text);
+  return cxFailed(status) ? status : qlxFileHandlerWriteText(vars, text);
 }
 
 // Formatting has effects of its own on the event, so it is done without an open file too.

@@ -60,7 +60,7 @@ void qlxLogUMessageEntry(QlxLogResult *result, QlxObject *logger, int32_t level,
   report(result, kNothingLogged);
   const fLog log = qlxIntlLoggerGetFLog(logger);
   if (!log) return;
-  const LoggedEvent event{level, bundle, key, nullptr};
+  const LoggedEvent event{level, bundle, key};
   if (!event.get()) return report(result, kNoMemory);
   event->isMessage = 1;
   passToLogger(result, logger, log, event.get(), args);
@@ -71,10 +71,9 @@ void qlxLogUDebugEntry(QlxLogResult *result, QlxObject *logger, int32_t level, c
   report(result, kNothingLogged);
   const fLog log = qlxIntlLoggerGetFLog(logger);
   if (!log) return;
-  const LoggedEvent event{level, nullptr, nullptr, text};
+  const LoggedEvent event{level, text, {file, function, line}};
   if (!event.get()) return report(result, kNoMemory);
   event->isMessage = 0;
-  event.noteSource({file, function, line});
   passToLogger(result, logger, log, event.get(), args);
 }
 

@@ -16,7 +16,7 @@
 // ---- Rolling over
 
 static bool mayRoll(QlxFileHandlerVars *vars) {
-  return vars && !qlxFailed(qlxFHCheckNames(vars));
+  return vars && !cxFailed(qlxFHCheckNames(vars));
 }
 
 void qlxMultiProcFileHandlerRollActiveLog(QlxFileHandlerVars *vars) {
@@ -31,7 +31,7 @@ void qlxMultiProcFileHandlerDoRollover(QlxFileHandlerVars *vars) {
 
 static uint8_t succeeds(CxStatus status) {
   qlxKeepFailure(nullptr, status);
-  return !qlxFailed(status);
+  return !cxFailed(status);
 }
 
 uint8_t qlxMultiProcFileHandlerInitSem(QlxFileHandlerVars *vars) {
@@ -52,7 +52,7 @@ void qlxMultiProcFileHandlerUnlockSem(QlxFileHandlerVars *vars) {
 static CxStatus openFile(QlxFileHandlerVars *vars) {
   qlxFileHandlerMakeDirectory(vars);
   const CxStatus status = qlxLogFileOpen(vars, vars->fullName, O_APPEND);
-  vars->opened = !qlxFailed(status);
+  vars->opened = !cxFailed(status);
   if (vars->opened == 1) qlxLogFileReserve(vars);
   return status;
 }
@@ -61,9 +61,9 @@ static CxStatus openFile(QlxFileHandlerVars *vars) {
 static CxStatus openShared(QlxFileHandlerVars *vars) {
   if (!vars || vars->opened == 1) return kCxSuccess;
   CxStatus status = qlxFHCheckNames(vars);
-  if (qlxFailed(status) || !vars->fullName) return status;
+  if (cxFailed(status) || !vars->fullName) return status;
   if (vars->semReady != 1) status = qlxSharedLockSetUp(vars);
-  return qlxFailed(status) ? status : openFile(vars);
+  return cxFailed(status) ? status : openFile(vars);
 }
 
 CxStatus QlxMultiProcFileHandlerFOpenWithErr(QlxObject *handler) {
@@ -89,7 +89,7 @@ void QlxMultiProcFileHandlerFClose(QlxObject *handler) {
 
 // A descriptor that was taken away: what is written goes into the file of the name.
 static CxStatus measureOurs(QlxFileHandlerVars *vars) {
-  if (!qlxFailed(qlxLogFileMeasure(vars))) return kCxSuccess;
+  if (!cxFailed(qlxLogFileMeasure(vars))) return kCxSuccess;
   qlxKeepFailure(nullptr, qlxLogFileClose(vars));
   return openFile(vars);
 }
@@ -98,7 +98,7 @@ static CxStatus measureOurs(QlxFileHandlerVars *vars) {
 static CxStatus checkSizeAndWrite(QlxFileHandlerVars *vars, Event *event,
                                   const FormattedBytes &text) {
   const CxStatus status = measureOurs(vars);
-  if (qlxFailed(status)) return status;
+  if (cxFailed(status)) return status;
   if (qlxFileHandlerIsFull(vars) && !qlxSharedFileWaits(vars)) qlxSharedFileRollOver(vars, event);
   return qlxFileHandlerWriteText(vars, text);
 }
@@ -106,7 +106,7 @@ static CxStatus checkSizeAndWrite(QlxFileHandlerVars *vars, Event *event,
 // Deliberate: a record whose lock fails is dropped; the event tells of it.
 static void writeText(QlxFileHandlerVars *vars, Event *event, const FormattedBytes &text) {
   CxStatus status = qlxSharedLockTake(vars);
-  if (!qlxFailed(status)) {
+  if (!cxFailed(status)) {
     status = checkSizeAndWrite(vars, event, text);
     qlxMultiProcFileHandlerUnlockSem(vars);
   }

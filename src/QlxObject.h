@@ -11,6 +11,27 @@
 
 using ObjectRef = Owned<QlxObject, qlxIntlReleaseObject>;  // one counted reference
 
+// Keeps an object, whoever else lets go of it, for a scope.
+class KeptObject {
+ public:
+  explicit KeptObject(QlxObject *object) : object_(object) { ++object->refCount; }
+  ~KeptObject() {
+    // What is destroyed has the registry's reference and this one.
+    if (object_->refCount > 2) {
+      --object_->refCount;
+    } else {
+      qlxIntlReleaseObject(object_);
+    }
+  }
+  KeptObject(const KeptObject &) = delete;
+  KeptObject &operator=(const KeptObject &) = delete;
+
+  QlxObject *get() const { return object_; }
+
+ private:
+  QlxObject *object_;
+};
+
 /** Closes a handler for good: its class's fClose runs once, whoever asks first. */
 void qlxCloseHandlerOnce(QlxObject *object);
 

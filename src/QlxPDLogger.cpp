@@ -14,6 +14,7 @@
 #include "object/QlxObjClass.h"
 #include "record/QlxLoggedEvent.h"
 #include "QlxObject.h"
+#include "util/CxStatus.h"
 
 namespace {
 
@@ -55,7 +56,7 @@ PDLoggerVars *varsOf(QlxObject *logger) {
 char *hostName() {
   std::array<char, kMaxHostChars + 1> name{};  // a name that fills what the call gets has no end
   const CxStatus status = CxSystemGetFQHostname(name.data(), kMaxHostChars);
-  return OslStringDup(status.kind == '-' ? name.data() : "NO_HOSTNAME");
+  return OslStringDup(!cxFailed(status) ? name.data() : "NO_HOSTNAME");
 }
 
 }  // namespace

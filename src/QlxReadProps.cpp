@@ -8,6 +8,7 @@
 
 #include "QlxLogManager.h"
 #include "util/CxThread.h"
+#include "util/CxStatus.h"
 
 namespace {
 
@@ -302,7 +303,7 @@ uint8_t qlxDeliverProps(const QlxPropsFile &file, CxPropList *propList, CxStatus
   CxStringBuffDiscard(&context.keyBuf);
   CxStringBuffDiscard(&context.valBuf);
   cxPropIndexDiscard(&context.index);
-  const bool failed = file.status.kind != '-' && (gotThere || file.isWhole);
+  const bool failed = cxFailed(file.status) && (gotThere || file.isWhole);
   if (failed && status) *status = file.status;
   return context.state == kDone && !failed;
 }

@@ -81,7 +81,7 @@ static int32_t cutNumber(char *stem) {
 // The working directory in `buffer`; a failure is reported and leaves it empty.
 static void getCurrentDirectory(QlxFileName buffer) {
   const CxStatus status = CxProcessGetCwd(buffer, kMaxNameBytes + 1);
-  if (qlxFailed(status)) QlxReportPlatformErr(status);
+  if (cxFailed(status)) QlxReportPlatformErr(status);
   std::replace(buffer, buffer + OslStringLen(buffer), '\\', '/');  // as in the name
 }
 

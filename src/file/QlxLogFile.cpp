@@ -57,8 +57,8 @@ static bool isOpenFile(const QlxLogFile *log, const Found &found) {
 CxStatus qlxLogFileFindName(const QlxLogFile *log, const char *name, bool *isOther) {
   Found found = {};
   const CxStatus status = find(AT_FDCWD, name, 0, &found);
-  *isOther = !qlxFailed(status) && !isOpenFile(log, found);
-  return qlxFailed(status) || found.isRegular ? status : cxFailure(ENOENT);
+  *isOther = !cxFailed(status) && !isOpenFile(log, found);
+  return cxFailed(status) || found.isRegular ? status : cxFailure(ENOENT);
 }
 
 // Links to descriptors, such as /dev/stdout: what they lead to is not this name's, so it must
@@ -106,7 +106,7 @@ CxStatus qlxOpenHigh(CxFile *file, const char *name, int32_t flags, uint32_t mod
   *file = -1;
   const CxStatus status =
       cxUntilDone([&] { return CxFileOpenMode(&low, name, flags | O_NOCTTY, mode & 0777); });
-  if (qlxFailed(status)) return status;
+  if (cxFailed(status)) return status;
   *file = low >= kHighNumber ? low : duplicateFrom(kHighNumber, low);
   if (*file == -1) *file = low >= kFirstFreeNumber ? low : duplicateFrom(kFirstFreeNumber, low);
   const CxStatus moved = cxStatusOfCall(*file != -1);
@@ -119,7 +119,7 @@ CxStatus qlxOpenHigh(CxFile *file, const char *name, int32_t flags, uint32_t mod
 // A FIFO without a reader, or a terminal without a line, would keep the caller waiting.
 static CxStatus openName(QlxLogFile *log, const char *name, int32_t existing, CxFile *file) {
   Found found = {};
-  const bool exists = !qlxFailed(find(AT_FDCWD, name, 0, &found));
+  const bool exists = !cxFailed(find(AT_FDCWD, name, 0, &found));
   const bool isFile = !exists || (found.isRegular && !isDescriptorsName(name));
   if (log->keepWritten) existing = O_APPEND;
   const int32_t flags = isFile ? O_CREAT | O_RDWR | existing : O_WRONLY | O_APPEND | O_NONBLOCK;
@@ -136,7 +136,7 @@ static void takeSize(QlxLogFile *log, const Found &found) {
 static CxStatus note(QlxLogFile *log) {
   Found found;
   const CxStatus status = findOpen(log->file, &found);
-  if (qlxFailed(status)) return status;
+  if (cxFailed(status)) return status;
   if (!isOpenFile(log, found)) log->torn = 0;  // that was another file
   log->device = found.device;
   log->inode = found.inode;
@@ -150,10 +150,10 @@ CxStatus qlxLogFileOpen(QlxLogFile *log, const char *name, int32_t existing) {
   qlxLogFileClose(log);  // a formatter that logs while it makes the header has opened it, too
   CxFile file = -1;
   CxStatus status = openName(log, name, existing, &file);
-  if (qlxFailed(status)) return status;
+  if (cxFailed(status)) return status;
   claim(log, file, &log->file);
   status = note(log);
-  if (qlxFailed(status)) {
+  if (cxFailed(status)) {
     CxFileClose(&log->file);
     return status;
   }
@@ -167,14 +167,14 @@ CxStatus qlxLogFileOpen(QlxLogFile *log, const char *name, int32_t existing) {
 // EBADF also for a number that leads to another file now.
 static CxStatus findOurs(const QlxLogFile *log, CxFile file, Found *found) {
   const CxStatus status = findOpen(file, found);
-  if (qlxFailed(status)) return status;
+  if (cxFailed(status)) return status;
   return isOpenFile(log, *found) ? status : cxFailure(EBADF);
 }
 
 CxStatus qlxLogFileMeasure(QlxLogFile *log) {
   Found found;
   const CxStatus status = findOurs(log, log->file, &found);
-  if (qlxFailed(status)) return status;
+  if (cxFailed(status)) return status;
   takeSize(log, found);
   return kCxSuccess;
 }
@@ -182,7 +182,7 @@ CxStatus qlxLogFileMeasure(QlxLogFile *log) {
 CxStatus qlxLogFileClose(QlxLogFile *log) {
   if (!unlinkFromOpen(log)) return kCxSuccess;  // it was not open
   qlxLogFileSpend(log);
-  const bool isOurs = !qlxFailed(qlxLogFileMeasure(log));
+  const bool isOurs = !cxFailed(qlxLogFileMeasure(log));
   if (isOurs) return CxFileClose(&log->file);
   log->keepWritten = 1;
   log->file = -1;
@@ -194,7 +194,7 @@ CxStatus qlxLogFileClose(QlxLogFile *log) {
 static CxStatus endTornLine(QlxLogFile *log) {
   if (!log->torn) return kCxSuccess;
   const CxStatus status = cxFileWriteAll(&log->file, "\n", 1, &log->size);
-  log->torn = qlxFailed(status);
+  log->torn = cxFailed(status);
   return status;
 }
 
@@ -202,10 +202,10 @@ static CxStatus endTornLine(QlxLogFile *log) {
 static void cutOff(QlxLogFile *log, uint64_t piece) {
   const off_t end = log->rolls ? lseek(log->file, 0, SEEK_CUR) : -1;
   const off_t start = end - static_cast<off_t>(piece);
-  const bool isLast = end >= 0 && start >= 0 && !qlxFailed(qlxLogFileMeasure(log)) &&
+  const bool isLast = end >= 0 && start >= 0 && !cxFailed(qlxLogFileMeasure(log)) &&
                       log->size == static_cast<uint64_t>(end);
   const auto cut = [&] { return cxStatusOfCall(ftruncate(log->file, start) == 0); };
-  log->torn = !isLast || qlxFailed(cxUntilDone(cut));
+  log->torn = !isLast || cxFailed(cxUntilDone(cut));
   if (log->torn) return (void)endTornLine(log);  // other processes do not know of the piece
   log->size = static_cast<uint64_t>(start);
   lseek(log->file, start, SEEK_SET);
@@ -215,9 +215,9 @@ CxStatus qlxLogFileWrite(QlxLogFile *log, const char *bytes, uint32_t length) {
   if (length == 0) return kCxSuccess;
   uint64_t written = 0;
   CxStatus status = endTornLine(log);
-  if (!qlxFailed(status)) status = cxFileWriteAll(&log->file, bytes, length, &written);
+  if (!cxFailed(status)) status = cxFileWriteAll(&log->file, bytes, length, &written);
   log->size += written;
-  if (!qlxFailed(status)) return status;
+  if (!cxFailed(status)) return status;
   log->look = {};
   if (written > 0) cutOff(log, written);
   return status;
@@ -236,5 +236,5 @@ bool qlxLogFileSpend(QlxLogFile *log) {
   CxFile reserve = log->reserve;
   log->reserve = -1;
   Found found;
-  return !qlxFailed(findOurs(log, reserve, &found)) && !qlxFailed(CxFileClose(&reserve));
+  return !cxFailed(findOurs(log, reserve, &found)) && !cxFailed(CxFileClose(&reserve));
 }

@@ -8,19 +8,19 @@
 static QlxHandlerProblems gProblems;
 
 void qlxKeepFailure(Event *event, CxStatus status) {
-  if (!qlxFailed(status)) return;
+  if (!cxFailed(status)) return;
   QlxReportPlatformErr(status);
   if (event) event->status = status;
 }
 
-void qlxKeepLost(Event *event, CxStatus status) {
+void qlxCountLost(Event *event, CxStatus status) {
   qlxKeepFailure(event, status);
-  if (qlxFailed(status)) ++gProblems.recordsLost;
+  ++gProblems.recordsLost;
 }
 
 void qlxKeepRollover(Event *event, CxStatus status, const char *activeFile) {
   qlxKeepFailure(event, status);
-  if (!qlxFailed(status)) return;
+  if (!cxFailed(status)) return;
   ++gProblems.rolloversFailed;
   gProblems.rollover = status;
   gProblems.rolloverFile[0] = '\0';

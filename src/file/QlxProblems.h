@@ -8,17 +8,18 @@
 
 #include <qlx/types.h>
 
-QLX_BEGIN_DECLS
+#include "util/CxStatus.h"
 
-inline bool qlxFailed(CxStatus status) {
-  return status.kind != '-';
-}
+QLX_BEGIN_DECLS
 
 /** Reports a failure, and stores it in the event, which may be null. */
 void qlxKeepFailure(Event *event, CxStatus status);
 
 /** The same for a failure that cost the event's record. */
-void qlxKeepLost(Event *event, CxStatus status);
+void qlxCountLost(Event *event, CxStatus status);
+inline void qlxKeepLost(Event *event, CxStatus status) {
+  if (cxFailed(status)) qlxCountLost(event, status);
+}
 
 /** The same for a failure that left the generations of a file as they were, or some of them. */
 void qlxKeepRollover(Event *event, CxStatus status, const char *activeFile);

@@ -14,7 +14,7 @@
 static constexpr uint32_t kBlockBytes = 8192;
 
 static bool isInterrupted(const CxStatus &status) {
-  return status.kind != '-' && status.code == EINTR;
+  return cxFailed(status) && status.code == EINTR;
 }
 
 // What may never end, or do something when it is opened. A folder and a socket fail by themselves.
@@ -58,7 +58,7 @@ static void readAll(CxFile *file, QlxPropsFile &props, uint32_t expected) {
       props.status =
           CxFileRead(file, props.block.get() + props.length, room - props.length, &count);
       if (isInterrupted(props.status)) continue;
-      if (props.status.kind != '-') return;
+      if (cxFailed(props.status)) return;
       props.isWhole = count == 0;
       if (props.isWhole) return;
       props.length += static_cast<uint32_t>(count);
@@ -72,18 +72,18 @@ static void readAll(CxFile *file, QlxPropsFile &props, uint32_t expected) {
 static void readOpened(CxFile *file, QlxPropsFile &props) {
   uint32_t expected = 0;
   props.status = checkOpened(*file, &expected);
-  if (props.status.kind == '-') readAll(file, props, expected);
+  if (!cxFailed(props.status)) readAll(file, props, expected);
   const CxStatus closed = CxFileClose(file);
-  if (props.status.kind == '-') props.status = closed;
+  if (!cxFailed(props.status)) props.status = closed;
 }
 
 QlxPropsFile qlxLoadProps(const char *path) {
   QlxPropsFile props;
   props.status = checkPath(path);
-  if (props.status.kind != '-') return props;
+  if (cxFailed(props.status)) return props;
   CxFile file = -1;
   do props.status = CxFileOpen(&file, path, O_RDONLY | O_NOCTTY);
   while (isInterrupted(props.status));
-  if (props.status.kind == '-') readOpened(&file, props);
+  if (!cxFailed(props.status)) readOpened(&file, props);
   return props;
 }

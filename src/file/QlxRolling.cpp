@@ -24,7 +24,7 @@
 static constexpr int32_t kMostTried = 100;
 
 static bool succeedsUnlessMissing(const QlxLogNames *files, Event *event, CxStatus status) {
-  if (!qlxFailed(status) || status.code == ENOENT) return true;
+  if (!cxFailed(status) || status.code == ENOENT) return true;
   qlxKeepRollover(event, status, files->fullName);
   return false;
 }

@@ -23,7 +23,7 @@ static constexpr int64_t kNanosecondsBetweenTries = 1000000000;
 // True for a success.
 static bool keep(QlxSharedFile *shared, Event *event, CxStatus status) {
   qlxKeepRollover(event, status, shared->fullName);
-  return !qlxFailed(status);
+  return !cxFailed(status);
 }
 
 // Copies from the place of one descriptor on to another.
@@ -34,9 +34,9 @@ static CxStatus copyBytes(CxFile *from, CxFile *to) {
     int32_t count = 0;
     CxStatus status =
         cxUntilDone([&] { return CxFileRead(from, bytes.data(), kCopyBytes, &count); });
-    if (qlxFailed(status) || count == 0) return status;
+    if (cxFailed(status) || count == 0) return status;
     status = cxFileWriteAll(to, bytes.data(), static_cast<uint32_t>(count), &copied);
-    if (qlxFailed(status)) return status;
+    if (cxFailed(status)) return status;
   }
 }
 
@@ -61,7 +61,7 @@ static CxStatus makeGeneration(QlxSharedFile *shared, const char *name, CxFile *
                        shared->filePermission);
   };
   CxStatus status = clearName(shared, name);
-  if (!qlxFailed(status)) status = open();
+  if (!cxFailed(status)) status = open();
   const bool noNumbers = status.code == EMFILE || status.code == ENFILE;
   return noNumbers && qlxLogFileSpend(shared) ? open() : status;
 }
@@ -102,7 +102,7 @@ static bool emptyActiveFile(QlxSharedFile *shared, Event *event) {
   const auto empty = [&] { return cxStatusOfCall(ftruncate(shared->file, 0) == 0); };
   const bool emptied = keep(shared, event, cxUntilDone(empty));
   keep(shared, event, CxFileSeek(&shared->file, 0, SEEK_SET));
-  const bool isSmaller = !qlxFailed(qlxLogFileMeasure(shared)) && shared->size < before;
+  const bool isSmaller = !cxFailed(qlxLogFileMeasure(shared)) && shared->size < before;
   return emptied || isSmaller;
 }
 

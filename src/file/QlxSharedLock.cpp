@@ -52,7 +52,7 @@ CxStatus qlxSharedLockSetUp(QlxSharedLock *lock) {
   lock->semId = semget(lock->semKey, 1, IPC_CREAT | IPC_EXCL | 0666);
   if (lock->semId == -1 && isFinal(errno)) return cxFailure(errno);
   const CxStatus status = lock->semId == -1 ? attach(lock) : freeNewSet(lock);
-  if (!qlxFailed(status)) lock->semReady = 1;
+  if (!cxFailed(status)) lock->semReady = 1;
   return status;
 }
 

@@ -11,6 +11,7 @@
 #include <qlx/toolkit.h>
 
 #include "util/CxHooks.h"
+#include "util/CxMutex.h"
 #include "util/CxThread.h"
 
 namespace {
@@ -49,7 +50,7 @@ void afterForkInChild() {
 CxStatus makeMutex() {
   CxMutex made = nullptr;
   const CxStatus status = CxMutexCreate(&made);
-  if (status.kind != '-') return status;
+  if (cxFailed(status)) return status;
   // Without memory for the registration the lock still works; only a fork while another thread logs
   // is then unprotected.
   if (!gForkHandled.exchange(true))
@@ -60,15 +61,14 @@ CxStatus makeMutex() {
 }
 
 bool succeeded(CxStatus status) {
-  if (status.kind == '-') return true;
+  if (!cxFailed(status)) return true;
   QlxReportPlatformErr(status);
   return false;
 }
 
 bool take() {
   if (!gMutex.load(std::memory_order_acquire) && !succeeded(makeMutex())) return false;
-  CxMutex mutex = gMutex.load(std::memory_order_acquire);
-  return succeeded(CxMutexLock(&mutex));
+  return succeeded(cxMutexLock(gMutex.load(std::memory_order_acquire)));
 }
 
 }  // namespace
@@ -90,6 +90,6 @@ void qlxAPIMutexUnlock(void) {
   const bool isHolder = heldByThisThread();
   const CxCancellation before = gCancellation;
   gHolder.store(pthread_t{}, std::memory_order_relaxed);
-  succeeded(CxMutexUnlock(&mutex));
+  succeeded(cxMutexUnlock(mutex));
   if (isHolder) cxThreadRestoreCancel(before);
 }

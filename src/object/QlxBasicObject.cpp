@@ -27,8 +27,9 @@ static void passTo(QlxObject *listener, Event *event, va_list *args) {
 // none gets it twice. Those that had it and are removed are released when all have it.
 static void passToAll(QlxObject *object, Event *event, va_list *args) {
   QlxGroupWalk<ListenerGroup, ListenerGroupNode> walk;
-  while (const ListenerGroupNode *node = walk.step(qlxFetchListenerGroup(object, 0))) {
-    const ObjectRef listener{qlxIntlAcquireObject(node->value)};
+  const auto group = [object] { return object->objClass ? *qlxListenersOf(object) : nullptr; };
+  while (const ListenerGroupNode *node = walk.step(group())) {
+    const KeptObject listener{node->value};
     passTo(listener.get(), event, args);
   }
   while (const auto removed = walk.takePassed()) qlxIntlReleaseObject(removed->value);
@@ -38,9 +39,10 @@ void QlxBasicObjectFLog(QlxObject *object, Event *event, va_list *args) {
   if (!object || !loadEnabled(object)) return;
   // A chain that leads back to an object on the current path ends there; an object that two
   // branches reach gets the event twice.
-  if (!qlxIntlGetListeners(object) || (object->marks & kMarkPassing)) return;
+  ListenerGroup **group = qlxListenersOf(object);
+  if (!group || !*group || !(*group)->head || (object->marks & kMarkPassing)) return;
   object->marks |= kMarkPassing;
-  const ObjectRef held{qlxIntlAcquireObject(object)};
+  const KeptObject kept{object};
   passToAll(object, event, args);
   object->marks &= static_cast<uint8_t>(~kMarkPassing);
 }

@@ -6,28 +6,15 @@
 
 #include "QlxLocked.h"
 
-static ListenerGroup **groupField(QlxObject *object) {
-  if (!object || !object->objClass) return nullptr;
-  switch (object->objClass->kind) {
-    case Logger:
-    case Filter:
-      return &object->kind2.listeners;
-    case Handler:
-      return &object->kind1.listeners;
-    default:
-      return nullptr;
-  }
-}
-
 ListenerGroup *qlxFetchListenerGroup(QlxObject *object, uint8_t create) {
-  ListenerGroup **group = groupField(object);
+  ListenerGroup **group = qlxListenersOf(object);
   if (!group) return nullptr;
   if (!*group && create == 1) *group = qlxIntlAllocListenerGroup();
   return *group;
 }
 
 void qlxFreeListeners(QlxObject *object) {
-  ListenerGroup **group = groupField(object);
+  ListenerGroup **group = qlxListenersOf(object);
   if (!group) return;
   ListenerGroup *listeners = *group;
   *group = nullptr;  // a listener that goes may ask for the group

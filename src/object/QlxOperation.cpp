@@ -6,7 +6,6 @@
 
 #include <cxxabi.h>
 
-#include "QlxObjClass.h"
 #include "record/QlxLoggedEvent.h"
 
 [[noreturn]] static void end(const char *what, QlxOperationName name) {
@@ -17,10 +16,9 @@
 }
 
 template <typename Result, typename... Args>
-Result qlxCall(QlxOperationName name, Result (*operation)(Args...),
-               std::type_identity_t<Args>... args) noexcept {
-  const QlxOwnClass *own = name.objClass->own;
-  if (!own || !own->takesNotes) qlxSettleNotedEvent();
+Result qlxCallHosts(QlxOperationName name, Result (*operation)(Args...),
+                    std::type_identity_t<Args>... args) noexcept {
+  qlxSettleNotedEvent();
   try {
     return operation(args...);
   } catch (abi::__forced_unwind &) {
@@ -31,10 +29,10 @@ Result qlxCall(QlxOperationName name, Result (*operation)(Args...),
 }
 
 #define QLX_SIGNATURE(Result, ...) \
-  template Result qlxCall(QlxOperationName, Result (*)(__VA_ARGS__), ##__VA_ARGS__) noexcept;
+  template Result qlxCallHosts(QlxOperationName, Result (*)(__VA_ARGS__), ##__VA_ARGS__) noexcept;
 
 // fAllocVars, fFreeVars, fCfgChange
-template void *qlxCall(QlxOperationName, void *(*)()) noexcept;
+template void *qlxCallHosts(QlxOperationName, void *(*)()) noexcept;
 QLX_SIGNATURE(void, void *)
 QLX_SIGNATURE(void, QlxObject *, const char *)
 // fLog and fProcess, fIsLoggable, fFormat

@@ -11,15 +11,25 @@
 
 #include <qlx/types.h>
 
+#include "QlxObjClass.h"
+
 struct QlxOperationName {
   const ObjClass *objClass;
   const char *operation;
 };
 
-// Calls an operation, which is not null. Defined where exceptions are compiled, for the signatures
-// that operations have.
+// The way for a host's. Defined where exceptions are compiled, for the signatures that operations
+// have.
+template <typename Result, typename... Args>
+Result qlxCallHosts(QlxOperationName name, Result (*operation)(Args...),
+                    std::type_identity_t<Args>... args) noexcept;
+
+// Calls an operation, which is not null.
 template <typename Result, typename... Args>
 Result qlxCall(QlxOperationName name, Result (*operation)(Args...),
-               std::type_identity_t<Args>... args) noexcept;
+               std::type_identity_t<Args>... args) {
+  const QlxOwnClass *own = name.objClass->own;
+  return own && own->takesNotes ? operation(args...) : qlxCallHosts(name, operation, args...);
+}
 
 #endif

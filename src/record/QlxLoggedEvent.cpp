@@ -82,8 +82,9 @@ static bool lend(Char **to, Char **cached, const Char *text, size_t length) {
 
 template <typename Char>
 static void takeBack(Char **cached, Char **from) {
-  if (*from && capacityOf(*from) <= kMaxCachedBytes) std::swap(*cached, *from);
-  OslMemoryFree(*from);
+  if (!*from) return;
+  if (capacityOf(*from) <= kMaxCachedBytes) std::swap(*cached, *from);
+  if (*from) OslMemoryFree(*from);
   *from = nullptr;
 }
 
@@ -212,6 +213,14 @@ static Event *refillEvent(const char *bundle, const char *key, const UChar *text
   return nullptr;
 }
 
+LoggedEvent::LoggedEvent(int32_t level, const char *bundle, const char *key)
+    : LoggedEvent(level, bundle, key, nullptr) {}
+
+LoggedEvent::LoggedEvent(int32_t level, const UChar *text, const EventSource &source)
+    : LoggedEvent(level, nullptr, nullptr, text) {
+  if (event_) gNoted = {event_, source};
+}
+
 LoggedEvent::LoggedEvent(int32_t level, const char *bundle, const char *key, const UChar *text)
     : event_(nullptr) {
   if (gCache.event) event_ = refillEvent(bundle, key, text);
@@ -226,16 +235,12 @@ LoggedEvent::LoggedEvent(int32_t level, const char *bundle, const char *key, con
   event_->status = {'-', 0};
 }
 
-void LoggedEvent::noteSource(const EventSource &source) const {
-  gNoted = {event_, source};
-}
-
 static void takeBackMessage(I18Msg *message) {
   takeBack(&gCache.bundle, &message->bundle);
   takeBack(&gCache.key, &message->key);
   takeBack(&gCache.text, &message->text);
-  qlxIntlFreeParmList(message->parms);
-  if (!message->shared) OslMemoryFree(message->locale);
+  if (message->parms) qlxIntlFreeParmList(message->parms);
+  if (message->locale && !message->shared) OslMemoryFree(message->locale);
   *message = {};
 }
 
@@ -250,7 +255,7 @@ LoggedEvent::~LoggedEvent() {
   takeBackMessage(message);
   takeBackProps(event_->props);
   takeBack(&gCache.messageId, &event_->messageId);
-  OslMemoryFree(event_->locale);
+  if (event_->locale) OslMemoryFree(event_->locale);
   *event_ = {};
   event_->message = message;
   gCache.event = event_;

@@ -46,7 +46,8 @@ QLX_END_DECLS
 // memory. The API lock is held.
 class LoggedEvent {
  public:
-  LoggedEvent(int32_t level, const char *bundle, const char *key, const UChar *text);
+  LoggedEvent(int32_t level, const char *bundle, const char *key);
+  LoggedEvent(int32_t level, const UChar *text, const EventSource &source);  // which is noted
   ~LoggedEvent();
   LoggedEvent(const LoggedEvent &) = delete;
   LoggedEvent &operator=(const LoggedEvent &) = delete;
@@ -54,10 +55,9 @@ class LoggedEvent {
   Event *get() const { return event_; }  // null when memory ran out
   Event *operator->() const { return event_; }
 
-  // To be called once, right after the event was made.
-  void noteSource(const EventSource &source) const;
-
  private:
+  LoggedEvent(int32_t level, const char *bundle, const char *key, const UChar *text);
+
   Event *event_;
 };
 

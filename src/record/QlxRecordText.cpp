@@ -1,6 +1,5 @@
 #include "QlxRecordText.h"
 
-#include "QlxBoundText.h"
 #include "QlxEvent.h"
 #include "QlxI18Msg.h"
 
@@ -11,12 +10,9 @@ RecordText &RecordText::number(QlxCachedNumber format, double number) {
   return *this << digits.text();
 }
 
-// A message that cannot be bound is empty; the message tells why.
-RecordText &RecordText::message(Event *event, va_list *args) {
-  if (line_) return *this << BoundText().bind(event, args);
+void RecordText::bindTo(CxUStringBuff *text, Event *event, va_list *args) {
   qlxUseEventLocale(event);
-  if (text_ && !isLost(text_)) qlxIntlBindI18MsgTo(event->message, args, text_);
-  return *this;
+  qlxIntlBindI18MsgTo(event->message, args, text);
 }
 
 bool RecordText::isWholeFor(Event *event) const {

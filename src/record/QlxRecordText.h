@@ -8,6 +8,7 @@
 
 #include <qlx/buffers.h>
 
+#include "QlxBoundText.h"
 #include "text/QlxDateCache.h"
 #include "text/QlxNumberCache.h"
 #include "util/CxAsciiLine.h"
@@ -58,8 +59,13 @@ class RecordText {
     return by(qlxAppendCachedDate, style, time);
   }
 
-  // The event's message, bound by the library's own binder.
-  RecordText &message(Event *event, va_list *args);
+  // The event's message, bound by the library's own binder. One that cannot be bound is empty; the
+  // message tells why.
+  RecordText &message(Event *event, va_list *args) {
+    if (line_) return *this << BoundText().bind(event, args);
+    if (text_ && !isLost(text_)) bindTo(text_, event, args);
+    return *this;
+  }
 
   bool isWhole() const { return line_ ? !isLost_ : text_ && text_->data; }
   bool isEmpty() const { return line_ ? line_->length() == 0 : !text_ || text_->length == 0; }
@@ -71,6 +77,7 @@ class RecordText {
   // Room without a block is what no buffer has otherwise.
   static bool isLost(const CxUStringBuff *text) { return !text->data && text->capacity > 0; }
   void losePiece();
+  static void bindTo(CxUStringBuff *text, Event *event, va_list *args);
 
   RecordText &toLine(bool appended) {
     isLost_ |= !appended;

@@ -1,9 +1,8 @@
 #include "QlxFormatCache.h"
 
-#include <pthread.h>
-
 #include <algorithm>
 #include <array>
+#include <optional>
 #include <string_view>
 #include <utility>
 
@@ -13,36 +12,14 @@
 #include <unicode/uloc.h>
 
 #include "util/CxHooks.h"
-#include "util/CxThread.h"
 
-// ---- The lock
+// ---- A fork, and the end
 
-static pthread_mutex_t gLock = PTHREAD_MUTEX_INITIALIZER;
-static CxCancellation gCancellation;  // of the thread that holds gLock, as it was before
-
-static void takeLock() {
-  const CxCancellation before = cxThreadDisableCancel();
-  pthread_mutex_lock(&gLock);
-  gCancellation = before;
-}
-
-static void giveLockBack() {
-  const CxCancellation before = gCancellation;
-  pthread_mutex_unlock(&gLock);
-  cxThreadRestoreCancel(before);
-}
-
-FormatCacheLock::FormatCacheLock() {
-  takeLock();
-}
-
-FormatCacheLock::~FormatCacheLock() {
-  giveLockBack();
-}
+static std::optional<FormatCacheLock> gForkLock;
 
 static const CxHooks gHooks{{
-    .beforeFork = takeLock,
-    .afterFork = [](bool) { giveLockBack(); },
+    .beforeFork = [] { gForkLock.emplace(); },
+    .afterFork = [](bool) { gForkLock.reset(); },
     .atClose = qlxDropCachedFormats,
 }};
 

@@ -7,20 +7,27 @@
 #ifndef QLX_SRC_QLXFORMATCACHE_H
 #define QLX_SRC_QLXFORMATCACHE_H
 
+#include <pthread.h>
+
 #include <cstdint>
 #include <cstring>
 
 #include <unicode/timezone.h>
 
 #include "util/CxLook.h"
+#include "util/CxThread.h"
 #include "util/CxUStringBuff.h"
 
 class FormatCacheLock {
  public:
-  FormatCacheLock();
-  ~FormatCacheLock();
+  FormatCacheLock() { pthread_mutex_lock(&gMutex); }
+  ~FormatCacheLock() { pthread_mutex_unlock(&gMutex); }
   FormatCacheLock(const FormatCacheLock &) = delete;
   FormatCacheLock &operator=(const FormatCacheLock &) = delete;
+
+ private:
+  static inline pthread_mutex_t gMutex = PTHREAD_MUTEX_INITIALIZER;
+  CxNoCancel untilItIsGivenBack_;
 };
 
 // Drops everything; formatting afterwards caches anew. Takes the lock.

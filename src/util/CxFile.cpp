@@ -61,7 +61,7 @@ CxStatus cxFileWriteAll(CxFile *file, const char *bytes, uint32_t length, uint64
   while (length > 0) {
     int32_t count = 0;
     const CxStatus status = cxUntilDone([&] { return CxFileWrite(file, bytes, length, &count); });
-    if (status.kind != '-') return status;
+    if (cxFailed(status)) return status;
     if (count == 0) return cxFailure(EIO);
     bytes += count;
     length -= static_cast<uint32_t>(count);

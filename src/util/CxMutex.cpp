@@ -2,7 +2,6 @@
 #include "CxMutex.h"
 
 #include "CxOwned.h"
-#include "CxStatus.h"
 
 using MutexBlock = Owned<pthread_mutex_t, OslMemoryFree>;
 
@@ -22,12 +21,12 @@ CxStatus CxMutexCreate(CxMutex *mutex) {
 
 CxStatus CxMutexLock(CxMutex *mutex) {
   if (!mutex || !*mutex) return cxFailure(EINVAL);
-  return cxStatusOf(pthread_mutex_lock(*mutex));
+  return cxMutexLock(*mutex);
 }
 
 CxStatus CxMutexUnlock(CxMutex *mutex) {
   if (!mutex || !*mutex) return cxFailure(EINVAL);
-  return cxStatusOf(pthread_mutex_unlock(*mutex));
+  return cxMutexUnlock(*mutex);
 }
 
 CxStatus CxMutexDestroy(CxMutex *mutex) {

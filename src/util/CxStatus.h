@@ -22,6 +22,10 @@ inline CxStatus cxStatusOfCall(bool succeeded) {
   return succeeded ? kCxSuccess : cxFailure(errno);
 }
 
+constexpr bool cxFailed(CxStatus status) {
+  return status.kind != '-';
+}
+
 // Makes a call that answers a status again while a signal interrupts it. One that is interrupted
 // all the time fails at last, since its caller may hold locks.
 template <typename Call>

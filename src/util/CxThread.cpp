@@ -34,10 +34,10 @@ CxStatus CxThreadJoin(CxThread *thread) {
 
 void CxThreadYield(void) {}  // Deliberate: there is nobody to wait for
 
-uint32_t cxIntlSleepSeconds(uint32_t milliseconds) {
+uint32_t cxSleepSeconds(uint32_t milliseconds) {
   return (milliseconds + 500) / 1000;  // Deliberate: 32 bits, the last 500 milliseconds wrap to 0
 }
 
 void CxThreadSleep(uint32_t milliseconds) {
-  sleep(cxIntlSleepSeconds(milliseconds));
+  sleep(cxSleepSeconds(milliseconds));
 }

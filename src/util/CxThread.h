@@ -7,7 +7,7 @@
 QLX_BEGIN_DECLS
 
 // Whole seconds for CxThreadSleep().
-uint32_t cxIntlSleepSeconds(uint32_t milliseconds);
+uint32_t cxSleepSeconds(uint32_t milliseconds);
 
 QLX_END_DECLS
 

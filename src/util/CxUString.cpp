@@ -21,12 +21,6 @@
 static constexpr uint32_t kMaxParmUnits = 256;
 static constexpr uint32_t kMaxBytesPerUnit = cxUStringNarrowRoom(0);
 
-// ICU on this platform is built for UTF-8 as the default code page and then never changes it; built
-// otherwise, all text takes the way over its converter.
-bool cxUStringDefaultIsUtf8(void) {
-  return std::strcmp(ucnv_getDefaultName(), "UTF-8") == 0;
-}
-
 bool cxUStringIsPlainAscii(const char *text, uint32_t length) {
   uint8_t seen = 0;
   for (uint32_t i = 0; i < length; ++i) seen |= static_cast<uint8_t>(text[i]);

@@ -3,12 +3,19 @@
 #ifndef QLX_SRC_CXUSTRING_H
 #define QLX_SRC_CXUSTRING_H
 
+#include <cstring>
+
+#include <unicode/ucnv.h>
+
 #include <qlx/ustring.h>
 
 QLX_BEGIN_DECLS
 
-// Whether the default code page is UTF-8.
-bool cxUStringDefaultIsUtf8(void);
+// Whether the default code page is UTF-8. ICU on this platform is built for that and then never
+// changes it; built otherwise, all text takes the way over its converter.
+inline bool cxUStringDefaultIsUtf8(void) {
+  return std::strcmp(ucnv_getDefaultName(), "UTF-8") == 0;
+}
 
 // Whether `length` bytes are ASCII and mean themselves in the default code page.
 bool cxUStringIsPlainAscii(const char *text, uint32_t length);

@@ -175,9 +175,8 @@ class RecordBytesTest : public ChainTest {
   // What a log call's event with a noted source becomes.
   std::string noted(const EventSource &source) {
     const ApiLock lock;
-    const LoggedEvent event{DEBUG_MIN, nullptr, nullptr, u"text"};
+    const LoggedEvent event{DEBUG_MIN, u"text", source};
     event->time = kTimes[0];
-    event.noteSource(source);
     const std::string ascii = bytes(event.get(), nullptr);
     EXPECT_EQ(wide(event.get(), nullptr), ascii);
     EXPECT_NE(qlxNotedEventSource(event.get()), nullptr) << "nobody looked at the properties";

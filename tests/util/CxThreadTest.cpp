@@ -97,7 +97,7 @@ struct Sleep {
 class ThreadSleep : public ::testing::TestWithParam<Sleep> {};
 
 TEST_P(ThreadSleep, RoundsToTheNearestSecond) {
-  EXPECT_EQ(cxIntlSleepSeconds(GetParam().milliseconds), GetParam().seconds);
+  EXPECT_EQ(cxSleepSeconds(GetParam().milliseconds), GetParam().seconds);
 }
 
 TEST_P(ThreadSleep, SleepsThoseSeconds) {

@@ -15,8 +15,8 @@
 #include "QlxObject.h"
 #include "QlxProps.h"
 #include "object/QlxClasses.h"
-#include "object/QlxObjClass.h"
 #include "object/QlxConfigKeys.h"
+#include "object/QlxObjClass.h"
 #include "util/CxStatus.h"
 
 static constexpr const char *kFirstFileName = "default.log";

@@ -126,7 +126,7 @@ static void appendStart(RecordText &out, const Event *event, std::u16string_view
 
 static void appendTime(RecordText &out, const QlxObject *formatter, double time) {
   out << " <Time Millis=\""sv;
-  out.number(kCachedWhole, time) << "\">"sv;
+  out.number(kWholeNumber, time) << "\">"sv;
   out.date(qlxDateStyleOf(formatter), time) << "</Time>\n"sv;
 }
 

@@ -65,14 +65,14 @@ static void appendValue(RecordText &out, ArgType type, va_list *args) {
   } else if (type == ArgType::kInteger) {
     appendSigned(out, va_arg(*args, int32_t));
   } else {
-    out.number(kCachedFraction, va_arg(*args, double));
+    out.number(kFraction, va_arg(*args, double));
   }
 }
 
 // Without a list a number is zero, as in the text.
 static void appendZero(RecordText &out, ArgType type, va_list *) {
   if (type == ArgType::kInteger) return appendSigned(out, 0);
-  out.number(kCachedFraction, 0);
+  out.number(kFraction, 0);
 }
 
 // Deliberate: ends at the first index without a type, whatever comes after it.

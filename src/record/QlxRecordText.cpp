@@ -3,7 +3,7 @@
 #include "QlxEvent.h"
 #include "QlxI18Msg.h"
 
-RecordText &RecordText::number(QlxCachedNumber format, double number) {
+RecordText &RecordText::number(NumberStyle format, double number) {
   if (!line_) return by(qlxAppendCachedNumber, format, number);
   CachedBuffer digits;
   if (!qlxAppendCachedNumber(digits.get(), format, number)) return toLine(false);

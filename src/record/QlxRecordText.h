@@ -52,7 +52,7 @@ class RecordText {
   }
   // Deliberate: a negative one has its unsigned 64-bit form.
   RecordText &number(int32_t value) { return number(static_cast<uint64_t>(int64_t{value})); }
-  RecordText &number(QlxCachedNumber format, double number);
+  RecordText &number(NumberStyle format, double number);
 
   RecordText &date(const DateStyle &style, double time) {
     if (line_) return toLine(qlxAppendCachedDateAscii(line_, style, time));

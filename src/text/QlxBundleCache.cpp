@@ -64,7 +64,7 @@ static void dropAll() {
     if (cached.bundle) drop(cached);
 }
 
-static const CachedFormats gThese{dropAll, CachedFormats::kClose};
+static const FormatCache gThis{dropAll, FormatCache::kClose};
 
 static bool isSame(const BundleKey &a, const BundleKey &b) {
   return std::ranges::all_of(kKeyTexts, [&](auto text) { return qlxSameText(a.*text, b.*text); });

@@ -62,7 +62,7 @@ static void dropAll() {
   ucal_close(std::exchange(gCalendar, nullptr));
 }
 
-static const CachedFormats gThese{dropAll, CachedFormats::kDefaultsChange};
+static const FormatCache gThis{dropAll, FormatCache::kDefaultsChange};
 
 static UDateFormat *openDate(const DateStyle &style, UErrorCode *status) {
   const OwnedUStr pattern{CxUStringDupStrToUChar(style.pattern)};

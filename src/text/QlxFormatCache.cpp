@@ -25,13 +25,13 @@ static const CxHooks gHooks{{
 
 // ---- The caches
 
-static constinit const CachedFormats *gFirst = nullptr;
+static constinit const FormatCache *gFirst = nullptr;
 
-CachedFormats::CachedFormats(void (*drop)(), Until until)
+FormatCache::FormatCache(void (*drop)(), Until until)
     : drop_(drop), until_(until), next_(std::exchange(gFirst, this)) {}
 
-void CachedFormats::dropAll(Until until) {
-  for (const CachedFormats *it = gFirst; it; it = it->next_)
+void FormatCache::dropAll(Until until) {
+  for (const FormatCache *it = gFirst; it; it = it->next_)
     if (it->until_ <= until) it->drop_();
 }
 
@@ -46,7 +46,7 @@ static icu::TimeZone *gZone;  // owned; null: not known
 template <size_t size>
 static void check(std::array<char, size> &known, const char *name) {
   if (std::strcmp(known.data(), name) == 0) return;
-  CachedFormats::dropAll(CachedFormats::kDefaultsChange);
+  FormatCache::dropAll(FormatCache::kDefaultsChange);
   std::strncpy(known.data(), name, size - 1);
 }
 
@@ -59,7 +59,7 @@ static bool isCut() {
 static void checkZone() {
   icu::LocalPointer<icu::TimeZone> zone{icu::TimeZone::createDefault()};
   if (gZone && zone.isValid() && *zone == *gZone) return;
-  CachedFormats::dropAll(CachedFormats::kDefaultsChange);
+  FormatCache::dropAll(FormatCache::kDefaultsChange);
   delete gZone;
   gZone = zone.orphan();
 }
@@ -86,7 +86,7 @@ const icu::TimeZone *qlxDefaultZone(void) {
 
 void qlxDropCachedFormats(void) {
   const FormatCacheLock lock;
-  CachedFormats::dropAll(CachedFormats::kClose);
+  FormatCache::dropAll(FormatCache::kClose);
   delete std::exchange(gZone, nullptr);
 }
 

@@ -34,19 +34,19 @@ class FormatCacheLock {
 void qlxDropCachedFormats(void);
 
 // A cache registers how it is emptied, as a static of its file.
-class CachedFormats {
+class FormatCache {
  public:
   enum Until { kDefaultsChange, kClose };
-  CachedFormats(void (*drop)(), Until until);
-  CachedFormats(const CachedFormats &) = delete;
-  CachedFormats &operator=(const CachedFormats &) = delete;
+  FormatCache(void (*drop)(), Until until);
+  FormatCache(const FormatCache &) = delete;
+  FormatCache &operator=(const FormatCache &) = delete;
 
   static void dropAll(Until until);  // those that last until then or shorter
 
  private:
   void (*const drop_)();
   const Until until_;
-  const CachedFormats *const next_;
+  const FormatCache *const next_;
 };
 
 // All below are called with the lock held.

@@ -59,7 +59,7 @@ static void dropAll() {
     if (cached.format) drop(cached);
 }
 
-static const CachedFormats gThese{dropAll, CachedFormats::kDefaultsChange};
+static const FormatCache gThis{dropAll, FormatCache::kDefaultsChange};
 
 static bool samePattern(std::u16string_view a, std::u16string_view b) {
   return a.size() == b.size() && std::memcmp(a.data(), b.data(), a.size() * sizeof(UChar)) == 0;

@@ -27,7 +27,7 @@ static void dropAll() {
   }
 }
 
-static const CachedFormats gThese{dropAll, CachedFormats::kDefaultsChange};
+static const FormatCache gThis{dropAll, FormatCache::kDefaultsChange};
 static CxLook gLook;
 
 // Any digit may be another one in the locale, and any locale may put signs around them. A format of
@@ -54,7 +54,7 @@ static void open(CachedNumber &cached, const char *locale) {
   cached.plainDigits = writesPlainDigits(cached.format);
 }
 
-uint8_t qlxAppendCachedNumber(CxUStringBuff *text, QlxCachedNumber which, double value) {
+uint8_t qlxAppendCachedNumber(CxUStringBuff *text, NumberStyle which, double value) {
   const FormatCacheLock lock;
   qlxCheckDefaults(kLocaleOnly, &gLook);
   CachedNumber &cached = gNumbers[which];
@@ -77,9 +77,9 @@ uint8_t qlxAppendCachedNumber(CxUStringBuff *text, QlxCachedNumber which, double
 // Of the buffer's family; here because they are the ones that ask ICU.
 
 uint8_t CxUStringBuffAppendUDate(CxUStringBuff *buffer, double date) {
-  return buffer ? qlxAppendCachedNumber(buffer, kCachedWhole, date) : 0;
+  return buffer ? qlxAppendCachedNumber(buffer, kWholeNumber, date) : 0;
 }
 
 uint8_t CxUStringBuffAppendUDouble(CxUStringBuff *buffer, double value) {
-  return buffer ? qlxAppendCachedNumber(buffer, kCachedFraction, value) : 0;
+  return buffer ? qlxAppendCachedNumber(buffer, kFraction, value) : 0;
 }

@@ -5,10 +5,10 @@
 #include <qlx/types.h>
 
 // As a message pattern's "#" or "#.#####" writes it.
-enum QlxCachedNumber { kCachedWhole, kCachedFraction };
+enum NumberStyle { kWholeNumber, kFraction };
 
 // Appends a number in the default locale. Returns 1, or 0 when memory ran out; what ICU cannot
 // format is empty.
-uint8_t qlxAppendCachedNumber(CxUStringBuff *text, QlxCachedNumber which, double value);
+uint8_t qlxAppendCachedNumber(CxUStringBuff *text, NumberStyle which, double value);
 
 #endif

@@ -337,8 +337,8 @@ TEST(RecordTextTest, NumbersAreTheSameInBothKindsOfText) {
     out->number(uint64_t{0}) << std::string_view{" "};
     out->number(UINT64_MAX) << std::string_view{" "};
     out->number(int32_t{-1}) << std::string_view{" "};
-    out->number(kCachedWhole, -12.0) << std::string_view{" "};
-    out->number(kCachedFraction, 2.75);
+    out->number(kWholeNumber, -12.0) << std::string_view{" "};
+    out->number(kFraction, 2.75);
     EXPECT_TRUE(out->isWhole());
   }
   const char *wanted = "0 18446744073709551615 18446744073709551615 -12 2.75";

@@ -214,7 +214,7 @@ TEST_F(CachedLocalesTest, UnderADefaultNameThatIsNotGoodThereAreDatesAllTheSame)
       EXPECT_EQ(qlxAppendBundleMessage(&text, {"/no/such/bundle", "k", "zz"}, nullptr, &status),
                 0U);
       EXPECT_EQ(status, U_ILLEGAL_ARGUMENT_ERROR);
-      EXPECT_EQ(qlxAppendCachedNumber(&text, kCachedFraction, 1.5), 1);
+      EXPECT_EQ(qlxAppendCachedNumber(&text, kFraction, 1.5), 1);
       CxUStringBuffDiscard(&text);
     }
   });

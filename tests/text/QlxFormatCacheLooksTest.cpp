@@ -51,7 +51,7 @@ std::u16string hourOfAMessage() {
 }
 std::u16string number() {
   CxUStringBuff text{};
-  qlxAppendCachedNumber(&text, kCachedFraction, 0.5);
+  qlxAppendCachedNumber(&text, kFraction, 0.5);
   return take(&text);
 }
 std::u16string numberOfAMessage() {

@@ -40,7 +40,8 @@ static void addClass(const ObjClass &wanted) {
   objClass->op3 = wanted.op3.fLog ? wanted.op3 : defaults.op3;
   objClass->op4 = wanted.op4.fBindMsg ? wanted.op4 : defaults.op4;
   objClass->own = wanted.own;
-  qlxToolkitAddClassDef(wanted.name, objClass);
+  qlxToolkitInitObjClasses();
+  qlxRegisterClass(wanted.name, objClass);
 }
 
 void qlxToolkitInitObjClasses(void) {
@@ -50,10 +51,12 @@ void qlxToolkitInitObjClasses(void) {
 #undef QLX_ADD_CLASS
 }
 
-// The first of a name stays; it may be a built-in class that is registered just now.
+// The first of a name stays; it may be a built-in class that is registered just now. A record that is
+// new here is a host's, also when it began as a copy of one of the library's.
 void qlxToolkitAddClassDef(const char *className, ObjClass *objClass) {
   if (!objClass) return;
   qlxToolkitInitObjClasses();
+  if (!qlxIsRegisteredClass(objClass)) objClass->own = nullptr;
   qlxRegisterClass(className, objClass);
 }
 

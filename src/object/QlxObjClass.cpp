@@ -65,11 +65,15 @@ static bool isListedFrom(const StringToObjClassMapNode *node, const ObjClass *ob
   return node;
 }
 
+bool qlxIsRegisteredClass(const ObjClass *objClass) {
+  return isListedFrom(qlxIntlStringToObjClassMapIterator(gClasses), objClass);
+}
+
 void qlxRegisterClass(const char *className, ObjClass *objClass) {
   if (!qlxToolkitGetClassDef(className) &&
       qlxIntlStringToObjClassMapPut(gClasses, className, objClass)) {
     qlxIntlStringGroupAdd(namesOfKind(objClass->kind), className);
-  } else if (!isListedFrom(qlxIntlStringToObjClassMapIterator(gClasses), objClass)) {
+  } else if (!qlxIsRegisteredClass(objClass)) {
     qlxFreeObjClass(objClass);
   }
 }

@@ -36,6 +36,9 @@ QLX_END_DECLS
 /** Makes the registry. False when it is there already, or memory ran out. */
 bool qlxMakeClassRegistry(void);
 
+/** Whether a record is registered, under any name. */
+bool qlxIsRegisteredClass(const ObjClass *objClass);
+
 /** As qlxToolkitAddClassDef(), in a registry that has been made. */
 void qlxRegisterClass(const char *className, ObjClass *objClass);
 

@@ -7,6 +7,7 @@
 #include <qlx/class/filter.h>
 #include <qlx/class/formatter.h>
 #include <qlx/class/logger.h>
+#include <qlx/class/toolkit.h>
 
 #include "record/QlxLoggedEvent.h"
 #include "support/ChainTest.h"
@@ -177,6 +178,24 @@ TEST_F(EventSourceTest, IsThereForAHostsFormatter) {
   debug();
   EXPECT_EQ(gFound, std::string(kSource) + "/");
   EXPECT_EQ(linesOf("a.log"), "file.c function 7 text\nfile.c function 7 text\n");
+}
+
+// A copy of one of the library's records is a host's, whatever it says.
+TEST_F(EventSourceTest, IsThereForAFormatterWhoseClassBeganAsACopy) {
+  {
+    const ApiLock lock;
+    ObjClass *copy = qlxInitObjectClass("test_copy", Formatter, nullptr, nullptr, nullptr, nullptr);
+    const char *name = copy->name;
+    *copy = *qlxToolkitGetClassDef("qlx_xmlformatter");
+    copy->name = name;
+    copy->op1.fFormat = formatOwn;
+    qlxToolkitAddClassDef("test_copy", copy);
+  }
+  const Handle file = attachFile("a.log");
+  format(file, "copied", "test_copy");
+  debug();
+  EXPECT_EQ(gFound, std::string(kSource) + "/");
+  EXPECT_EQ(linesOf("a.log"), "file.c function 7 text\n");
 }
 
 TEST_F(EventSourceTest, IsInALineThatAHostsOperationBinds) {

@@ -1,7 +1,5 @@
 #include <qlx/class/logger.h>
 
-#include <dlfcn.h>
-#include <netdb.h>
 #include <unistd.h>
 
 #include <array>
@@ -19,33 +17,6 @@
 #include "support/FailingMemory.h"
 #include "support/Status.h"
 #include "support/Together.h"
-
-// ---- A host whose name a test makes up
-
-// Null: the system's own. Empty: the host has no name.
-const char *madeUpName;
-static std::string madeUpOfficialName;
-
-// In place of the system's, for this whole program, which is what other tests get from it.
-extern "C" int gethostname(char *name, size_t length) noexcept {
-  static const auto real =
-      reinterpret_cast<int (*)(char *, size_t)>(dlsym(RTLD_NEXT, "gethostname"));
-  if (!madeUpName) return real(name, length);
-  if (!*madeUpName) return -1;
-  std::strncpy(name, madeUpName, length);
-  return 0;
-}
-
-extern "C" int gethostbyname_r(const char *name, hostent *host, char *work, size_t size,
-                               hostent **found, int *error) {
-  static const auto real =
-      reinterpret_cast<decltype(&gethostbyname_r)>(dlsym(RTLD_NEXT, "gethostbyname_r"));
-  if (!madeUpName) return real(name, host, work, size, found, error);
-  *host = {};
-  host->h_name = madeUpOfficialName.data();
-  *found = madeUpOfficialName.empty() ? nullptr : host;
-  return 0;
-}
 
 namespace {
 

@@ -1,8 +1,11 @@
-// The host name that this test program has in place of the system's, whose resolver may take
-// seconds for each question. It is defined, with the calls that answer it, in QlxPDLoggerTest.cpp.
+// In place of the C library's gethostname and gethostbyname_r, for the whole program of the tests:
+// a test may make up the host's names. A resolver may take seconds for each question.
 #ifndef QLX_TESTS_HOSTNAME_H
 #define QLX_TESTS_HOSTNAME_H
 
-extern const char *madeUpName;  // null: the system's own
+#include <string>
+
+extern const char *madeUpName;          // null: the system's own names; empty: the host has none
+extern std::string madeUpOfficialName;  // what the resolver finds; empty: nothing
 
 #endif

@@ -158,7 +158,7 @@ const char *const kKeys[] = {"hello",    "bare",      "plain",   "empty", "zero"
 
 }  // namespace
 
-// In place of ICU's own, for the whole program of the tests.
+// In place of ICU's own, for the whole program.
 extern "C" UResourceBundle *ures_open(const char *name, const char *locale, UErrorCode *status) {
 #define QLX_NAME_OF(function) QLX_NAME_OF_RENAMED(function)
 #define QLX_NAME_OF_RENAMED(function) #function

@@ -12,7 +12,7 @@
 #include "support/Child.h"
 #include "support/FailingMemory.h"
 #include "support/FreshProcess.h"
-#include "support/MultiProcFileHandlerTest.h"
+#include "support/MultiProcFileHandlerFixture.h"
 #include "support/OwnThread.h"
 #include "support/WrongUseOfAMutex.h"
 
@@ -230,7 +230,7 @@ TEST(CancellationTest, IsOffWhileFormatsAreHeld) {
 
 // ---- The semaphore between processes
 
-using CancelledSharerTest = MultiProcFileHandlerTest;
+using CancelledSharerTest = MultiProcFileHandlerFixture;
 
 // The semaphore is held when the thread logs, and is given back when it was cancelled: what it
 // writes with then is a cancellation point under the semaphore.

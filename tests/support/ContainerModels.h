@@ -18,15 +18,6 @@
 
 namespace models {
 
-GROUP_API(Qlx, StringGroup, Strings);
-GROUP_API(Qlx, ListenerGroup, Objects);
-LIST_API(Qlx, StringList, Strings);
-LIST_API(Qlx, ParmList, Parms);
-MAP_API(Qlx, StringToStringMap, Strings);
-MAP_API(Qlx, StringToObjMap, Objects);
-MAP_API(Qlx, StringToObjCfgMap, Configs);
-MAP_API(Qlx, StringToObjClassMap, Classes);
-
 // ---- What the three have in common
 
 constexpr int kRarely = 16;  // steps between looks at everything
@@ -87,9 +78,9 @@ inline bool contains(const std::vector<int> &numbers, int i) {
   return std::find(numbers.begin(), numbers.end(), i) != numbers.end();
 }
 
-template <typename Elements, typename Numbers>
-void requireReferences(Elements &elements, const Numbers &held) {
-  if (!Elements::kCounted) return;
+template <typename Kind, typename Numbers>
+void requireReferences(Kind &elements, const Numbers &held) {
+  if (!Kind::kCounted) return;
   std::array<int, kCount> expected = {};
   for (const int i : held) ++expected[static_cast<size_t>(i)];
   for (int i = 0; i < kCount; ++i) {
@@ -127,7 +118,7 @@ class GroupModel {
   void add(int i) {
     const Shortage shortage(choices_, false);
     const bool isNew = !contains(model_, i);
-    const bool added = isNew && !shortage.fails(1 + Api::Elements::kCopyAllocations);
+    const bool added = isNew && !shortage.fails(1 + Elements<Api>::kCopyAllocations);
     require(Api::add(group_.get(), elements_.at(i)) == added);
     if (added) model_.push_back(i);
   }
@@ -198,7 +189,7 @@ class GroupModel {
 
   Choices &choices_;
   Sizes sizes_;
-  typename Api::Elements elements_;
+  Elements<Api> elements_;
   Container<Api> group_{Api::alloc()};
   std::vector<int> model_;
 };
@@ -232,7 +223,7 @@ class ListModel {
  private:
   void append(int i) {
     const Shortage shortage(choices_, false);
-    const bool added = !shortage.fails(1 + Api::Elements::kCopyAllocations);
+    const bool added = !shortage.fails(1 + Elements<Api>::kCopyAllocations);
     require(Api::append(list_.get(), elements_.at(i)) == added);
     if (added) model_.push_back(i);
   }
@@ -251,7 +242,7 @@ class ListModel {
 
   void sort() {
     const WantedLeak kept;
-    Api::sort(list_.get(), &Api::Elements::compare);
+    Api::sort(list_.get(), &Elements<Api>::compare);
     std::stable_sort(model_.begin(), model_.end(),
                      [&](int a, int b) { return elements_.isBefore(a, b); });
   }
@@ -299,7 +290,7 @@ class ListModel {
 
   Choices &choices_;
   Sizes sizes_;
-  typename Api::Elements elements_;
+  Elements<Api> elements_;
   Container<Api> list_{Api::alloc()};
   std::vector<int> model_;
 };
@@ -335,7 +326,7 @@ class MapModel {
     int key, value;
   };
   using Place = typename std::vector<Entry>::iterator;
-  static constexpr bool kCopies = Api::Elements::kCopyAllocations > 0;
+  static constexpr bool kCopies = Elements<Api>::kCopyAllocations > 0;
 
   Place placeOf(int key) {
     return std::find_if(model_.begin(), model_.end(), [&](Entry e) { return e.key == key; });
@@ -361,7 +352,7 @@ class MapModel {
   // Whether that allocation of the operation succeeds.
   static bool isMade(const Shortage &shortage, uint32_t nth) { return !shortage.fails(nth); }
 
-  auto valueAt(int value) -> decltype(std::declval<typename Api::Elements &>().at(0)) {
+  auto valueAt(int value) -> decltype(std::declval<Elements<Api> &>().at(0)) {
     return value == kNull ? nullptr : elements_.at(value);
   }
 
@@ -439,7 +430,7 @@ class MapModel {
 
   Choices &choices_;
   Sizes sizes_;
-  typename Api::Elements elements_;
+  Elements<Api> elements_;
   Container<Api> map_{Api::alloc()};
   std::vector<Entry> model_;
 };

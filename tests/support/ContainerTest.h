@@ -1,5 +1,6 @@
-// What the tests of groups, lists and maps share: elements of every kind to fill containers with, a
-// look at the chain of nodes, and runs with failing memory and without the lock.
+// What the tests of groups, lists and maps share: elements of every kind to fill containers with,
+// one way to do what each kind of container does by its own function, a look at the chain of nodes,
+// and runs with failing memory.
 #ifndef QLX_TESTS_CONTAINERTEST_H
 #define QLX_TESTS_CONTAINERTEST_H
 
@@ -16,12 +17,12 @@
 #include <qlx/props.h>
 
 #include "QlxObjConfig.h"
+#include "support/ContainerApis.h"
 #include "support/FailingMemory.h"
-#include "support/FreshProcess.h"
 
 // Each kind has kCount elements: at(i) is the one to put in, is(element, i) knows it again, discard
 // ends what was handed out, and references(i) counts what containers and callers hold of it. They
-// take no lock.
+// take no lock. Those of lists have an order: by `compare` it is that of `sorted`.
 struct ElementKind {
   static constexpr int kCount = 3;
 };
@@ -32,6 +33,10 @@ struct Strings : ElementKind {
   bool is(const char *text, int i) const { return text && strcmp(text, texts[i]) == 0; }
   void discard(char *text) const { OslMemoryFree(text); }
   int references(int) const { return 0; }
+  static int compare(const void *a, const void *b) {
+    return strcmp(*static_cast<char *const *>(a), *static_cast<char *const *>(b));
+  }
+  const std::vector<int> sorted = {2, 0, 1};
 
   const char *const texts[kCount] = {"first", "second", ""};
 };
@@ -50,6 +55,10 @@ struct Parms : ElementKind {
   bool is(const Parm *parm, int i) const { return parm && QlxCmpParms(parm, &parms[i]) == 1; }
   void discard(Parm *parm) const { QlxFreeParm(parm); }
   int references(int) const { return 0; }
+  static int compare(const void *a, const void *b) {
+    return (*static_cast<Parm *const *>(a))->type - (*static_cast<Parm *const *>(b))->type;
+  }
+  const std::vector<int> sorted = {0, 2, 1};
 
   char text[4] = "abc";
   Parm parms[kCount] = {};
@@ -94,6 +103,50 @@ struct Classes : ElementKind {
   ObjClass classes[kCount] = {};
 };
 
+// Which of them a container holds.
+Strings elementsOf(char *);
+Parms elementsOf(Parm *);
+Objects elementsOf(QlxObject *);
+Configs elementsOf(ObjCfg *);
+Classes elementsOf(ObjClass *);
+template <typename Api>
+using Elements = decltype(elementsOf(ValueOf<Api>()));
+
+constexpr const char *kKeys[ElementKind::kCount] = {"a", "b", "c"};
+
+// Puts in an element; the key is for a map.
+template <typename Api, typename Element>
+uint8_t insert(typename Api::Head *container, const char *key, Element element) {
+  if constexpr (kHasKeys<Api>)
+    return Api::put(container, key, element);
+  else if constexpr (requires { Api::append; })
+    return Api::append(container, element);
+  else
+    return Api::add(container, element);
+}
+template <typename Api>
+uint8_t insert(typename Api::Head *container, Elements<Api> &elements, int i) {
+  return insert<Api>(container, kKeys[i], elements.at(i));
+}
+
+// What an iterator at the node hands out.
+template <typename Api, typename Node>
+ValueOf<Api> handOut(Node *node) {
+  if constexpr (kHasKeys<Api>)
+    return Api::getVal(node);
+  else
+    return Api::get(node);
+}
+
+// What a group or a map knows an element by.
+template <typename Api>
+auto idOf(Elements<Api> &elements, int i) {
+  if constexpr (kHasKeys<Api>)
+    return kKeys[i];
+  else
+    return elements.at(i);
+}
+
 // The nodes from head to tail; fails where the links of a container contradict each other.
 template <typename Head>
 auto chain(Head *container) {
@@ -111,6 +164,13 @@ auto chain(Head *container) {
   return nodes;
 }
 
+template <typename Head>
+std::string keysIn(Head *map) {
+  std::string keys;
+  for (auto *node : chain(map)) keys += node->key;
+  return keys;
+}
+
 // The numbers of a container's elements in order; kCount for one that is not known.
 using Numbers = std::vector<int>;
 template <typename Head, typename Kind>
@@ -123,6 +183,23 @@ Numbers numbersIn(Head *container, Kind &elements) {
   }
   return numbers;
 }
+
+// A container of an API and elements for it.
+template <typename Api>
+class ContainerTest : public ::testing::Test {
+ protected:
+  ~ContainerTest() override { Api::free(container); }
+
+  void fill() {
+    for (int i = 0; i < 3; i++) ASSERT_EQ(insert<Api>(container, elements, i), 1);
+  }
+  Numbers content() { return numbersIn(container, elements); }
+  std::string keys() { return keysIn(container); }
+  int oneIfCounted() const { return elements.kCounted ? 1 : 0; }
+
+  Elements<Api> elements;
+  typename Api::Head *container = Api::alloc();
+};
 
 // Names the instance in the name of a typed test.
 struct ApiNames {

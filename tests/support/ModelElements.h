@@ -13,6 +13,7 @@
 #include <qlx/props.h>
 
 #include "QlxObjConfig.h"
+#include "support/ContainerApis.h"
 
 namespace models {
 
@@ -107,6 +108,15 @@ struct Classes {
 
   std::array<ObjClass, kCount> classes = {};
 };
+
+// Which of them a container holds.
+Strings elementsOf(char *);
+Parms elementsOf(Parm *);
+Objects elementsOf(QlxObject *);
+Configs elementsOf(ObjCfg *);
+Classes elementsOf(ObjClass *);
+template <typename Api>
+using Elements = decltype(elementsOf(ValueOf<Api>()));
 
 }  // namespace models
 

@@ -31,8 +31,6 @@ class ConsoleHandlerTest : public ChainTest {
     QlxConsoleHandlerFOpen(handler.get());
   }
 
-  uint8_t opened() { return *static_cast<uint8_t *>(handler->vars); }
-
   Handle handler;
 };
 
@@ -74,12 +72,12 @@ TEST_F(ConsoleHandlerTest, WritesTheTrailerOnceAndTheHeaderAgainAfterIt) {
 
 TEST_F(ConsoleHandlerTest, ChangesItsStateWithoutHeaderAndTrailerToo) {
   CaptureStdout out;
-  EXPECT_EQ(opened(), 0);
   open();
-  EXPECT_EQ(opened(), 1);
+  formatter->header = "head";
+  log(u"first");
   close();
-  EXPECT_EQ(opened(), 0);
-  EXPECT_EQ(out.bytes(), "");
+  log(u"second");
+  EXPECT_EQ(out.bytes(), "first\n\nhead\nsecond\n\n");
 }
 
 TEST_F(ConsoleHandlerTest, WritesTheTrailerWhenItGoes) {
@@ -97,8 +95,17 @@ TEST_F(ConsoleHandlerTest, WritesNothingWithoutAFormatterAndForwardsAllTheSame) 
   CaptureStdout out;
   log(u"text");
   EXPECT_EQ(out.bytes(), "");
-  EXPECT_EQ(opened(), 1);
   EXPECT_RECORDED(u"text|");
+}
+
+TEST_F(ConsoleHandlerTest, IsOpenedByAnEventThatNoFormatterFormats) {
+  CaptureStdout out;
+  QlxHandlerSetFormatter(handler.get(), nullptr);
+  log(u"text");
+  format(handler);
+  formatter->header = "head";
+  log(u"next");
+  EXPECT_EQ(out.bytes(), "next\n\n");
 }
 
 TEST_F(ConsoleHandlerTest, WritesNothingForATextOfNullAndForwardsAllTheSame) {
@@ -147,16 +154,17 @@ TEST_F(ConsoleHandlerTest, KeepsTheOrderWithWhatTheHostPrintsItself) {
 }
 
 TEST_F(ConsoleHandlerTest, IgnoresEveryEventWithoutVariables) {
+  QlxRemListener(logger.get(), handler.get());
+  handler = getWithoutVariables("without", "qlx_consolehandler");
+  QlxAddListener(logger.get(), handler.get());
+  format(handler);
   forward();
-  uint8_t *vars = static_cast<uint8_t *>(handler->vars);
-  handler->vars = nullptr;
   CaptureStdout out;
   log(u"text");
   open();
   close();
   EXPECT_EQ(out.bytes(), "");
   EXPECT_RECORDED(u"");
-  handler->vars = vars;
 }
 
 TEST_F(ConsoleHandlerTest, IgnoresNull) {

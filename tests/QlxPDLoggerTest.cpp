@@ -6,6 +6,7 @@
 #include <cstring>
 #include <map>
 #include <optional>
+#include <set>
 #include <utility>
 
 #include "record/QlxFormatted.h"
@@ -51,8 +52,8 @@ class PDLoggerTest : public ChainTest {
   };
 
   // A logger of the class with a handler below it.
-  Handle listened(const char *name) {
-    Handle made = get(name, "qlx_pdlogger");
+  Handle listened(const char *name) { return listened(get(name, "qlx_pdlogger")); }
+  Handle listened(Handle made) {
     const Handle handler = get("recording", RecordingHandler::kClass);
     QlxAddListener(made.get(), handler.get());
     return made;
@@ -62,12 +63,7 @@ class PDLoggerTest : public ChainTest {
     EXPECT_EQ(QlxSetObjProp(logger.get(), key, value), 1);
   }
 
-  // Takes a property away and tells the class of it.
-  void clear(const char *key) {
-    const ApiLock lock;
-    qlxIntlStringToStringMapRem(qlxFetchObjPropMap(logger.get()), key);
-    QlxPDLoggerFCfgChange(logger.get(), key);
-  }
+  void clear(const char *key) { ToolkitTest::clear(logger, key); }
 
   // What an event carries that was logged just now.
   const Seen &logged(const char16_t *text = u"text") {
@@ -331,21 +327,18 @@ TEST_F(PDLoggerTest, IgnoresNull) {
 }
 
 TEST_F(PDLoggerTest, WithoutVariablesItStampsWhereItRunsAndLogsOn) {
-  void *own = logger->vars;
-  logger->vars = nullptr;
+  logger = listened(getWithoutVariables("without", "qlx_pdlogger"));
   set("product", "Quill");
   EXPECT_EQ(logged(u"ABC0001E wrong").all, whereItRuns());
   EXPECT_EQ(seen.messageId, "ABC0001E");
-  logger->vars = own;
 }
 
 TEST_F(PDLoggerTest, WithoutVariablesTheKeysOfTheBasicLoggerStillCount) {
-  void *own = std::exchange(logger->vars, nullptr);
+  logger = getWithoutVariables("without", "qlx_pdlogger");
   set("level", "WARN");
   EXPECT_EQ(logger->kind1.level, WARN);
   set("logging", "off");
   EXPECT_EQ(QlxIsObjectEnabled(logger.get()), 0);
-  logger->vars = own;
 }
 
 // ---- Without memory
@@ -484,21 +477,23 @@ TEST_F(PDLoggerTest, AllItsMemoryIsGivenBackWhenItIsReleased) {
 }
 
 TEST_F(PDLoggerTest, WhatFindsNoMemoryIsNotStamped) {
-  FailingMemory memory;
-  void *const own = logger->vars;
-  {
-    const ApiLock lock;
-    memory.failFrom(1);
-    EXPECT_EQ(QlxPDLoggerFAllocVars(), nullptr);
-    memory.failOnce(2);  // the host's name, behind the block
-    logger->vars = QlxPDLoggerFAllocVars();
-    memory.failNone();
+  std::set<std::string> stamped;
+  bool failed = true;
+  for (uint64_t n = 1; failed; ++n) {
+    logger.reset();
+    {
+      FailingMemory memory;
+      memory.failOnce(n);
+      logger = get("made", "qlx_pdlogger");
+      failed = memory.failures() > 0;
+    }
+    if (!logger) continue;
+    logger = listened(std::move(logger));
+    stamped.insert(logged().all);
   }
-  ASSERT_NE(logger->vars, nullptr);
-  EXPECT_EQ(logged().all, "serverFormat=IP|" + whereItRuns());
-  const ApiLock lock;
-  QlxPDLoggerFFreeVars(logger->vars);
-  logger->vars = own;
+  const std::string server = "server=alpha.example.org|", format = "serverFormat=IP|";
+  EXPECT_EQ(stamped, (std::set{server + format + whereItRuns(), server + whereItRuns(),
+                               format + whereItRuns(), whereItRuns()}));
 }
 
 }  // namespace

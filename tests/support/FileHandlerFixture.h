@@ -35,11 +35,7 @@ class FileHandlerFixture : public ChainTest {
   }
 
   // Tells the handler of a key that has no value.
-  void changeAbsent(const char *key) {
-    const ApiLock lock;
-    if (handler->props) qlxIntlStringToStringMapRem(handler->props, key);
-    QlxFileHandlerFCfgChange(handler.get(), key);
-  }
+  void changeAbsent(const char *key) { clear(handler, key); }
 
   // Has another handler record what this one passes on.
   void forward() {

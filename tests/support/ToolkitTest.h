@@ -10,6 +10,8 @@
 
 #include "QlxObjConfig.h"
 #include "QlxObject.h"
+#include "object/QlxLocked.h"
+#include "support/FailingMemory.h"
 
 class ToolkitTest : public ::testing::Test {
  protected:
@@ -32,6 +34,26 @@ class ToolkitTest : public ::testing::Test {
     ASSERT_NE(found, nullptr);
     EXPECT_EQ(QlxSetObjCfgProp(found, key, value), 1);
     QlxReleaseObjCfg(found);
+  }
+
+  // Takes a property away and tells the class, which then reads it as absent.
+  static void clear(const Handle &object, const char *key) {
+    const ApiLock lock;
+    if (object->props) qlxIntlStringToStringMapRem(object->props, key);
+    object->objClass->fCfgChange(object.get(), key);
+  }
+
+  // An object for whose variables there was no memory.
+  static Handle getWithoutVariables(const char *name, const char *className) {
+    constexpr uint64_t kMost = 100;  // allocations of one that is made whole
+    for (uint64_t n = 1; n < kMost; ++n) {
+      FailingMemory memory;
+      memory.failOnce(n);
+      Handle made = get(name, className);
+      if (made && !made->vars) return made;
+    }
+    ADD_FAILURE() << className << " always has variables";
+    return nullptr;
   }
 
   // A string result as std::string; frees it. "<null>" for null.

@@ -2,8 +2,6 @@
 // formatters.
 #include <cstdio>
 
-#include <sys/sem.h>
-
 #include <unicode/utypes.h>
 
 #include <qlx/class.h>
@@ -14,6 +12,7 @@
 #include "support/NullCalls.h"
 #include "support/OpenToolkit.h"
 #include "support/ResourceBundles.h"
+#include "support/SemaphoreKey.h"
 #include "support/TempDir.h"
 
 namespace {
@@ -255,7 +254,8 @@ NULL_GROUP(MultiProcessFileHandlers) {
   const OpenToolkit toolkit;
   QlxObject *handler = QlxGetObject("file", "qlx_multiproc_filehandler");
   QlxSetObjProp(handler->kind2.formatter, "dateTimeFormat", "''");
-  QlxSetObjProp(handler, "MPFileSemKey", "0");  // a set of this process alone
+  const SemaphoreKey key;
+  QlxSetObjProp(handler, "MPFileSemKey", key.text().c_str());
   QlxSetObjProp(handler, "fileName", dir.path("app.log").c_str());
   Event *event = QlxVaAllocUEvent(INFO, nullptr, nullptr, u"text");
   HELD(QlxMultiProcFileUHandlerFProcess, with(handler, event, nullptr), nothing);
@@ -265,7 +265,6 @@ NULL_GROUP(MultiProcessFileHandlers) {
   HELD(qlxIntlGetHandlerProblems, with(nullptr), nothing);
   EXPECT_EQ(event->status, kSuccess);
   EXPECT_EQ(dir.read("app.log"), "' text\n");
-  semctl(qlxFileHandlerVars(handler)->semId, 0, IPC_RMID);
   QlxFreeEvent(event);
   QlxReleaseObject(handler);
 }

@@ -1,92 +1,35 @@
-#include <qlx/class/formatter.h>
-
-#include <gtest/gtest.h>
+#include "support/FormatterTest.h"
 
 #include <string>
-#include <vector>
 
 #include <unicode/ustring.h>
 
 #include "object/QlxClasses.h"
-#include "text/QlxFormatCache.h"
-#include "object/QlxLocked.h"
 #include "support/FailingMemory.h"
-#include "support/IcuDefaults.h"
-#include "support/Take.h"
-#include "support/ToolkitTest.h"
-#include "util/CxOwned.h"
+#include "text/QlxFormatCache.h"
 
 namespace {
 
-// 2006-08-16 08:48:55.123 UTC
-constexpr double kTime = 1155718135123.0;
-
-class BasicFormatterTest : public ToolkitTest {
+class BasicFormatterTest : public FormatterTest {
  protected:
-  using EventPtr = Owned<Event, QlxFreeEvent>;
-
-  void SetUp() override {
-    ToolkitTest::SetUp();
-    ASSERT_TRUE(IcuDefaults::setLocale("en_US"));
-    ASSERT_TRUE(IcuDefaults::setZone(u"Europe/Berlin"));
-    formatter_ = get("formatter", "qlx_basicformatter");
-    ASSERT_TRUE(formatter_);
-  }
-  void TearDown() override {
-    formatter_.reset();
-    ToolkitTest::TearDown();
-  }
-
-  static EventPtr makeEvent(const UChar *text, double time = kTime) {
-    EventPtr event{QlxVaAllocUEvent(INFO, nullptr, nullptr, text)};
-    event->time = time;
-    return event;
-  }
-
-  void set(const char *key, const char *value) {
-    EXPECT_EQ(QlxSetObjProp(formatter_.get(), key, value), 1);
-  }
-
-  // Takes a property away and tells the class, which then reads it as absent.
-  void clear(const char *key) {
-    const ApiLock lock;
-    qlxIntlStringToStringMapRem(qlxFetchObjPropMap(formatter_.get()), key);
-    QlxBasicFormatterFCfgChange(formatter_.get(), key);
-  }
-
-  static std::u16string lineBy(QlxObject *formatter, Event *event, va_list *args = nullptr) {
-    const ApiLock lock;
-    return ::take(QlxBasicUFormatterFFormat(formatter, event, args));
-  }
-  std::u16string line(const EventPtr &event) { return lineBy(formatter_.get(), event.get()); }
-
-  std::u16string lineWith(Event *event, ...) {
-    va_list args;
-    va_start(args, event);
-    const std::u16string text = lineBy(formatter_.get(), event, &args);
-    va_end(args);
-    return text;
-  }
+  BasicFormatterTest() : FormatterTest("qlx_basicformatter", QlxBasicUFormatterFFormat) {}
 
   std::u16string date(double time) {
-    return ::take(QlxBasicUFormatterFormatDate(formatter_.get(), time));
+    return ::take(QlxBasicUFormatterFormatDate(formatter.get(), time));
   }
-
-  IcuDefaults defaults_;
-  Handle formatter_;
 };
 
 // ---- The line
 
 TEST_F(BasicFormatterTest, ALineIsTheTimeWithItsOffsetTheMessageAndALineFeed) {
-  EXPECT_EQ(line(makeEvent(u"message")), u"2006-08-16 10:48:55.123+02:00 message\n");
+  EXPECT_EQ(formatted(makeEvent(u"message")), u"2006-08-16 10:48:55.123+02:00 message\n");
 }
 
 TEST_F(BasicFormatterTest, ADebugEventHasItsPlaceInTheSource) {
   const EventPtr event = makeEvent(u"message");
   QlxSetEventProp(event.get(), "qlx_prop_srcfile", "main.c");
   QlxSetEventPropInt(event.get(), "qlx_prop_srcline", 42);
-  EXPECT_EQ(line(event), u"2006-08-16 10:48:55.123+02:00 main.c 42 message\n");
+  EXPECT_EQ(formatted(event), u"2006-08-16 10:48:55.123+02:00 main.c 42 message\n");
 }
 
 TEST_F(BasicFormatterTest, TheOrderOfTheFieldsIsFixed) {
@@ -96,7 +39,7 @@ TEST_F(BasicFormatterTest, TheOrderOfTheFieldsIsFixed) {
                           "qlx_prop_srcfunction", "qlx_prop_srcfile"})
     QlxSetEventProp(event.get(), key, key);
   QlxSetEventPropInt(event.get(), "qlx_prop_srcline", 42);
-  EXPECT_EQ(line(event),
+  EXPECT_EQ(formatted(event),
             u"55 qlx_prop_srcfile qlx_prop_srcfunction 42 organization product component client "
             u"server message\n");
 }
@@ -107,14 +50,14 @@ TEST_F(BasicFormatterTest, OtherPropertiesAndTheLevelAreNoPartOfTheLine) {
   event->level = FATAL;
   QlxSetEventProp(event.get(), "other", "value");
   QlxSetEventMessageId(event.get(), "ID");
-  EXPECT_EQ(line(event), u"55 message\n");
+  EXPECT_EQ(formatted(event), u"55 message\n");
 }
 
 TEST_F(BasicFormatterTest, APropertyWithAnEmptyValueIsAField) {
   set("dateTimeFormat", "ss");
   const EventPtr event = makeEvent(u"message");
   QlxSetEventProp(event.get(), "product", "");
-  EXPECT_EQ(line(event), u"55  message\n");
+  EXPECT_EQ(formatted(event), u"55  message\n");
 }
 
 TEST_F(BasicFormatterTest, TheLineNumberIsReadAsAnIntegerProperty) {
@@ -133,7 +76,7 @@ TEST_F(BasicFormatterTest, TheLineNumberIsReadAsAnIntegerProperty) {
   for (const auto &[value, expected] : kCases) {
     const EventPtr event = makeEvent(u"message");
     QlxSetEventProp(event.get(), "qlx_prop_srcline", value);
-    EXPECT_EQ(line(event), expected) << value;
+    EXPECT_EQ(formatted(event), expected) << value;
   }
 }
 
@@ -143,30 +86,30 @@ TEST_F(BasicFormatterTest, PropertiesAndSeparatorAreReadInTheDefaultCodePage) {
   set("separator", "\xC3\xA9");
   const EventPtr event = makeEvent(u"message");
   QlxSetEventProp(event.get(), "product", "\xE4\xB8\x80");
-  EXPECT_EQ(line(event), u"55\u00E9\u4E00\u00E9message\n");
+  EXPECT_EQ(formatted(event), u"55\u00E9\u4E00\u00E9message\n");
 }
 
 TEST_F(BasicFormatterTest, AMessageThatBindsToNothingLeavesSeparatorAndLineFeed) {
   set("dateTimeFormat", "ss");
-  EXPECT_EQ(line(makeEvent(nullptr)), u"55 \n");
-  EXPECT_EQ(line(makeEvent(u"")), u"55 \n");
-  EXPECT_EQ(line(makeEvent(u"{0")), u"55 \n");
+  EXPECT_EQ(formatted(makeEvent(nullptr)), u"55 \n");
+  EXPECT_EQ(formatted(makeEvent(u"")), u"55 \n");
+  EXPECT_EQ(formatted(makeEvent(u"{0")), u"55 \n");
   const EventPtr event = makeEvent(u"message");
   qlxIntlFreeI18Msg(event->message);
   event->message = nullptr;
-  EXPECT_EQ(line(event), u"55 \n");
+  EXPECT_EQ(formatted(event), u"55 \n");
 }
 
 TEST_F(BasicFormatterTest, AFailedBindIsLeftOnTheMessage) {
   const EventPtr event = makeEvent(u"{0");
-  line(event);
+  formatted(event);
   EXPECT_EQ(event->message->error, U_UNMATCHED_BRACES);
 }
 
 TEST_F(BasicFormatterTest, TheArgumentsAreBoundAndStayUnread) {
   set("dateTimeFormat", "ss");
   const EventPtr event = makeEvent(u"{1} {0,number}");
-  EXPECT_EQ(lineWith(event.get(), 1234.5, u"text"), u"55 text 1,234.5\n");
+  EXPECT_EQ(formattedWith(event.get(), 1234.5, u"text"), u"55 text 1,234.5\n");
 }
 
 TEST_F(BasicFormatterTest, ALongLineIsWhole) {
@@ -175,30 +118,30 @@ TEST_F(BasicFormatterTest, ALongLineIsWhole) {
   const std::u16string text(5000, u't');
   const EventPtr event = makeEvent(text.c_str());
   QlxSetEventProp(event.get(), "product", value.c_str());
-  EXPECT_EQ(line(event), u"55 " + std::u16string(3000, u'v') + u" " + text + u"\n");
+  EXPECT_EQ(formatted(event), u"55 " + std::u16string(3000, u'v') + u" " + text + u"\n");
 }
 
 TEST_F(BasicFormatterTest, WhatIsNoFormatterAndNoEventGivesNoLine) {
   const EventPtr event = makeEvent(u"message");
-  EXPECT_EQ(lineBy(nullptr, event.get()), u"<null>");
-  EXPECT_EQ(lineBy(formatter_.get(), nullptr), u"<null>");
+  EXPECT_EQ(formattedBy(nullptr, event.get()), u"<null>");
+  EXPECT_EQ(formattedBy(formatter.get(), nullptr), u"<null>");
   const Handle handler = get("handler", "qlx_consolehandler");
-  EXPECT_EQ(lineBy(handler.get(), event.get()), u"<null>");
+  EXPECT_EQ(formattedBy(handler.get(), event.get()), u"<null>");
   QlxObject retired{};
-  EXPECT_EQ(lineBy(&retired, event.get()), u"<null>");
+  EXPECT_EQ(formattedBy(&retired, event.get()), u"<null>");
   ObjClass withoutBinder = qlxBasicFormatterClass;
   withoutBinder.op4.fBindMsg = nullptr;
   retired.objClass = &withoutBinder;
-  EXPECT_EQ(lineBy(&retired, event.get()), u"<null>");
+  EXPECT_EQ(formattedBy(&retired, event.get()), u"<null>");
   ObjClass ofAnotherKind = qlxBasicFormatterClass;
   ofAnotherKind.kind = Handler;
   retired.objClass = &ofAnotherKind;
-  EXPECT_EQ(lineBy(&retired, event.get()), u"<null>");
+  EXPECT_EQ(formattedBy(&retired, event.get()), u"<null>");
 }
 
 TEST_F(BasicFormatterTest, HeaderAndTrailerAreNull) {
-  EXPECT_EQ(QlxBasicFormatterFGetHeader(formatter_.get()), nullptr);
-  EXPECT_EQ(QlxBasicFormatterFGetTrailer(formatter_.get()), nullptr);
+  EXPECT_EQ(QlxBasicFormatterFGetHeader(formatter.get()), nullptr);
+  EXPECT_EQ(QlxBasicFormatterFGetTrailer(formatter.get()), nullptr);
   EXPECT_EQ(QlxBasicFormatterFGetHeader(nullptr), nullptr);
   EXPECT_EQ(QlxBasicFormatterFGetTrailer(nullptr), nullptr);
 }
@@ -211,11 +154,11 @@ TEST_F(BasicFormatterTest, TheSeparatorStandsBetweenAllFields) {
   QlxSetEventProp(event.get(), "product", "p");
   QlxSetEventPropInt(event.get(), "qlx_prop_srcline", 1);
   set("separator", " | ");
-  EXPECT_EQ(line(event), u"55 | 1 | p | message\n");
+  EXPECT_EQ(formatted(event), u"55 | 1 | p | message\n");
   set("separator", "");
-  EXPECT_EQ(line(event), u"551pmessage\n") << "an empty one joins with nothing";
+  EXPECT_EQ(formatted(event), u"551pmessage\n") << "an empty one joins with nothing";
   clear("separator");
-  EXPECT_EQ(line(event), u"55 1 p message\n");
+  EXPECT_EQ(formatted(event), u"55 1 p message\n");
 }
 
 TEST_F(BasicFormatterTest, SettingsComeFromTheConfiguration) {
@@ -229,15 +172,15 @@ TEST_F(BasicFormatterTest, SettingsComeFromTheConfiguration) {
   const Handle configured = get("configured");
   ASSERT_TRUE(configured);
   const EventPtr event = makeEvent(u"message");
-  EXPECT_EQ(lineBy(configured.get(), event.get()), u"10:48;message\n");
+  EXPECT_EQ(formattedBy(configured.get(), event.get()), u"10:48;message\n");
   EXPECT_STREQ(event->locale, "de");
 }
 
 TEST_F(BasicFormatterTest, OtherKeysAreThoseOfEveryObject) {
   set("logging", "false");
-  EXPECT_EQ(QlxIsObjectEnabled(formatter_.get()), 0);
+  EXPECT_EQ(QlxIsObjectEnabled(formatter.get()), 0);
   set("Separator", "|");
-  EXPECT_EQ(formatter_->kind1.separator, nullptr) << "keys are case-sensitive";
+  EXPECT_EQ(formatter->kind1.separator, nullptr) << "keys are case-sensitive";
 }
 
 TEST_F(BasicFormatterTest, AnObjectOfAnotherKindKeepsWhatItHasInThePlacesOfTheSettings) {
@@ -258,8 +201,8 @@ TEST_F(BasicFormatterTest, AnObjectOfAnotherKindKeepsWhatItHasInThePlacesOfTheSe
 
 TEST_F(BasicFormatterTest, AConfigurationChangeNeedsObjectAndKey) {
   QlxBasicFormatterFCfgChange(nullptr, "separator");
-  QlxBasicFormatterFCfgChange(formatter_.get(), nullptr);
-  EXPECT_EQ(formatter_->kind1.separator, nullptr);
+  QlxBasicFormatterFCfgChange(formatter.get(), nullptr);
+  EXPECT_EQ(formatter->kind1.separator, nullptr);
 }
 
 // ---- The locale
@@ -267,21 +210,21 @@ TEST_F(BasicFormatterTest, AConfigurationChangeNeedsObjectAndKey) {
 TEST_F(BasicFormatterTest, TheFormattersLocaleStaysOnTheEvent) {
   set("dateTimeFormat", "ss");
   const EventPtr event = makeEvent(u"{0,number}");
-  EXPECT_EQ(lineWith(event.get(), 1234.5), u"55 1,234.5\n");
+  EXPECT_EQ(formattedWith(event.get(), 1234.5), u"55 1,234.5\n");
   EXPECT_EQ(event->locale, nullptr);
   set("locale", "de");
-  EXPECT_EQ(lineWith(event.get(), 1234.5), u"55 1.234,5\n");
+  EXPECT_EQ(formattedWith(event.get(), 1234.5), u"55 1.234,5\n");
   EXPECT_STREQ(event->locale, "de");
   EXPECT_STREQ(event->message->locale, "de");
   clear("locale");
-  EXPECT_EQ(lineWith(event.get(), 1234.5), u"55 1.234,5\n") << "what comes later sees it";
+  EXPECT_EQ(formattedWith(event.get(), 1234.5), u"55 1.234,5\n") << "what comes later sees it";
 }
 
 TEST_F(BasicFormatterTest, WithoutALocaleOfItsOwnTheEventsIsUsed) {
   set("dateTimeFormat", "ss");
   const EventPtr event = makeEvent(u"{0,number}");
   qlxSetEventLocale(event.get(), "de");
-  EXPECT_EQ(lineWith(event.get(), 1234.5), u"55 1.234,5\n");
+  EXPECT_EQ(formattedWith(event.get(), 1234.5), u"55 1.234,5\n");
 }
 
 TEST_F(BasicFormatterTest, TheDateIsOfTheDefaultLocaleWhateverTheFormatters) {
@@ -303,9 +246,9 @@ TEST_F(BasicFormatterTest, AClassWithABinderOfItsOwnBindsWithThat) {
   const Handle binding = get("binding", "test_binding");
   QlxSetObjProp(binding.get(), "dateTimeFormat", "ss");
   const EventPtr event = makeEvent(u"message");
-  EXPECT_EQ(lineBy(binding.get(), event.get()), u"55 \n");
+  EXPECT_EQ(formattedBy(binding.get(), event.get()), u"55 \n");
   QlxSetObjProp(binding.get(), "locale", "fr");
-  EXPECT_EQ(lineBy(binding.get(), event.get()), u"55 fr\n");
+  EXPECT_EQ(formattedBy(binding.get(), event.get()), u"55 fr\n");
 }
 
 // ---- The date
@@ -345,7 +288,7 @@ TEST_F(BasicFormatterTest, ADateByAConfiguredPatternHasNoOffset) {
 TEST_F(BasicFormatterTest, AnEmptyPatternGivesAnEmptyDate) {
   set("dateTimeFormat", "");
   EXPECT_EQ(date(kTime), u"");
-  EXPECT_EQ(line(makeEvent(u"message")), u" message\n");
+  EXPECT_EQ(formatted(makeEvent(u"message")), u" message\n");
 }
 
 TEST_F(BasicFormatterTest, ADateOfAnyLengthIsWhole) {
@@ -376,7 +319,7 @@ TEST_F(BasicFormatterTest, WithoutMemoryALineLacksFieldsOrIsNull) {
       qlxDropCachedFormats();
       FailingMemory memory;
       (memory.*fail)(nth);
-      const std::u16string text = line(event);
+      const std::u16string text = formatted(event);
       if (memory.failures() == 0) {
         EXPECT_EQ(text, whole);
         break;

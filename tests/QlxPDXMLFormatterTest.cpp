@@ -1,6 +1,7 @@
 #include "support/PDXMLFormatterFixture.h"
 
 #include "support/ResourceBundles.h"
+#include "support/TempDir.h"
 
 namespace {
 
@@ -20,7 +21,7 @@ TEST_F(PDXMLFormatterTest, AMessageHasAllItsElementsInOneOrder) {
   QlxSetEventPropLong(event.get(), "threadId", 7);
   QlxSetEventPropLong(event.get(), "processId", 8);
   const std::string path = bundles.path();
-  EXPECT_EQ(recordWith(event.get(), u"a.txt", -3),
+  EXPECT_EQ(formattedWith(event.get(), u"a.txt", -3),
             u"<Message Id=\"ABC0001W\" Severity=\"WARN\">\n" + kTimeElement +
                 u" <Server Format=\"serverFormat\">server</Server>\n"
                 u" <ProductId>product</ProductId>\n"
@@ -46,24 +47,24 @@ TEST_F(PDXMLFormatterTest, ATraceHasThreadAndProcessAndNoTranslation) {
     QlxSetEventProp(event.get(), key, key);
   QlxSetEventPropLong(event.get(), "processId", 8);
   QlxSetEventPropLong(event.get(), "threadId", 7);
-  EXPECT_EQ(record(event), u"<Trace Level=\"MID\">\n" + kTimeElement +
-                               u" <ProductId>product</ProductId>\n"
-                               u" <LogText><![CDATA[text]]></LogText>\n"
-                               u" <LogAttribs><Key>own</Key><Value>own</Value></LogAttribs>\n"
-                               u" <Source FileName=\"qlx_prop_srcfile\"/>\n"
-                               u" <Thread>7</Thread>\n"
-                               u" <Process>8</Process>\n"
-                               u" <CorrelationId>correlationId</CorrelationId>\n"
-                               u" <Principal>client</Principal>\n"
-                               u"</Trace>\n");
+  EXPECT_EQ(formatted(event), u"<Trace Level=\"MID\">\n" + kTimeElement +
+                                  u" <ProductId>product</ProductId>\n"
+                                  u" <LogText><![CDATA[text]]></LogText>\n"
+                                  u" <LogAttribs><Key>own</Key><Value>own</Value></LogAttribs>\n"
+                                  u" <Source FileName=\"qlx_prop_srcfile\"/>\n"
+                                  u" <Thread>7</Thread>\n"
+                                  u" <Process>8</Process>\n"
+                                  u" <CorrelationId>correlationId</CorrelationId>\n"
+                                  u" <Principal>client</Principal>\n"
+                                  u"</Trace>\n");
 }
 
 TEST_F(PDXMLFormatterTest, ATraceWithoutASourceSaysNone) {
-  EXPECT_EQ(record(makeEvent()), trace());
+  EXPECT_EQ(formatted(makeEvent()), trace());
 }
 
 TEST_F(PDXMLFormatterTest, AMessageWithoutASourceSaysNothing) {
-  EXPECT_EQ(record(markedMessage(u"text")),
+  EXPECT_EQ(formatted(markedMessage(u"text")),
             u"<Message Id=\"None\" Severity=\"INFO\">\n" + kTimeElement +
                 u" <LogText><![CDATA[text]]></LogText>\n"
                 u" <TranslationInfo Resource Bundle=\"\" MsgKey=\"\"></TranslationInfo>\n"
@@ -73,7 +74,7 @@ TEST_F(PDXMLFormatterTest, AMessageWithoutASourceSaysNothing) {
 TEST_F(PDXMLFormatterTest, NothingIsEscapedAndTextMayEndItsSection) {
   const EventPtr event = makeEvent(u"<&>]]> \u4E00");
   QlxSetEventProp(event.get(), "<\">", "a]]><b>");
-  EXPECT_EQ(record(event),
+  EXPECT_EQ(formatted(event),
             u"<Trace Level=\"INFO\">\n" + kTimeElement +
                 u" <LogText><![CDATA[<&>]]> \u4E00]]></LogText>\n"
                 u" <LogAttribs><Key><\"></Key><Value>a]]><b></Value></LogAttribs>\n" +
@@ -82,9 +83,9 @@ TEST_F(PDXMLFormatterTest, NothingIsEscapedAndTextMayEndItsSection) {
 
 TEST_F(PDXMLFormatterTest, AMessageThatBindsToNothingHasAnEmptyText) {
   for (const UChar *text : {u"{0", u"", static_cast<const UChar *>(nullptr)})
-    EXPECT_TRUE(has(record(makeEvent(text)), u" <LogText><![CDATA[]]></LogText>\n"));
+    EXPECT_TRUE(has(formatted(makeEvent(text)), u" <LogText><![CDATA[]]></LogText>\n"));
   const EventPtr event = makeEvent(u"{0");
-  record(event);
+  formatted(event);
   EXPECT_EQ(event->message->error, U_UNMATCHED_BRACES);
 }
 
@@ -92,23 +93,23 @@ TEST_F(PDXMLFormatterTest, AnEventWithoutAMessageHasNeitherTextNorTranslation) {
   const EventPtr event = markedMessage(u"text");
   qlxIntlFreeI18Msg(event->message);
   event->message = nullptr;
-  EXPECT_EQ(record(event), u"<Message Id=\"None\" Severity=\"INFO\">\n" + kTimeElement +
-                               u" <LogText><![CDATA[]]></LogText>\n</Message>\n");
+  EXPECT_EQ(formatted(event), u"<Message Id=\"None\" Severity=\"INFO\">\n" + kTimeElement +
+                                  u" <LogText><![CDATA[]]></LogText>\n</Message>\n");
 }
 
 TEST_F(PDXMLFormatterTest, WithoutFormatterVariablesOrEventThereIsNoRecord) {
   const EventPtr event = makeEvent();
-  EXPECT_EQ(recordBy(nullptr, event.get(), nullptr), u"<null>");
-  EXPECT_EQ(recordBy(formatter_.get(), nullptr, nullptr), u"<null>");
+  EXPECT_EQ(formattedBy(nullptr, event.get()), u"<null>");
+  EXPECT_EQ(formattedBy(formatter.get(), nullptr), u"<null>");
   const Handle basic = get("basic", "qlx_basicformatter");
-  EXPECT_EQ(recordBy(basic.get(), event.get(), nullptr), u"<null>");
+  EXPECT_EQ(formattedBy(basic.get(), event.get()), u"<null>");
   const Handle handler = get("handler", "qlx_filehandler");
-  EXPECT_EQ(recordBy(handler.get(), event.get(), nullptr), u"<null>");
+  EXPECT_EQ(formattedBy(handler.get(), event.get()), u"<null>");
 }
 
 TEST_F(PDXMLFormatterTest, HeaderAndTrailerAreNull) {
-  EXPECT_EQ(QlxPDXMLFormatterFGetHeader(formatter_.get()), nullptr);
-  EXPECT_EQ(QlxPDXMLFormatterFGetTrailer(formatter_.get()), nullptr);
+  EXPECT_EQ(QlxPDXMLFormatterFGetHeader(formatter.get()), nullptr);
+  EXPECT_EQ(QlxPDXMLFormatterFGetTrailer(formatter.get()), nullptr);
   EXPECT_EQ(QlxPDXMLFormatterFGetHeader(nullptr), nullptr);
   EXPECT_EQ(QlxPDXMLFormatterFGetTrailer(nullptr), nullptr);
 }
@@ -126,10 +127,10 @@ TEST_F(PDXMLFormatterTest, OneForceAloneDecidesTheKind) {
       {"false", "true", false, false},
   };
   for (const auto &[asMessage, asTrace, messageIsMessage, traceIsMessage] : kCases) {
-    configureTo("forceAsMessage", asMessage);
-    configureTo("forceAsTrace", asTrace);
-    const std::u16string ofMessage = record(markedMessage(u"text"));
-    const std::u16string ofTrace = record(makeEvent());
+    set("forceAsMessage", asMessage);
+    set("forceAsTrace", asTrace);
+    const std::u16string ofMessage = formatted(markedMessage(u"text"));
+    const std::u16string ofTrace = formatted(makeEvent());
     EXPECT_EQ(ofMessage.starts_with(u"<Message "), messageIsMessage) << asMessage << asTrace;
     EXPECT_EQ(ofMessage.ends_with(u"</Message>\n"), messageIsMessage) << asMessage << asTrace;
     EXPECT_EQ(ofTrace.starts_with(u"<Message "), traceIsMessage) << asMessage << asTrace;
@@ -172,8 +173,8 @@ TEST_F(PDXMLFormatterTest, AnEmptyIdentifierIsNoneWithoutALookIntoTheText) {
 // ---- Time and locale
 
 TEST_F(PDXMLFormatterTest, TheTimeIsInTheConfiguredPatternBesideItsMilliseconds) {
-  configureTo("dateTimeFormat", "HH:mm");
-  EXPECT_TRUE(has(record(makeEvent()), u" <Time Millis=\"1155718135123\">10:48</Time>\n"));
+  set("dateTimeFormat", "HH:mm");
+  EXPECT_TRUE(has(formatted(makeEvent()), u" <Time Millis=\"1155718135123\">10:48</Time>\n"));
 }
 
 TEST_F(PDXMLFormatterTest, TheFormattersLocaleStaysOnTheEventAndBinds) {
@@ -181,8 +182,8 @@ TEST_F(PDXMLFormatterTest, TheFormattersLocaleStaysOnTheEventAndBinds) {
   ASSERT_TRUE(bundles.add("root", R"(k { "{0,number}" })"));
   ASSERT_TRUE(bundles.add("de", R"(k { "{0,number} {1}" })"));
   const EventPtr event = makeMessage(bundles.path(), "k");
-  configureTo("locale", "de");
-  const std::u16string german = recordWith(event.get(), 1234.5, u"Mal");
+  set("locale", "de");
+  const std::u16string german = formattedWith(event.get(), 1234.5, u"Mal");
   EXPECT_TRUE(has(german, u"<![CDATA[1.234,5 Mal]]></LogText>"));
   EXPECT_TRUE(has(german, u"<Param><![CDATA[1234.5]]></Param><Param><![CDATA[Mal]]></Param>"));
   EXPECT_STREQ(event->locale, "de");
@@ -191,14 +192,14 @@ TEST_F(PDXMLFormatterTest, TheFormattersLocaleStaysOnTheEventAndBinds) {
 TEST_F(PDXMLFormatterTest, WithoutALocaleOfItsOwnTheEventsBinds) {
   const EventPtr event = makeEvent(u"{0,number}");
   qlxSetEventLocale(event.get(), "de");
-  EXPECT_TRUE(has(recordWith(event.get(), 1234.5), u"<![CDATA[1.234,5]]>"));
+  EXPECT_TRUE(has(formattedWith(event.get(), 1234.5), u"<![CDATA[1.234,5]]>"));
   EXPECT_STREQ(event->locale, "de");
 }
 
 TEST_F(PDXMLFormatterTest, TheSeparatorIsTakenAndNotUsed) {
-  configureTo("separator", "|");
-  EXPECT_STREQ(formatter_->kind1.separator, "|");
-  EXPECT_EQ(record(makeEvent()), trace());
+  set("separator", "|");
+  EXPECT_STREQ(formatter->kind1.separator, "|");
+  EXPECT_EQ(formatted(makeEvent()), trace());
 }
 
 // ---- Properties
@@ -208,7 +209,7 @@ TEST_F(PDXMLFormatterTest, FreeAttributesStandInTheOrderInWhichTheyWereSet) {
   for (const char *key : {"z", "product", "a", "organization"})
     QlxSetEventProp(event.get(), key, "x");
   QlxSetEventProp(event.get(), "z", "last");
-  EXPECT_TRUE(has(record(event),
+  EXPECT_TRUE(has(formatted(event),
                   u" <LogAttribs><Key>z</Key><Value>last</Value><Key>a</Key><Value>x</Value>"
                   u"<Key>organization</Key><Value>x</Value></LogAttribs>\n"));
 }
@@ -216,78 +217,83 @@ TEST_F(PDXMLFormatterTest, FreeAttributesStandInTheOrderInWhichTheyWereSet) {
 TEST_F(PDXMLFormatterTest, WithoutAFreeAttributeThereIsNoElementForThem) {
   const EventPtr event = makeEvent();
   QlxSetEventProp(event.get(), "product", "p");
-  EXPECT_EQ(record(event), trace(u" <ProductId>p</ProductId>\n"));
+  EXPECT_EQ(formatted(event), trace(u" <ProductId>p</ProductId>\n"));
 }
 
 TEST_F(PDXMLFormatterTest, PropertiesAreReadInTheDefaultCodePage) {
   ASSERT_TRUE(IcuDefaults::setCodePage("UTF-8"));
   const EventPtr event = makeEvent();
   QlxSetEventProp(event.get(), "product", "\xE4\xB8\x80");
-  EXPECT_EQ(record(event), trace(u" <ProductId>\u4E00</ProductId>\n"));
+  EXPECT_EQ(formatted(event), trace(u" <ProductId>\u4E00</ProductId>\n"));
 }
 
 TEST_F(PDXMLFormatterTest, AThreadIsUnsignedInItsThirtyTwoBitsAndAProcessInSixtyFour) {
   const EventPtr event = makeEvent();
   QlxSetEventPropLong(event.get(), "threadId", -1);
   QlxSetEventPropLong(event.get(), "processId", -1);
-  EXPECT_EQ(record(event), trace(u"",
-                                 u" <Thread>4294967295</Thread>\n"
-                                 u" <Process>18446744073709551615</Process>\n"));
+  EXPECT_EQ(formatted(event), trace(u"",
+                                    u" <Thread>4294967295</Thread>\n"
+                                    u" <Process>18446744073709551615</Process>\n"));
 }
 
 TEST_F(PDXMLFormatterTest, AThreadOrProcessThatIsNoNumberIsLeftOut) {
   const EventPtr event = makeEvent();
   QlxSetEventProp(event.get(), "threadId", "none");
   QlxSetEventProp(event.get(), "processId", "");
-  EXPECT_EQ(record(event), trace());
+  EXPECT_EQ(formatted(event), trace());
 }
 
 // ---- Configuration
 
 TEST_F(PDXMLFormatterTest, FlagsAreReadAsBooleans) {
   for (const auto &[value, isSet] : {std::pair{"TRUE", true}, std::pair{"yes", false}}) {
-    configureTo("forceAsMessage", value);
+    set("forceAsMessage", value);
     EXPECT_EQ(startOf(makeEvent()).starts_with(u"<Message "), isSet) << value;
   }
 }
 
 TEST_F(PDXMLFormatterTest, OtherKeysAreThoseOfTheBasicFormatter) {
-  configureTo("logging", "false");
-  EXPECT_EQ(QlxIsObjectEnabled(formatter_.get()), 0);
-  configureTo("ForceAsMessage", "true");
-  EXPECT_EQ(record(makeEvent()), trace()) << "keys are case-sensitive";
-  QlxPDXMLFormatterFCfgChange(formatter_.get(), nullptr);
+  set("logging", "false");
+  EXPECT_EQ(QlxIsObjectEnabled(formatter.get()), 0);
+  set("ForceAsMessage", "true");
+  EXPECT_EQ(formatted(makeEvent()), trace()) << "keys are case-sensitive";
+  QlxPDXMLFormatterFCfgChange(formatter.get(), nullptr);
   QlxPDXMLFormatterFCfgChange(nullptr, "forceAsTrace");
 }
 
 TEST_F(PDXMLFormatterTest, WithoutVariablesTheKeysOfTheBasicFormatterStillCount) {
-  void *own = std::exchange(formatter_->vars, nullptr);
-  configureTo("dateTimeFormat", "HH");
-  EXPECT_STREQ(formatter_->kind2.dateTimeFormat, "HH");
-  configureTo("logging", "false");
-  EXPECT_EQ(QlxIsObjectEnabled(formatter_.get()), 0);
-  configureTo("forceAsTrace", "true");
-  formatter_->vars = own;
+  formatter = getWithoutVariables("without", "qlx_xmlformatter");
+  set("dateTimeFormat", "HH");
+  EXPECT_STREQ(formatter->kind2.dateTimeFormat, "HH");
+  set("logging", "false");
+  EXPECT_EQ(QlxIsObjectEnabled(formatter.get()), 0);
+  set("forceAsTrace", "true");
+  EXPECT_EQ(formatted(makeEvent()), u"<null>");
 }
 
 TEST_F(PDXMLFormatterTest, WithoutArgumentsTextAndParametersAreTheSameZeros) {
   const ResourceBundles bundles{"zeros"};
   ASSERT_TRUE(bundles.add("root", R"(k { "{0,number,integer} of {1,number}" } )"));
-  const std::u16string all = record(makeMessage(bundles.path(), "k"));
+  const std::u16string all = formatted(makeMessage(bundles.path(), "k"));
   EXPECT_TRUE(has(all, u"<LogText><![CDATA[0 of 0]]></LogText>"));
   EXPECT_TRUE(has(all, u"<Param><![CDATA[0]]></Param><Param><![CDATA[0]]></Param></Tr"));
 }
 
 TEST_F(PDXMLFormatterTest, AnObjectOfAnotherKindKeepsItsVariables) {
+  const TempDir dir;
   const Handle handler = get("handler", "qlx_filehandler");
-  QlxSetObjProp(handler.get(), "singleComponent", "true");
-  std::string before(16, '\0');
-  const auto read = [&] { return std::string(static_cast<const char *>(handler->vars), 16); };
-  before = read();
+  QlxSetObjProp(handler.get(), "fileName", dir.path("app.log").c_str());
+  for (const char *flag : {"singleServer", "singleProduct", "singleComponent", "singleProductId",
+                           "forceAsMessage", "forceAsTrace"}) {
+    QlxSetObjProp(handler.get(), flag, "true");
+    const ApiLock lock;
+    QlxPDXMLFormatterFCfgChange(handler.get(), flag);
+    QlxPDXMLFormatterFGetHeader(handler.get());
+  }
+  const EventPtr event = makeEvent();
   const ApiLock lock;
-  QlxPDXMLFormatterFCfgChange(handler.get(), "singleComponent");
-  QlxPDXMLFormatterFGetHeader(handler.get());
-  EXPECT_EQ(read(), before);
+  QlxFileUHandlerFProcess(handler.get(), event.get(), nullptr);
+  EXPECT_EQ(dir.read("app.log"), "2006-08-16 10:48:55.123+02:00 text\n");
 }
 
 }  // namespace

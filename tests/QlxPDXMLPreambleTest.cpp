@@ -26,55 +26,55 @@ class PDXMLPreambleTest : public PDXMLFormatterFixture {
 
 TEST_F(PDXMLPreambleTest, ASingleElementStandsBeforeTheFirstRecordAndInNone) {
   for (size_t single = 0; single < std::size(kSingleFlags); ++single) {
-    for (const char *flag : kSingleFlags) configureTo(flag, "false");
-    configureTo(kSingleFlags[single], "true");
+    for (const char *flag : kSingleFlags) set(flag, "false");
+    set(kSingleFlags[single], "true");
     resetHeader();
     std::u16string others;
     for (size_t i = 0; i < std::size(kProducts); ++i)
       if (i != single) others += kProducts[i];
-    EXPECT_EQ(record(productEvent()), kProducts[single] + trace(others)) << kSingleFlags[single];
-    EXPECT_EQ(record(productEvent()), trace(others)) << kSingleFlags[single];
+    EXPECT_EQ(formatted(productEvent()), kProducts[single] + trace(others)) << kSingleFlags[single];
+    EXPECT_EQ(formatted(productEvent()), trace(others)) << kSingleFlags[single];
   }
 }
 
 TEST_F(PDXMLPreambleTest, AllSingleElementsStandInTheirOrder) {
-  for (const char *flag : kSingleFlags) configureTo(flag, "true");
+  for (const char *flag : kSingleFlags) set(flag, "true");
   std::u16string all;
   for (const std::u16string &element : kProducts) all += element;
-  EXPECT_EQ(record(productEvent()), all + trace());
-  EXPECT_EQ(record(productEvent()), trace());
-  for (const char *flag : kSingleFlags) configureTo(flag, "false");
-  EXPECT_EQ(record(productEvent()), trace(all));
+  EXPECT_EQ(formatted(productEvent()), all + trace());
+  EXPECT_EQ(formatted(productEvent()), trace());
+  for (const char *flag : kSingleFlags) set(flag, "false");
+  EXPECT_EQ(formatted(productEvent()), trace(all));
 }
 
 TEST_F(PDXMLPreambleTest, EachHeaderMakesItDueAgain) {
-  configureTo("singleProduct", "true");
+  set("singleProduct", "true");
   const EventPtr event = makeEvent();
   QlxSetEventProp(event.get(), "product", "x");
   for (int opened = 0; opened < 3; ++opened) {
-    EXPECT_EQ(record(event), kProducts[1] + trace());
-    EXPECT_EQ(record(event), trace());
+    EXPECT_EQ(formatted(event), kProducts[1] + trace());
+    EXPECT_EQ(formatted(event), trace());
     resetHeader();
   }
 }
 
 TEST_F(PDXMLPreambleTest, AFirstRecordWithoutTheElementLeavesItOutForGood) {
-  configureTo("singleProduct", "true");
-  EXPECT_EQ(record(makeEvent()), trace());
+  set("singleProduct", "true");
+  EXPECT_EQ(formatted(makeEvent()), trace());
   const EventPtr event = makeEvent();
   QlxSetEventProp(event.get(), "product", "x");
-  EXPECT_EQ(record(event), trace());
+  EXPECT_EQ(formatted(event), trace());
 }
 
 TEST_F(PDXMLPreambleTest, AFileHasItAtEachOpening) {
   const TempDir dir;
   const Handle handler = get("handler", "qlx_filehandler");
-  QlxHandlerSetFormatter(handler.get(), formatter_.get());
+  QlxHandlerSetFormatter(handler.get(), formatter.get());
   const std::string path = dir.path("app.xml");
   for (const auto &[key, value] : {std::pair{"fileName", path.c_str()},
                                    std::pair{"maxFileBytes", "500"}, std::pair{"maxFiles", "3"}})
     ASSERT_EQ(QlxSetObjProp(handler.get(), key, value), 1);
-  configureTo("singleProduct", "true");
+  set("singleProduct", "true");
   const std::u16string wide = trace();
   const std::string narrow(wide.begin(), wide.end());
   const std::string preamble = " <ProductId>x</ProductId>\n";
@@ -97,10 +97,10 @@ TEST_F(PDXMLPreambleTest, OfHandlersThatShareAFormatterTheOneThatWritesNextHasIt
   const TempDir dir;
   const Handle handlers[] = {get("first", "qlx_filehandler"), get("second", "qlx_filehandler")};
   for (const Handle &handler : handlers) {
-    QlxHandlerSetFormatter(handler.get(), formatter_.get());
+    QlxHandlerSetFormatter(handler.get(), formatter.get());
     ASSERT_EQ(QlxSetObjProp(handler.get(), "fileName", dir.path(handler->name).c_str()), 1);
   }
-  configureTo("singleProduct", "true");
+  set("singleProduct", "true");
   const EventPtr event = makeEvent();
   QlxSetEventProp(event.get(), "product", "x");
   for (int i = 0; i < 2; ++i) {
@@ -122,40 +122,36 @@ TEST_F(PDXMLPreambleTest, OfHandlersThatShareAFormatterTheOneThatWritesNextHasIt
 TEST_F(PDXMLPreambleTest, AFlagWhosePropertyIsGoneIsClear) {
   constexpr const char *kFlags[] = {"singleServer",    "singleProduct",  "singleComponent",
                                     "singleProductId", "forceAsMessage", "forceAsTrace"};
-  for (const char *flag : kFlags) configureTo(flag, "true");
+  for (const char *flag : kFlags) set(flag, "true");
   resetHeader();
-  for (const char *flag : kFlags) {
-    const ApiLock lock;
-    qlxIntlStringToStringMapRem(formatter_->props, flag);
-    QlxPDXMLFormatterFCfgChange(formatter_.get(), flag);
-  }
+  for (const char *flag : kFlags) clear(flag);
   std::u16string all;
   for (const std::u16string &element : kProducts) all += element;
-  EXPECT_EQ(record(productEvent()), trace(all));
-  EXPECT_TRUE(record(markedMessage(u"text")).starts_with(u"<Message "));
+  EXPECT_EQ(formatted(productEvent()), trace(all));
+  EXPECT_TRUE(formatted(markedMessage(u"text")).starts_with(u"<Message "));
 }
 
 // ---- Without memory
 
 TEST_F(PDXMLPreambleTest, ARecordThatLosesAPieceIsNullAndItsPreambleStaysDue) {
-  configureTo("singleServer", "true");
+  set("singleServer", "true");
   const EventPtr event = productEvent();
   QlxSetEventProp(event.get(), "long", std::string(4000, 'x').c_str());
-  const std::u16string whole = record(event);
+  const std::u16string whole = formatted(event);
   size_t lost = 0;
   for (uint64_t nth = 1;; ++nth) {
     resetHeader();
     {
       FailingMemory memory;
       memory.failOnce(nth);
-      const std::u16string found = record(event);
+      const std::u16string found = formatted(event);
       if (memory.failures() == 0) break;
       const bool withoutText = has(found, u"<![CDATA[]]></LogText>");
       EXPECT_TRUE(found == u"<null>" || found == whole || withoutText) << nth;
       if (found != u"<null>") continue;
     }
     ++lost;
-    EXPECT_EQ(record(event), whole) << "with its preamble, after " << nth;
+    EXPECT_EQ(formatted(event), whole) << "with its preamble, after " << nth;
   }
   EXPECT_GE(lost, 2U) << "the first block, and when it grows";
 }

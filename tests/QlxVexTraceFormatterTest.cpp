@@ -1,66 +1,16 @@
-#include <qlx/class/formatter.h>
-
-#include <gtest/gtest.h>
+#include "support/FormatterTest.h"
 
 #include <string>
 
-#include "object/QlxLocked.h"
 #include "support/FailingMemory.h"
-#include "support/IcuDefaults.h"
 #include "support/ResourceBundles.h"
-#include "support/Take.h"
 #include "support/TempDir.h"
-#include "support/ToolkitTest.h"
-#include "util/CxOwned.h"
 
 namespace {
 
-// 2006-08-16 08:48:55.123 UTC
-constexpr double kTime = 1155718135123.0;
-
-class VexTraceFormatterTest : public ToolkitTest {
+class VexTraceFormatterTest : public FormatterTest {
  protected:
-  using EventPtr = Owned<Event, QlxFreeEvent>;
-
-  void SetUp() override {
-    ToolkitTest::SetUp();
-    ASSERT_TRUE(IcuDefaults::setLocale("en_US"));
-    ASSERT_TRUE(IcuDefaults::setZone(u"Europe/Berlin"));
-    formatter = get("trace", "qlx_vextraceformatter");
-    ASSERT_NE(formatter, nullptr);
-  }
-  void TearDown() override {
-    formatter.reset();
-    ToolkitTest::TearDown();
-  }
-
-  static EventPtr makeEvent(const UChar *text = u"message", int32_t level = INFO) {
-    EventPtr event{QlxVaAllocUEvent(level, nullptr, nullptr, text)};
-    event->time = kTime;
-    return event;
-  }
-
-  static void set(const EventPtr &event, const char *key, const char *value) {
-    EXPECT_EQ(QlxSetEventProp(event.get(), key, value), 1);
-  }
-
-  std::u16string line(const EventPtr &event, va_list *args = nullptr) {
-    const ApiLock lock;
-    return ::take(formatter->objClass->op1.fFormat(formatter.get(), event.get(), args));
-  }
-
-  std::u16string lineWith(const Event *event, ...) {
-    va_list args;
-    va_start(args, event);
-    const ApiLock lock;
-    const std::u16string text =
-        ::take(QlxVexTraceUFormatterFFormat(formatter.get(), const_cast<Event *>(event), &args));
-    va_end(args);
-    return text;
-  }
-
-  const IcuDefaults defaults;
-  Handle formatter;
+  VexTraceFormatterTest() : FormatterTest("qlx_vextraceformatter", QlxVexTraceUFormatterFFormat) {}
 };
 
 #define START u"\x1e[2006-08-16 10:48:55.123+02:00] - "
@@ -68,7 +18,7 @@ class VexTraceFormatterTest : public ToolkitTest {
 // ---- The line
 
 TEST_F(VexTraceFormatterTest, AnEventWithNothingHasAllSixSeparatorsAroundEmptyFields) {
-  EXPECT_EQ(line(makeEvent()), START u"INFO  -  -  -  -  - message\n");
+  EXPECT_EQ(formatted(makeEvent()), START u"INFO  -  -  -  -  - text\n");
 }
 
 TEST_F(VexTraceFormatterTest, AFullLineHasSevenFields) {
@@ -80,7 +30,7 @@ TEST_F(VexTraceFormatterTest, AFullLineHasSevenFields) {
   set(event, "qlx_prop_srcfunction", "f");
   set(event, "qlx_prop_srcline", "7");
   QlxSetEventMessageId(event.get(), "ABC0001I");
-  EXPECT_EQ(line(event), START u"INFO  - alpha - p12:t34 - a.c:f(7) - ABC0001I - Started\n");
+  EXPECT_EQ(formatted(event), START u"INFO  - alpha - p12:t34 - a.c:f(7) - ABC0001I - Started\n");
 }
 
 TEST_F(VexTraceFormatterTest, EveryLevelHasAWordOfFiveCharacters) {
@@ -95,7 +45,8 @@ TEST_F(VexTraceFormatterTest, EveryLevelHasAWordOfFiveCharacters) {
   };
   for (const auto &[level, word] : cases) {
     EXPECT_EQ(std::u16string(word).size(), 5u);
-    EXPECT_EQ(line(makeEvent(u"m", level)), START + std::u16string(word) + u" -  -  -  -  - m\n")
+    EXPECT_EQ(formatted(makeEvent(u"m", level)),
+              START + std::u16string(word) + u" -  -  -  -  - m\n")
         << level;
   }
 }
@@ -110,7 +61,7 @@ TEST_F(VexTraceFormatterTest, TheHostIsTheServerUpToItsFirstDot) {
   for (const auto &[server, host] : cases) {
     const EventPtr event = makeEvent();
     set(event, "server", server);
-    EXPECT_EQ(line(event), START u"INFO  - " + std::u16string(host) + u" -  -  -  - message\n");
+    EXPECT_EQ(formatted(event), START u"INFO  - " + std::u16string(host) + u" -  -  -  - text\n");
   }
 }
 
@@ -118,25 +69,25 @@ TEST_F(VexTraceFormatterTest, AColonStandsOnlyBetweenAProcessAndAThread) {
   const EventPtr process = makeEvent(), thread = makeEvent();
   set(process, "processId", "12");
   set(thread, "threadId", "34");
-  EXPECT_EQ(line(process), START u"INFO  -  - p12 -  -  - message\n");
-  EXPECT_EQ(line(thread), START u"INFO  -  - t34 -  -  - message\n");
+  EXPECT_EQ(formatted(process), START u"INFO  -  - p12 -  -  - text\n");
+  EXPECT_EQ(formatted(thread), START u"INFO  -  - t34 -  -  - text\n");
 }
 
 TEST_F(VexTraceFormatterTest, ProcessAndThreadAreUnsignedEachInItsOwnWidth) {
   const EventPtr event = makeEvent();
   QlxSetEventPropLong(event.get(), "processId", -1);
   QlxSetEventPropLong(event.get(), "threadId", -1);
-  EXPECT_EQ(line(event), START u"INFO  -  - p18446744073709551615:t4294967295 -  -  - message\n");
+  EXPECT_EQ(formatted(event), START u"INFO  -  - p18446744073709551615:t4294967295 -  -  - text\n");
   set(event, "processId", "2147483647");
   set(event, "threadId", "2147483648");
-  EXPECT_EQ(line(event), START u"INFO  -  - p2147483647:t2147483648 -  -  - message\n");
+  EXPECT_EQ(formatted(event), START u"INFO  -  - p2147483647:t2147483648 -  -  - text\n");
 }
 
 TEST_F(VexTraceFormatterTest, AProcessOrThreadThatIsNoNumberIsAbsent) {
   const EventPtr event = makeEvent();
   set(event, "processId", "many");
   set(event, "threadId", "34th");
-  EXPECT_EQ(line(event), START u"INFO  -  - t34 -  -  - message\n");
+  EXPECT_EQ(formatted(event), START u"INFO  -  - t34 -  -  - text\n");
 }
 
 TEST_F(VexTraceFormatterTest, TheSourceIsWhatThereIsOfFileFunctionAndLine) {
@@ -155,7 +106,7 @@ TEST_F(VexTraceFormatterTest, TheSourceIsWhatThereIsOfFileFunctionAndLine) {
     if (number) set(event, "qlx_prop_srcline", number);
     if (function) set(event, "qlx_prop_srcfunction", function);
     if (file) set(event, "qlx_prop_srcfile", file);
-    EXPECT_EQ(line(event), START u"INFO  -  -  - " + std::u16string(source) + u" -  - message\n");
+    EXPECT_EQ(formatted(event), START u"INFO  -  -  - " + std::u16string(source) + u" -  - text\n");
   }
 }
 
@@ -165,52 +116,52 @@ TEST_F(VexTraceFormatterTest, OtherPropertiesAreNoPartOfTheLine) {
                           "productInstance", "correlationId", "own", "Server"}) {
     set(event, key, "value");
   }
-  EXPECT_EQ(line(event), START u"INFO  -  -  -  -  - message\n");
+  EXPECT_EQ(formatted(event), START u"INFO  -  -  -  -  - text\n");
 }
 
 // ---- Message and identifier
 
 TEST_F(VexTraceFormatterTest, ReadsTheIdentifierOffTheBoundTextAndStoresItNowhere) {
   const EventPtr event = makeEvent(u"{0}0001E wrong");
-  EXPECT_EQ(lineWith(event.get(), u"ABC"), START u"INFO  -  -  -  - ABC0001E - ABC0001E wrong\n");
+  EXPECT_EQ(formattedWith(event.get(), u"ABC"),
+            START u"INFO  -  -  -  - ABC0001E - ABC0001E wrong\n");
   EXPECT_EQ(event->messageId, nullptr);
 }
 
 TEST_F(VexTraceFormatterTest, AnIdentifierThatTheEventCarriesCountsAndNotItsText) {
   const EventPtr event = makeEvent(u"ABC0001E wrong");
   QlxSetEventMessageId(event.get(), "own");
-  EXPECT_EQ(line(event), START u"INFO  -  -  -  - own - ABC0001E wrong\n");
+  EXPECT_EQ(formatted(event), START u"INFO  -  -  -  - own - ABC0001E wrong\n");
   QlxSetEventMessageId(event.get(), "");
-  EXPECT_EQ(line(event), START u"INFO  -  -  -  -  - ABC0001E wrong\n");
+  EXPECT_EQ(formatted(event), START u"INFO  -  -  -  -  - ABC0001E wrong\n");
 }
 
 TEST_F(VexTraceFormatterTest, ATextThatCannotBeBoundIsEmpty) {
-  const EventPtr event{QlxVaAllocUEvent(WARN, "/no/such/bundle", "key", nullptr)};
-  event->time = kTime;
-  EXPECT_EQ(line(event), START u"WARN  -  -  -  -  - \n");
+  const EventPtr event = makeMessage("/no/such/bundle", "key");
+  EXPECT_EQ(formatted(event), START u"WARN  -  -  -  -  - \n");
   EXPECT_NE(event->message->error, 0);
-  EXPECT_EQ(line(makeEvent(u"")), START u"INFO  -  -  -  -  - \n");
-  EXPECT_EQ(line(makeEvent(nullptr)), START u"INFO  -  -  -  -  - \n");
+  EXPECT_EQ(formatted(makeEvent(u"")), START u"INFO  -  -  -  -  - \n");
+  EXPECT_EQ(formatted(makeEvent(nullptr)), START u"INFO  -  -  -  -  - \n");
 }
 
 TEST_F(VexTraceFormatterTest, TheTextStandsAsItIsSeparatorsLineEndsAndAll) {
-  EXPECT_EQ(line(makeEvent(u"a - b\nc\u00e9\x1e")),
+  EXPECT_EQ(formatted(makeEvent(u"a - b\nc\u00e9\x1e")),
             START u"INFO  -  -  -  -  - a - b\nc\u00e9\x1e\n");
 }
 
 // ---- The formatter
 
 TEST_F(VexTraceFormatterTest, NoKeyReachesIt) {
-  const std::u16string before = line(makeEvent());
+  const std::u16string before = formatted(makeEvent());
   for (const char *key : {"dateTimeFormat", "locale", "separator", "logging", "listenerNames"}) {
-    EXPECT_EQ(QlxSetObjProp(formatter.get(), key, "off"), 1);
+    set(key, "off");
   }
   EXPECT_EQ(formatter->kind1.separator, nullptr);
   EXPECT_EQ(formatter->kind2.dateTimeFormat, nullptr);
   EXPECT_EQ(formatter->kind3.locale, nullptr);
   EXPECT_EQ(formatter->enabled, 1);
   const EventPtr event = makeEvent();
-  EXPECT_EQ(line(event), before);
+  EXPECT_EQ(formatted(event), before);
   EXPECT_EQ(event->locale, nullptr);
 }
 
@@ -223,15 +174,15 @@ TEST_F(VexTraceFormatterTest, SettingsThatItHasAllTheSameDoCount) {
     QlxBasicFormatterFCfgChange(formatter.get(), "locale");
   }
   const EventPtr event = makeEvent(u"{0,number,integer} left");
-  EXPECT_EQ(lineWith(event.get(), 1234), u"\x1e[10:48] - INFO  -  -  -  -  - 1.234 left\n");
+  EXPECT_EQ(formattedWith(event.get(), 1234), u"\x1e[10:48] - INFO  -  -  -  -  - 1.234 left\n");
   EXPECT_STREQ(event->locale, "de");
 }
 
 TEST_F(VexTraceFormatterTest, TheEventsLocaleCounts) {
   const EventPtr event = makeEvent(u"{0,number,integer} left");
-  EXPECT_EQ(lineWith(event.get(), 1234), START u"INFO  -  -  -  -  - 1,234 left\n");
+  EXPECT_EQ(formattedWith(event.get(), 1234), START u"INFO  -  -  -  -  - 1,234 left\n");
   qlxSetEventLocale(event.get(), "de");
-  EXPECT_EQ(lineWith(event.get(), 1234), START u"INFO  -  -  -  -  - 1.234 left\n");
+  EXPECT_EQ(formattedWith(event.get(), 1234), START u"INFO  -  -  -  -  - 1.234 left\n");
 }
 
 TEST_F(VexTraceFormatterTest, HasNeitherHeaderNorTrailerNorVariables) {
@@ -258,13 +209,13 @@ TEST_F(VexTraceFormatterTest, ALineThatLosesAPieceIsNull) {
   const EventPtr event = makeEvent(std::u16string(9000, u'x').c_str());
   set(event, "server", "alpha");
   set(event, "qlx_prop_srcfile", std::string(2000, 'f').c_str());
-  const std::u16string whole = line(event);
+  const std::u16string whole = formatted(event);
   const std::u16string withoutText = whole.substr(0, whole.find(u'x')) + u"\n";
   size_t lost = 0;
   for (uint64_t nth = 1;; ++nth) {
     FailingMemory memory;
     memory.failOnce(nth);
-    const std::u16string found = line(event);
+    const std::u16string found = formatted(event);
     if (memory.failures() == 0) break;
     EXPECT_TRUE(found == u"<null>" || found == whole || found == withoutText) << nth;
     lost += found == u"<null>";

@@ -3,8 +3,10 @@
 #include <string>
 #include <thread>
 
+#include "object/QlxLocked.h"
 #include "support/ContainerTest.h"
 #include "support/FreshProcess.h"
+#include "support/OwnThread.h"
 
 namespace {
 
@@ -228,6 +230,39 @@ Answers callEach(typename Api::Head *container, Elements<Api> &elements) {
   if constexpr (requires { Api::iterRem; })
     answers.note("iterRem", shrinks(container, [&] { Api::iterRem(container->head); }));
   return answers;
+}
+
+// Counts what is allocated under the lock and what is not.
+struct LockWatch : CxMemoryHook {
+  LockWatch() : CxMemoryHook{look, [](CxMemoryHook *) {}, [](CxMemoryHook *) {}} {
+    cxIntlSetMemoryHook(this);
+  }
+  ~LockWatch() { cxIntlSetMemoryHook(nullptr); }
+
+  static bool look(CxMemoryHook *hook) {
+    LockWatch *const self = static_cast<LockWatch *>(hook);
+    ++(isCancellable() ? self->outside : self->inside);  // who holds the lock is not cancelled
+    return true;
+  }
+  int inside = 0, outside = 0;
+};
+
+template <typename Api>
+class ContainerLockTest : public ::testing::Test {};
+TYPED_TEST_SUITE(ContainerLockTest, PublicContainers, ApiNames);
+
+TYPED_TEST(ContainerLockTest, IsHeldWhereMemoryIsNeeded) {
+  { const ApiLock made; }
+  Elements<TypeParam> elements;
+  auto *container = TypeParam::alloc();
+  for (int i = 0; i < 2; i++) insert<TypeParam>(container, elements, i);
+  {
+    const LockWatch watch;
+    EXPECT_EQ(callEach<TypeParam>(container, elements).refused, "");
+    EXPECT_GT(watch.inside, 0);
+    EXPECT_EQ(watch.outside, 0);
+  }
+  TypeParam::free(container);
 }
 
 template <typename Api>

@@ -3,17 +3,17 @@
 
 namespace {
 
-class ConsoleHandlerTest : public ChainTest {
+class ConsoleHandlerTest : public HandledChainTest {
  protected:
+  ConsoleHandlerTest() : HandledChainTest("console", "qlx_consolehandler") {}
+
   void SetUp() override {
-    ChainTest::SetUp();
-    handler = attach("console", "qlx_consolehandler");
+    HandledChainTest::SetUp();
     format(handler);
   }
   void TearDown() override {
     formatter->trailer.reset();  // what is still open writes none outside of a capture
-    handler.reset();
-    ChainTest::TearDown();
+    HandledChainTest::TearDown();
   }
 
   void forward() {
@@ -30,8 +30,6 @@ class ConsoleHandlerTest : public ChainTest {
     const ApiLock lock;
     QlxConsoleHandlerFOpen(handler.get());
   }
-
-  Handle handler;
 };
 
 TEST_F(ConsoleHandlerTest, FollowsEachTextWithALineFeedOfItsOwn) {

@@ -42,17 +42,8 @@ QlxLogResult callVA(QlxLogResult (*call)(QlxObject *, const UChar *, va_list), Q
   return result;
 }
 
-class LoggerTest : public ChainTest {
+class LoggerTest : public HandledChainTest {
  protected:
-  void SetUp() override {
-    ChainTest::SetUp();
-    handler = attach("recording", RecordingHandler::kClass);
-  }
-  void TearDown() override {
-    handler.reset();
-    ChainTest::TearDown();
-  }
-
   void setLevel(const char *level) { QlxSetObjProp(logger.get(), "level", level); }
 
   // The levels of the events since the last look.
@@ -76,8 +67,6 @@ class LoggerTest : public ChainTest {
     QlxLogUMsg(l, "b", "k");
     QlxLogUText(l, u"x");
   }
-
-  Handle handler;
 };
 
 // ---- The threshold

@@ -122,17 +122,8 @@ TEST(ApiLockTest, IsOneWhenTwoFirstCallsMeet) {
   });
 }
 
-class ForkTest : public ChainTest {
+class ForkTest : public HandledChainTest {
  protected:
-  void SetUp() override {
-    ChainTest::SetUp();
-    handler = attach("recording", RecordingHandler::kClass);
-  }
-  void TearDown() override {
-    handler.reset();
-    ChainTest::TearDown();
-  }
-
   // Logs, and asks for what takes the lock.
   bool works() {
     recorder->records.clear();
@@ -140,8 +131,6 @@ class ForkTest : public ChainTest {
     const Handle made = get("made", "qlx_basiclogger");
     return recorder->records.size() == 1 && made;
   }
-
-  Handle handler;
 };
 
 TEST_F(ForkTest, AChildOfABusyProcessFindsTheLockFree) {

@@ -14,24 +14,19 @@
 
 namespace {
 
-class HostsPageConsoleTest : public ChainTest {
+class HostsPageConsoleTest : public HandledChainTest {
  protected:
+  HostsPageConsoleTest() : HandledChainTest("console", "qlx_consolehandler") {}
+
   void SetUp() override {
-    ChainTest::SetUp();
-    handler = attach("console", "qlx_consolehandler");
+    HandledChainTest::SetUp();
     format(handler);
-  }
-  void TearDown() override {
-    handler.reset();
-    ChainTest::TearDown();
   }
 
   CxStatus logged(const char16_t *text) {
     const QlxLogResult result = log(text);
     return {result.statusKind, result.statusCode};
   }
-
-  Handle handler;
 };
 
 // Standard output is a pipe.

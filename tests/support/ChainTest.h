@@ -52,6 +52,28 @@ class ChainTest : public ToolkitTest {
   Handle logger;
 };
 
+// The same with a handler of a class behind the logger, a recording one when none is said.
+class HandledChainTest : public ChainTest {
+ protected:
+  explicit HandledChainTest(const char *name = "recording",
+                            const char *className = RecordingHandler::kClass)
+      : name_(name), className_(className) {}
+
+  void SetUp() override {
+    ChainTest::SetUp();
+    handler = attach(name_, className_);
+  }
+  void TearDown() override {
+    handler.reset();
+    ChainTest::TearDown();
+  }
+
+  Handle handler;
+
+ private:
+  const char *name_, *className_;
+};
+
 // What has come to the recording handlers, each text with "|" behind it.
 #define EXPECT_RECORDED(expected) EXPECT_EQ(recorder->texts(), expected)
 

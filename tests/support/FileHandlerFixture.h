@@ -12,20 +12,15 @@
 #include "support/Status.h"
 #include "support/TempDir.h"
 
-class FileHandlerFixture : public ChainTest {
+class FileHandlerFixture : public HandledChainTest {
  protected:
-  explicit FileHandlerFixture(const char *className) : className_(className) {}
+  explicit FileHandlerFixture(const char *className) : HandledChainTest("file", className) {}
 
   void SetUp() override {
-    ChainTest::SetUp();
-    handler = attach("file", className_);
+    HandledChainTest::SetUp();
     ASSERT_NE(vars(), nullptr);
     format(handler);
     set("fileName", dir.path("app.log"));
-  }
-  void TearDown() override {
-    handler.reset();
-    ChainTest::TearDown();
   }
 
   QlxFileHandlerVars *vars() { return static_cast<QlxFileHandlerVars *>(handler->vars); }
@@ -69,10 +64,6 @@ class FileHandlerFixture : public ChainTest {
   }
 
   TempDir dir;
-  Handle handler;
-
- private:
-  const char *className_;
 };
 
 #endif

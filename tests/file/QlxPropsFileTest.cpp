@@ -97,15 +97,6 @@ TEST_F(PropsFileTest, APathOf256BytesIsTheLongest) {
 
 // ---- Pipes. What waits for one that nobody fills is ended by the child's alarm.
 
-template <typename Use>
-void expectNoHang(Use use) {
-  Child child([use] {
-    alarm(20);
-    use();
-  });
-  EXPECT_EQ(child.end(), 0);
-}
-
 // The writing end of a named pipe, there when somebody reads it.
 class Writer {
  public:

@@ -94,4 +94,11 @@ class Child {
   pid_t id_;
 };
 
+// Does something in a child, which a lock that stays behind ends by its alarm.
+template <typename Use>
+void expectNoHang(Use use) {
+  Child child(use);
+  EXPECT_EQ(child.end(), 0);
+}
+
 #endif

@@ -18,16 +18,6 @@
 
 namespace {
 
-// What a test does runs in a child, which a lock that stays behind ends with an alarm.
-template <typename Use>
-void expectNoHang(Use use) {
-  Child child([use] {
-    alarm(20);
-    use();
-  });
-  EXPECT_EQ(child.end(), 0);
-}
-
 struct Way {
   const char *name;
   int type;  // of cancellation
@@ -46,17 +36,8 @@ void awaitCancellation() {
   for (;;) pause();
 }
 
-class CancelledThreadTest : public ChainTest, public ::testing::WithParamInterface<Way> {
+class CancelledThreadTest : public HandledChainTest, public ::testing::WithParamInterface<Way> {
  protected:
-  void SetUp() override {
-    ChainTest::SetUp();
-    handler = attach("recording", RecordingHandler::kClass);
-  }
-  void TearDown() override {
-    handler.reset();
-    ChainTest::TearDown();
-  }
-
   // Logs in a thread that is cancelled while its handler waits.
   void cancelWhileHandling() {
     const Signal inside, cancelled;
@@ -76,8 +57,6 @@ class CancelledThreadTest : public ChainTest, public ::testing::WithParamInterfa
     EXPECT_TRUE(thread.endsCancelled());
     recorder->alsoDo = nullptr;
   }
-
-  Handle handler;
 };
 
 INSTANTIATE_TEST_SUITE_P(Ways, CancelledThreadTest, ::testing::Values(kDeferred, kAsynchronous),

@@ -9,11 +9,7 @@
 
 class ConfigTest : public HostTest {
  protected:
-  // A reference like ObjCfgRef, but given back under the lock, as a host does.
-  struct ReleaseCfg {
-    void operator()(ObjCfg *cfg) const { QlxReleaseObjCfg(cfg); }
-  };
-  using Config = std::unique_ptr<ObjCfg, ReleaseCfg>;
+  using Config = CfgHandle;
 
   static Config make(const char *name) { return Config{QlxAllocObjCfg(name)}; }
   static Config registered(const char *name) { return Config{QlxLogMgrGetCfg(name)}; }

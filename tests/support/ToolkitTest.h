@@ -12,17 +12,12 @@
 #include "QlxObject.h"
 #include "object/QlxLocked.h"
 #include "support/FailingMemory.h"
+#include "support/Handle.h"
 
 class ToolkitTest : public ::testing::Test {
  protected:
   void SetUp() override { ASSERT_EQ(QlxOpenToolkit(nullptr, nullptr), 1); }
   void TearDown() override { QlxCloseToolkit(); }
-
-  // A reference like ObjectRef, but given back under the lock, as a host does.
-  struct Release {
-    void operator()(QlxObject *object) const { QlxReleaseObject(object); }
-  };
-  using Handle = std::unique_ptr<QlxObject, Release>;
 
   static Handle get(const char *name, const char *className = nullptr) {
     return Handle{QlxGetObject(name, className)};

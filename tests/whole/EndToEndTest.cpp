@@ -8,6 +8,7 @@
 #include <qlx/qlx.h>
 
 #include "support/CaptureStdout.h"
+#include "support/Handle.h"
 #include "support/IcuDefaults.h"
 #include "support/ResourceBundles.h"
 #include "support/Status.h"
@@ -22,11 +23,6 @@ uint8_t setTime(QlxObject *, Event *event, va_list *) {
   event->time = kTime;
   return 1;
 }
-
-struct Release {
-  void operator()(QlxObject *object) const { QlxReleaseObject(object); }
-};
-using Handle = std::unique_ptr<QlxObject, Release>;
 
 class EndToEndTest : public ::testing::Test {
  protected:

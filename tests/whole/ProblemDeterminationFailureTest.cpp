@@ -12,6 +12,7 @@
 #include "support/CaptureStdout.h"
 #include "support/EveryFailure.h"
 #include "support/FailureResult.h"
+#include "support/Handle.h"
 #include "support/HostName.h"
 #include "support/IcuDefaults.h"
 #include "support/ResourceBundles.h"
@@ -19,11 +20,6 @@
 #include "support/WorkingDir.h"
 
 namespace {
-
-struct Release {
-  void operator()(QlxObject *object) const { QlxReleaseObject(object); }
-};
-using Handle = std::unique_ptr<QlxObject, Release>;
 
 class ProblemDeterminationFailureTest : public ::testing::Test {
  protected:

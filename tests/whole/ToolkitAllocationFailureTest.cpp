@@ -15,19 +15,13 @@
 #include "support/CaptureStdout.h"
 #include "support/EveryFailure.h"
 #include "support/FailureResult.h"
+#include "support/Handle.h"
 #include "support/ResourceBundles.h"
 #include "support/Status.h"
 #include "support/TempDir.h"
 #include "support/WorkingDir.h"
 
 namespace {
-
-struct Release {
-  void operator()(QlxObject *object) const { QlxReleaseObject(object); }
-  void operator()(ObjCfg *cfg) const { QlxReleaseObjCfg(cfg); }
-};
-using Handle = std::unique_ptr<QlxObject, Release>;
-using CfgHandle = std::unique_ptr<ObjCfg, Release>;
 
 class ToolkitAllocationFailureTest : public ::testing::Test {
  protected:

@@ -26,18 +26,13 @@
 
 #include "support/Child.h"
 #include "support/FailingMemory.h"
+#include "support/FormatResult.h"
 #include "support/IcuDefaults.h"
 #include "support/OpenToolkit.h"
 #include "support/ResourceBundles.h"
 #include "support/WhileLocaleChanges.h"
 
 namespace {
-
-struct Result {
-  std::u16string text;
-  int error;
-  bool operator==(const Result &) const = default;
-};
 
 constexpr UChar kArgument[] = u"value";
 
@@ -49,18 +44,18 @@ uint32_t appendArgument(CxUStringBuff *text, const MessageName *message, UErrorC
   return units;
 }
 
-Result held(const MessageName &message) {
+FormatResult held(const MessageName &message) {
   CxUStringBuff text{};
   UErrorCode status = U_ZERO_ERROR;
   const uint32_t units = appendArgument(&text, &message, &status, kArgument);
-  const Result result{text.data ? std::u16string(text.data, text.length) : u"",
-                      U_FAILURE(status) ? status : 0};
+  const FormatResult result{text.data ? std::u16string(text.data, text.length) : u"",
+                            U_FAILURE(status) ? status : 0};
   EXPECT_EQ(units, result.text.size());
   CxUStringBuffDiscard(&text);
   return result;
 }
 
-Result anew(const MessageName &message) {
+FormatResult anew(const MessageName &message) {
   UErrorCode status = U_ZERO_ERROR;
   icu::LocalUResourceBundlePointer bundle{ures_open(message.bundle, message.locale, &status)};
   const char *const separator = std::strrchr(message.bundle, '/');
@@ -127,14 +122,14 @@ class BundleCacheTest : public ::testing::Test {
   MessageName message(const char *key, const char *locale = nullptr) const {
     return {path_.c_str(), key, locale};
   }
-  Result of(const char *key, const char *locale = nullptr) const {
+  FormatResult of(const char *key, const char *locale = nullptr) const {
     return held(message(key, locale));
   }
   void compare(const char *key, const char *locale = nullptr) const {
     const MessageName name = message(key, locale);
-    const Result expected = anew(name);
+    const FormatResult expected = anew(name);
     for (int round = 0; round < 3; ++round) {
-      const Result got = held(name);
+      const FormatResult got = held(name);
       EXPECT_EQ(got.text, expected.text)
           << (key ? key : "null") << " in " << (locale ? locale : "null");
       EXPECT_EQ(got.error, expected.error) << (key ? key : "null");
@@ -178,23 +173,23 @@ TEST_F(BundleCacheTest, EveryKeyIsInEveryLocaleWhatOpeningAnewGives) {
 
 TEST_F(BundleCacheTest, APatternEndsAtItsFirstZero) {
   for (int round = 0; round < 3; ++round) {
-    EXPECT_EQ(of("zero"), (Result{u"before value", 0}));
-    EXPECT_EQ(of("alsoZero"), (Result{u"before value", 0}));
-    EXPECT_EQ(of("plainZero"), (Result{u"before", 0}));
+    EXPECT_EQ(of("zero"), (FormatResult{u"before value", 0}));
+    EXPECT_EQ(of("alsoZero"), (FormatResult{u"before value", 0}));
+    EXPECT_EQ(of("plainZero"), (FormatResult{u"before", 0}));
   }
 }
 
 TEST_F(BundleCacheTest, AnAliasIsTheTextThatItNames) {
-  EXPECT_EQ(of("same"), (Result{u"root value", 0}));
-  EXPECT_EQ(of("same", "de"), (Result{u"deutsch value", 0}));
+  EXPECT_EQ(of("same"), (FormatResult{u"root value", 0}));
+  EXPECT_EQ(of("same", "de"), (FormatResult{u"deutsch value", 0}));
   EXPECT_NE(of("lost").error, 0);
 }
 
 TEST_F(BundleCacheTest, AKeyThatIsMissingDoesNotSpoilTheBundle) {
   EXPECT_EQ(of("nothing").error, U_MISSING_RESOURCE_ERROR);
-  EXPECT_EQ(of("hello"), (Result{u"root value", 0}));
+  EXPECT_EQ(of("hello"), (FormatResult{u"root value", 0}));
   EXPECT_EQ(of("table").error, U_RESOURCE_TYPE_MISMATCH);
-  EXPECT_EQ(of("hello"), (Result{u"root value", 0}));
+  EXPECT_EQ(of("hello"), (FormatResult{u"root value", 0}));
 }
 
 // ---- What a held bundle depends on
@@ -203,13 +198,13 @@ TEST_F(BundleCacheTest, ALocaleThatIsMissingFallsBackToTheDefaultOneOfTheMoment)
   for (int round = 0; round < 3; ++round) {
     ASSERT_TRUE(IcuDefaults::setLocale("en_US"));
     for (const char *locale : {static_cast<const char *>(nullptr), "fr"})
-      EXPECT_EQ(of("hello", locale), (Result{u"root value", 0}));
+      EXPECT_EQ(of("hello", locale), (FormatResult{u"root value", 0}));
     ASSERT_TRUE(IcuDefaults::setLocale("de_AT"));
     for (const char *locale : {static_cast<const char *>(nullptr), "fr"}) {
-      EXPECT_EQ(of("hello", locale), (Result{u"deutsch value", 0}));
-      EXPECT_EQ(of("bare", locale), (Result{u"bare austria", 0}));
+      EXPECT_EQ(of("hello", locale), (FormatResult{u"deutsch value", 0}));
+      EXPECT_EQ(of("bare", locale), (FormatResult{u"bare austria", 0}));
     }
-    EXPECT_EQ(of("hello", "root"), (Result{u"root value", 0}));
+    EXPECT_EQ(of("hello", "root"), (FormatResult{u"root value", 0}));
   }
 }
 
@@ -223,11 +218,11 @@ TEST_F(BundleCacheTest, ABundleFoundInADefaultLocaleThatChangedMeanwhileIsNotHel
 
 TEST_F(BundleCacheTest, TheSameBundleInSeveralLocalesIsToldApart) {
   for (int round = 0; round < 3; ++round) {
-    EXPECT_EQ(of("bare", "de"), (Result{u"bare deutsch", 0}));
-    EXPECT_EQ(of("bare", "de_AT"), (Result{u"bare austria", 0}));
-    EXPECT_EQ(of("bare", "root"), (Result{u"bare root", 0}));
-    EXPECT_EQ(of("bare", ""), (Result{u"bare root", 0}));
-    EXPECT_EQ(of("bare"), (Result{u"bare root", 0}));
+    EXPECT_EQ(of("bare", "de"), (FormatResult{u"bare deutsch", 0}));
+    EXPECT_EQ(of("bare", "de_AT"), (FormatResult{u"bare austria", 0}));
+    EXPECT_EQ(of("bare", "root"), (FormatResult{u"bare root", 0}));
+    EXPECT_EQ(of("bare", ""), (FormatResult{u"bare root", 0}));
+    EXPECT_EQ(of("bare"), (FormatResult{u"bare root", 0}));
   }
 }
 
@@ -241,7 +236,7 @@ TEST_F(BundleCacheTest, ABareNameIsWhatIcuFindsInItsDataDirectories) {
       for (const char *name : {"places", "elsewhere", "/no/such/places"}) {
         const DataDirectory directory(bundles->folder());
         const MessageName hello{name, "hello", nullptr};
-        const Result got = held(hello);
+        const FormatResult got = held(hello);
         EXPECT_EQ(got, anew(hello)) << round << name;
       }
 }
@@ -250,13 +245,13 @@ TEST_F(BundleCacheTest, ABundleIsSearchedAgainAsLongAsItIsMissing) {
   const ResourceBundles late("late");
   const std::string path = late.folder() + "/late";
   const MessageName hello{path.c_str(), "hello", nullptr};
-  EXPECT_EQ(held(hello), (Result{u"", U_MISSING_RESOURCE_ERROR}));
+  EXPECT_EQ(held(hello), (FormatResult{u"", U_MISSING_RESOURCE_ERROR}));
   ASSERT_TRUE(late.add("root", "hello { \"late {0}\" }"));
   EXPECT_EQ(held(hello), anew(hello));
   const std::string other =
       late.folder() + "//late";  // unknown to ICU, which remembers the missing
   const MessageName again{other.c_str(), "hello", nullptr};
-  EXPECT_EQ(held(again), (Result{u"late value", 0}));
+  EXPECT_EQ(held(again), (FormatResult{u"late value", 0}));
 }
 
 TEST_F(BundleCacheTest, AReopenedToolkitReadsTheBundleAgain) {
@@ -273,7 +268,7 @@ TEST_F(BundleCacheTest, IcuMayCleanUpAfterTheToolkitIsClosed) {
       if (round % 2 == 0) {
         EXPECT_EQ(QlxOpenToolkit(nullptr, nullptr), 1);
       }
-      EXPECT_EQ(of("hello", "de"), (Result{u"deutsch value", 0}));
+      EXPECT_EQ(of("hello", "de"), (FormatResult{u"deutsch value", 0}));
       CxUStringBuff text{};
       CxUStringBuffAppendUDouble(&text, 1.5);
       qlxAppendCachedDate(&text, {nullptr, false}, 0);
@@ -305,7 +300,7 @@ TEST_F(BundleCacheTest, TheBundleNotUsedForLongestGoesFirst) {
   EXPECT_EQ(allocationsOf(locale(0).c_str()), 1);  // makes number 1 the oldest
   {
     const FailingMemory memory;
-    EXPECT_EQ(of("bare", locale(kMostHeld).c_str()), (Result{u"bare deutsch", 0}));
+    EXPECT_EQ(of("bare", locale(kMostHeld).c_str()), (FormatResult{u"bare deutsch", 0}));
     EXPECT_EQ(memory.live(), 0) << "one more is held, one less is";
   }
   EXPECT_EQ(allocationsOf(locale(0).c_str()), 1);
@@ -331,15 +326,16 @@ TEST_F(BundleCacheTest, WithoutMemoryThereIsTheWholeTextOrNone) {
       (memory.*fail)(nth);
       for (const char *locale : {"de", static_cast<const char *>(nullptr), "de"})
         for (const char *key : {"hello", "bare"}) {
-          const Result got = of(key, locale);
+          const FormatResult got = of(key, locale);
           const std::u16string whole = std::string(key) == "bare"
                                            ? (locale ? u"bare deutsch" : u"bare root")
                                            : (locale ? u"deutsch value" : u"root value");
-          EXPECT_EQ(got, got.error ? (Result{u"", U_MEMORY_ALLOCATION_ERROR}) : (Result{whole, 0}));
+          EXPECT_EQ(got, got.error ? (FormatResult{u"", U_MEMORY_ALLOCATION_ERROR})
+                                   : (FormatResult{whole, 0}));
         }
       const uint64_t failures = memory.failures();
       memory.failNone();
-      EXPECT_EQ(of("hello", "de"), (Result{u"deutsch value", 0}));
+      EXPECT_EQ(of("hello", "de"), (FormatResult{u"deutsch value", 0}));
       qlxDropCachedFormats();
       EXPECT_EQ(memory.live(), 0) << nth;
       if (failures == 0) break;
@@ -374,14 +370,14 @@ TEST_F(BundleCacheTest, ABundleOpenedWhileAThreadChangesTheLocaleIsNotKeptForAno
 }
 
 TEST_F(BundleCacheTest, AChildReadsInTheLocaleThatItSets) {
-  EXPECT_EQ(of("hello"), (Result{u"root value", 0}));
+  EXPECT_EQ(of("hello"), (FormatResult{u"root value", 0}));
   Child child([&] {
-    EXPECT_EQ(of("hello"), (Result{u"root value", 0}));
+    EXPECT_EQ(of("hello"), (FormatResult{u"root value", 0}));
     EXPECT_TRUE(IcuDefaults::setLocale("de"));
-    EXPECT_EQ(of("hello"), (Result{u"deutsch value", 0}));
+    EXPECT_EQ(of("hello"), (FormatResult{u"deutsch value", 0}));
   });
   EXPECT_EQ(child.end(), 0);
-  EXPECT_EQ(of("hello"), (Result{u"root value", 0}));
+  EXPECT_EQ(of("hello"), (FormatResult{u"root value", 0}));
 }
 
 // ---- Scanning

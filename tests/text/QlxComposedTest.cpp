@@ -23,34 +23,15 @@
 #include "text/QlxMessageCache.h"
 
 #include "support/FailingMemory.h"
+#include "support/FormatResult.h"
 #include "support/IcuDefaults.h"
 #include "support/Locales.h"
 #include "support/RandomNumbers.h"
 
 namespace {
 
-struct Result {
-  std::u16string text;
-  int error;
-  bool operator==(const Result &) const = default;
-};
-
-std::string toUtf8(const std::u16string &text) {
-  std::string out(text.size() * 3 + 1, '\0');
-  int32_t length = 0;
-  UErrorCode status = U_ZERO_ERROR;
-  u_strToUTF8WithSub(out.data(), static_cast<int32_t>(out.size()), &length, text.data(),
-                     static_cast<int32_t>(text.size()), 0xFFFD, nullptr, &status);
-  out.resize(static_cast<size_t>(length));
-  return out;
-}
-
-void PrintTo(const Result &result, std::ostream *out) {
-  *out << '"' << toUtf8(result.text) << "\" error " << result.error;
-}
-
 // A pattern parsed for this call alone.
-Result anew(const char *locale, const std::u16string &pattern, va_list *args) {
+FormatResult anew(const char *locale, const std::u16string &pattern, va_list *args) {
   for (size_t room = 1024;; room *= 64) {
     std::vector<UChar> text(room);
     va_list copy;
@@ -65,11 +46,11 @@ Result anew(const char *locale, const std::u16string &pattern, va_list *args) {
   }
 }
 
-Result heldOnce(const char *locale, const std::u16string &pattern, va_list *args) {
+FormatResult heldOnce(const char *locale, const std::u16string &pattern, va_list *args) {
   CxUStringBuff text{};
   UErrorCode status = U_ZERO_ERROR;
   const uint32_t units = qlxAppendCachedMessage(&text, locale, pattern.c_str(), args, &status);
-  const Result result{text.data ? text.data : u"", U_FAILURE(status) ? status : 0};
+  const FormatResult result{text.data ? text.data : u"", U_FAILURE(status) ? status : 0};
   EXPECT_EQ(units, result.text.size());
   CxUStringBuffDiscard(&text);
   return result;
@@ -133,7 +114,7 @@ struct Case {
 void compareList(const Case *test, ...) {
   va_list args;
   va_start(args, test);
-  const Result expected = anew(test->locale, test->pattern, &args);
+  const FormatResult expected = anew(test->locale, test->pattern, &args);
   for (int round = 0; round < 2; ++round)  // parsed in this call, and before it
     EXPECT_EQ(heldOnce(test->locale, test->pattern, &args), expected)
         << toUtf8(test->pattern) << " in " << (test->locale ? test->locale : "null") << " with "

@@ -24,9 +24,9 @@
 #include "text/QlxDateCache.h"
 #include "util/CxLook.h"
 
+#include "support/CachedFormatsTest.h"
 #include "support/Child.h"
 #include "support/FailingMemory.h"
-#include "support/IcuDefaults.h"
 #include "support/OpenToolkit.h"
 #include "support/WhileLocaleChanges.h"
 
@@ -92,17 +92,7 @@ const double kTimes[] = {kTime, kTime + 876, kTime + 877,       kTime,
                          -1,    -1000,       -62135596800001.0, 253402300799999.0,
                          0,     0.5,         1162080000000.0};
 
-class DateCacheTest : public ::testing::Test {
- protected:
-  void SetUp() override {
-    qlxDropCachedFormats();
-    ASSERT_TRUE(IcuDefaults::setLocale("en_US"));
-    ASSERT_TRUE(IcuDefaults::setZone(u"UTC"));
-  }
-  void TearDown() override { qlxDropCachedFormats(); }
-
-  IcuDefaults defaults_;
-};
+using DateCacheTest = CachedFormatsTest;
 
 }  // namespace
 

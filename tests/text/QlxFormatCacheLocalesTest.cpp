@@ -16,28 +16,24 @@
 #include <unicode/uloc.h>
 #include <unicode/umsg.h>
 
+#include "support/CachedFormatsTest.h"
 #include "support/Child.h"
-#include "support/IcuDefaults.h"
+#include "support/FormatResult.h"
+#include "support/RandomWords.h"
 
 namespace {
 
-struct Bound {
-  std::u16string text;
-  int error;
-  bool operator==(const Bound &) const = default;
-};
-
-Bound bindArgs(const char *locale, const UChar *pattern, va_list *args) {
+FormatResult bindArgs(const char *locale, const UChar *pattern, va_list *args) {
   CxUStringBuff text{};
   UErrorCode status = U_ZERO_ERROR;
   qlxAppendCachedMessage(&text, locale, pattern, args, &status);
-  const Bound bound{text.data ? text.data : u"", U_FAILURE(status) ? status : 0};
+  const FormatResult bound{text.data ? text.data : u"", U_FAILURE(status) ? status : 0};
   CxUStringBuffDiscard(&text);
   return bound;
 }
 
 // By ICU itself.
-Bound byIcu(const char *locale, const UChar *pattern, ...) {
+FormatResult byIcu(const char *locale, const UChar *pattern, ...) {
   UErrorCode status = U_ZERO_ERROR;
   const icu::LocalUMessageFormatPointer format{umsg_open(pattern, -1, locale, nullptr, &status)};
   UChar room[500] = {};
@@ -48,10 +44,10 @@ Bound byIcu(const char *locale, const UChar *pattern, ...) {
   return {U_SUCCESS(status) ? room : u"", U_FAILURE(status) ? status : 0};
 }
 
-Bound bind(const char *locale, const UChar *pattern, ...) {
+FormatResult bind(const char *locale, const UChar *pattern, ...) {
   va_list args;
   va_start(args, pattern);
-  const Bound bound = bindArgs(locale, pattern, &args);
+  const FormatResult bound = bindArgs(locale, pattern, &args);
   va_end(args);
   return bound;
 }
@@ -90,17 +86,7 @@ std::string repeated(size_t count, const char *text = "k") {
   return all.substr(0, count);
 }
 
-class CachedLocalesTest : public ::testing::Test {
- protected:
-  void SetUp() override {
-    qlxDropCachedFormats();
-    ASSERT_TRUE(IcuDefaults::setLocale("en_US"));
-    ASSERT_TRUE(IcuDefaults::setZone(u"UTC"));
-  }
-  void TearDown() override { qlxDropCachedFormats(); }
-
-  IcuDefaults defaults_;
-};
+using CachedLocalesTest = CachedFormatsTest;
 
 // ---- Which names are good
 
@@ -223,8 +209,10 @@ TEST_F(CachedLocalesTest, UnderADefaultNameThatIsNotGoodThereAreDatesAllTheSame)
 
 // ---- Any names at all
 
-class Names {
+class Names : RandomWords<char> {
  public:
+  Names() : RandomWords(19961121) {}
+
   std::string next() {
     std::string name = oneOf({"en", "de", "zz", "sr", "root", "und", "x", "i", "C", "", "th"});
     if (below(5) == 0) name = word();
@@ -241,18 +229,12 @@ class Names {
   }
 
  private:
-  size_t below(size_t limit) { return random_() % limit; }
-  std::string oneOf(std::initializer_list<const char *> words) {
-    return words.begin()[below(words.size())];
-  }
   std::string word() {
     constexpr size_t kLengths[] = {0, 1, 2, 3, 4, 8, 11, 12, 24, 25, 95, 100, 149, 151, 157, 300};
     std::string letters(below(3) ? below(12) : kLengths[below(std::size(kLengths))], ' ');
     for (char &c : letters) c = static_cast<char>('a' + below(26));
     return letters;
   }
-
-  std::mt19937 random_{19961121};
 };
 
 TEST_F(CachedLocalesTest, NoNameEndsTheProcess) {

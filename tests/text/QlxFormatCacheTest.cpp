@@ -25,35 +25,16 @@
 #include "text/QlxDateCache.h"
 
 #include "support/FailingMemory.h"
+#include "support/FormatResult.h"
 #include "support/IcuDefaults.h"
 #include "support/WhileLocaleChanges.h"
 
 namespace {
 
-struct Result {
-  std::u16string text;
-  int error;
-  bool operator==(const Result &) const = default;
-};
-
-std::string toUtf8(const std::u16string &text) {
-  std::string out(text.size() * 3 + 1, '\0');
-  int32_t length = 0;
-  UErrorCode status = U_ZERO_ERROR;
-  u_strToUTF8WithSub(out.data(), static_cast<int32_t>(out.size()), &length, text.data(),
-                     static_cast<int32_t>(text.size()), 0xFFFD, nullptr, &status);
-  out.resize(static_cast<size_t>(length));
-  return out;
-}
-
-void PrintTo(const Result &result, std::ostream *out) {
-  *out << '"' << toUtf8(result.text) << "\" error " << result.error;
-}
-
 // ---- Messages
 
 // Two calls of u_vformatMessage(): one for the length, one for the text.
-Result anewMessage(const char *locale, const UChar *pattern, va_list *args) {
+FormatResult anewMessage(const char *locale, const UChar *pattern, va_list *args) {
   va_list first;
   va_copy(first, *args);
   UErrorCode status = U_ZERO_ERROR;
@@ -71,20 +52,20 @@ Result anewMessage(const char *locale, const UChar *pattern, va_list *args) {
   return {room.data(), 0};
 }
 
-Result heldMessage(const char *locale, const UChar *pattern, va_list *args) {
+FormatResult heldMessage(const char *locale, const UChar *pattern, va_list *args) {
   CxUStringBuff text{};
   UErrorCode status = U_ZERO_ERROR;
   const uint32_t units = qlxAppendCachedMessage(&text, locale, pattern, args, &status);
-  const Result result{text.data ? text.data : u"", U_FAILURE(status) ? status : 0};
+  const FormatResult result{text.data ? text.data : u"", U_FAILURE(status) ? status : 0};
   EXPECT_EQ(units, result.text.size());
   CxUStringBuffDiscard(&text);
   return result;
 }
 
-Result held(const char *locale, const UChar *pattern, ...) {
+FormatResult held(const char *locale, const UChar *pattern, ...) {
   va_list args;
   va_start(args, pattern);
-  const Result result = heldMessage(locale, pattern, &args);
+  const FormatResult result = heldMessage(locale, pattern, &args);
   va_end(args);
   return result;
 }
@@ -93,7 +74,7 @@ Result held(const char *locale, const UChar *pattern, ...) {
 void compare(const char *locale, const UChar *pattern, ...) {
   va_list args;
   va_start(args, pattern);
-  const Result expected = anewMessage(locale, pattern, &args);
+  const FormatResult expected = anewMessage(locale, pattern, &args);
   for (int round = 0; round < 3; ++round)
     EXPECT_EQ(heldMessage(locale, pattern, &args), expected)
         << toUtf8(pattern) << " in " << (locale ? locale : "null") << ", default "
@@ -455,13 +436,13 @@ TEST_F(FormatCacheTest, MessagesOfEveryLengthFitTheBuffer) {
 
 TEST_F(FormatCacheTest, ArgumentsThatAreMissingReadAsZeros) {
   const auto bind = [](const UChar *pattern) { return heldMessage("en", pattern, nullptr); };
-  EXPECT_EQ(bind(u"none '{0}'"), (Result{u"none {0}", 0}));
-  EXPECT_EQ(bind(u"{0,number} {1,number,integer}"), (Result{u"0 0", 0}));
+  EXPECT_EQ(bind(u"none '{0}'"), (FormatResult{u"none {0}", 0}));
+  EXPECT_EQ(bind(u"{0,number} {1,number,integer}"), (FormatResult{u"0 0", 0}));
   EXPECT_EQ(bind(u"{0,number}{1,number}{2,number}{3,number}{4,number}{5,number}{6,number}"
                  u"{7,number}{8,number}{9,number}{10,number}"),
-            (Result{u"00000000000", 0}));
+            (FormatResult{u"00000000000", 0}));
   EXPECT_EQ(bind(u"{0,number,integer} {12,number} {9,number,integer} {63,number,integer}"),
-            (Result{u"0 0 0 0", 0}));
+            (FormatResult{u"0 0 0 0", 0}));
   std::u16string most;
   for (const char16_t tens : u"0123456")
     for (const char16_t ones : u"0123456789") {
@@ -471,13 +452,13 @@ TEST_F(FormatCacheTest, ArgumentsThatAreMissingReadAsZeros) {
       most += ones;
       most += u",number,integer}";
     }
-  EXPECT_EQ(bind(most.c_str()), (Result{std::u16string(64, u'0'), 0}));
+  EXPECT_EQ(bind(most.c_str()), (FormatResult{std::u16string(64, u'0'), 0}));
   ASSERT_TRUE(IcuDefaults::setZone(u"UTC"));
-  EXPECT_EQ(bind(u"{0,date,yyyy}"), (Result{u"1970", 0}));
-  EXPECT_EQ(bind(u"{0}"), (Result{u"", U_ILLEGAL_ARGUMENT_ERROR}));
-  EXPECT_EQ(bind(u"{0,number} { 9 }"), (Result{u"", U_ILLEGAL_ARGUMENT_ERROR}));
-  EXPECT_EQ(bind(u"{64,number}"), (Result{u"", U_ILLEGAL_ARGUMENT_ERROR}));
-  EXPECT_EQ(bind(u"{ \t30000}"), (Result{u"", U_ILLEGAL_ARGUMENT_ERROR}));
+  EXPECT_EQ(bind(u"{0,date,yyyy}"), (FormatResult{u"1970", 0}));
+  EXPECT_EQ(bind(u"{0}"), (FormatResult{u"", U_ILLEGAL_ARGUMENT_ERROR}));
+  EXPECT_EQ(bind(u"{0,number} { 9 }"), (FormatResult{u"", U_ILLEGAL_ARGUMENT_ERROR}));
+  EXPECT_EQ(bind(u"{64,number}"), (FormatResult{u"", U_ILLEGAL_ARGUMENT_ERROR}));
+  EXPECT_EQ(bind(u"{ \t30000}"), (FormatResult{u"", U_ILLEGAL_ARGUMENT_ERROR}));
 }
 
 TEST_F(FormatCacheTest, AFormattedPatternIsParsedOnce) {
@@ -615,9 +596,9 @@ TEST_F(FormatCacheTest, WithoutMemoryThereIsTheWholeTextOrNone) {
       FailingMemory memory;
       (memory.*fail)(nth);
       for (const UChar *value : {u"x", longValue.c_str()}) {
-        const Result message = held("de", u"{0}", value);
-        EXPECT_EQ(message,
-                  message.error ? (Result{u"", U_MEMORY_ALLOCATION_ERROR}) : (Result{value, 0}));
+        const FormatResult message = held("de", u"{0}", value);
+        EXPECT_EQ(message, message.error ? (FormatResult{u"", U_MEMORY_ALLOCATION_ERROR})
+                                         : (FormatResult{value, 0}));
       }
       for (const double fraction : {0.0, 0.5})
         for (const char *pattern : {static_cast<const char *>(nullptr), "HH:mm:ss.SSS"}) {

@@ -6,7 +6,6 @@
 
 #include <algorithm>
 #include <cstdarg>
-#include <random>
 #include <string>
 
 #include <unicode/messagepattern.h>
@@ -18,6 +17,7 @@
 #include "text/QlxFormatCache.h"
 #include "text/QlxPatternTypes.h"
 #include "support/FailingMemory.h"
+#include "support/RandomWords.h"
 #include "support/ResourceBundles.h"
 #include "support/Take.h"
 #include "util/CxOwned.h"
@@ -126,8 +126,10 @@ struct Parsed {
   }
 };
 
-class Patterns {
+class Patterns : RandomWords<char16_t> {
  public:
+  Patterns() : RandomWords(20061121) {}
+
   std::u16string next() { return message(static_cast<int>(below(11)), u' '); }
 
   // One with a unit left out, doubled or put in the place of another, or cut off.
@@ -149,13 +151,6 @@ class Patterns {
   }
 
  private:
-  size_t below(size_t limit) { return random_() % limit; }
-
-  template <size_t N>
-  std::u16string oneOf(const char16_t *const (&words)[N]) {
-    return words[below(N)];
-  }
-
   std::u16string space() { return oneOf({u"", u"", u"", u" ", u"\n", u"\u200E"}); }
 
   std::u16string text(char16_t kind) {
@@ -188,8 +183,6 @@ class Patterns {
     if (below(2)) style += u"few" + space() + u"{" + text(u' ') + u"}" + space();
     return style + u"other" + space() + u"{" + message(levels, u' ') + u"}" + space() + u"}";
   }
-
-  std::mt19937 random_{20061121};
 };
 
 TEST(PatternNestingTest, TheLevelsAreThoseOfIcu) {

@@ -3,13 +3,14 @@
 #include <gtest/gtest.h>
 
 #include <iterator>
-#include <random>
 #include <string>
 
 #include <unicode/datefmt.h>
 #include <unicode/decimfmt.h>
 #include <unicode/messagepattern.h>
 #include <unicode/msgfmt.h>
+
+#include "support/RandomWords.h"
 
 namespace {
 
@@ -193,8 +194,10 @@ std::string typesByIcu(const std::u16string &pattern) {
 }
 
 // Patterns without quotes that both sides claim to read.
-class Patterns {
+class Patterns : RandomWords<char16_t> {
  public:
+  Patterns() : RandomWords(20060816) {}
+
   std::u16string next() {
     std::u16string pattern;
     for (size_t pieces = below(7); pieces > 0; --pieces) pattern += below(2) ? argument() : text();
@@ -202,13 +205,6 @@ class Patterns {
   }
 
  private:
-  size_t below(size_t limit) { return random_() % limit; }
-
-  template <size_t N>
-  std::u16string oneOf(const char16_t *const (&words)[N]) {
-    return words[below(N)];
-  }
-
   std::u16string space() { return oneOf({u"", u"", u" ", u"\t", u"\n ", u"\u200F"}); }
 
   std::u16string text() {
@@ -240,8 +236,6 @@ class Patterns {
         oneOf({u"", u"integer", u"integer", u"percent", u"currency", u"#,##0.00", u"0.###"});
     return style.empty() ? style : u"," + space() + style + space();
   }
-
-  std::mt19937 random_{20060816};
 };
 
 TEST(PatternTypesTest, AnApostropheThatIcuPrintsTogglesToo) {

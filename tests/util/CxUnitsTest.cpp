@@ -105,55 +105,36 @@ TEST(CxUnitsTest, AUnitIsFoundInEveryPlaceAndOnlyThere) {
     });
 }
 
-TEST(CxUnitsTest, NarrowsAsciiAndNothingElse) {
+// Each of the values in each place of texts of every length at every alignment: `copy` takes those
+// without a value above ASCII, and copies them.
+template <typename To, typename From, typename Values, typename Copy>
+void expectAsciiAlone(const Values &values, Copy copy) {
   for (size_t length = 0; length <= kMaxLength; ++length)
-    for (const UChar unit : kUnits)
-      forEachPosition<UChar>(length, [&](UChar *text) {
+    for (const auto value : values)
+      forEachPosition<From>(length, [&](From *text) {
         const Page out;
         forEachPlace(length, [&](size_t place) {
-          for (size_t i = 0; i < length; ++i) text[i] = static_cast<UChar>(i * 7 % 0x80);
-          if (place < length) text[place] = unit;
-          char *const bytes = out.last<char>(length);
-          ASSERT_EQ(cxNarrowAscii(bytes, text, length), place == length || unit < 0x80)
-              << length << ' ' << place << std::hex << ' ' << int{unit};
-          if (place < length && unit >= 0x80) return;
-          ASSERT_TRUE(std::equal(text, text + length, bytes));
+          for (size_t i = 0; i < length; ++i) text[i] = static_cast<From>(i * 7 % 0x80);
+          if (place < length) text[place] = static_cast<From>(value);
+          To *const copied = out.last<To>(length);
+          ASSERT_EQ(copy(copied, text, length), place == length || value < 0x80)
+              << length << ' ' << place << std::hex << ' ' << int{value};
+          if (place < length && value >= 0x80) return;
+          ASSERT_TRUE(std::equal(text, text + length, copied));
         });
       });
+}
+
+TEST(CxUnitsTest, NarrowsAsciiAndNothingElse) {
+  expectAsciiAlone<char, UChar>(kUnits, [](auto... all) { return cxNarrowAscii(all...); });
 }
 
 TEST(CxUnitsTest, WidensAsciiAndNothingElse) {
-  for (size_t length = 0; length <= kMaxLength; ++length)
-    for (const unsigned char byte : kBytes)
-      forEachPosition<char>(length, [&](char *text) {
-        const Page out;
-        forEachPlace(length, [&](size_t place) {
-          for (size_t i = 0; i < length; ++i) text[i] = static_cast<char>(i * 7 % 0x80);
-          if (place < length) text[place] = static_cast<char>(byte);
-          UChar *const units = out.last<UChar>(length);
-          ASSERT_EQ(cxWidenAscii(units, text, length), place == length || byte < 0x80)
-              << length << ' ' << place << std::hex << ' ' << static_cast<int>(byte);
-          if (place < length && byte >= 0x80) return;
-          ASSERT_TRUE(std::equal(text, text + length, units));
-        });
-      });
+  expectAsciiAlone<UChar, char>(kBytes, cxWidenAscii);
 }
 
 TEST(CxUnitsTest, CopiesAsciiAndNothingElse) {
-  for (size_t length = 0; length <= kMaxLength; ++length)
-    for (const unsigned char byte : kBytes)
-      forEachPosition<char>(length, [&](char *text) {
-        const Page out;
-        forEachPlace(length, [&](size_t place) {
-          for (size_t i = 0; i < length; ++i) text[i] = static_cast<char>(i * 7 % 0x80);
-          if (place < length) text[place] = static_cast<char>(byte);
-          char *const bytes = out.last<char>(length);
-          ASSERT_EQ(cxCopyAscii(bytes, text, length), place == length || byte < 0x80)
-              << length << ' ' << place << std::hex << ' ' << static_cast<int>(byte);
-          if (place < length && byte >= 0x80) return;
-          ASSERT_TRUE(std::equal(text, text + length, bytes));
-        });
-      });
+  expectAsciiAlone<char, char>(kBytes, cxCopyAscii);
 }
 
 TEST(CxUnitsTest, UnitsThatShareNoBitWithAsciiDoNotPassTogether) {

@@ -201,6 +201,21 @@ class ContainerTest : public ::testing::Test {
   typename Api::Head *container = Api::alloc();
 };
 
+// All instances of a kind.
+using AllGroups = ::testing::Types<QlxStringGroupApi, qlxIntlStringGroupApi, QlxListenerGroupApi,
+                                   qlxIntlListenerGroupApi>;
+using AllLists =
+    ::testing::Types<QlxStringListApi, qlxIntlStringListApi, QlxParmListApi, qlxIntlParmListApi>;
+using AllMaps =
+    ::testing::Types<QlxStringToStringMapApi, qlxIntlStringToStringMapApi, QlxStringToObjMapApi,
+                     qlxIntlStringToObjMapApi, QlxStringToObjCfgMapApi, qlxIntlStringToObjCfgMapApi,
+                     QlxStringToObjClassMapApi, qlxIntlStringToObjClassMapApi>;
+
+template <typename... A, typename... B>
+::testing::Types<A..., B...> join(::testing::Types<A...>, ::testing::Types<B...>);
+template <typename A, typename B>
+using Joined = decltype(join(A(), B()));
+
 // Names the instance in the name of a typed test.
 struct ApiNames {
   template <typename Api>

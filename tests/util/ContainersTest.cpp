@@ -10,18 +10,12 @@
 
 namespace {
 
-using AllContainers =
-    ::testing::Types<QlxStringGroupApi, qlxIntlStringGroupApi, QlxListenerGroupApi,
-                     qlxIntlListenerGroupApi, QlxStringListApi, qlxIntlStringListApi,
-                     QlxParmListApi, qlxIntlParmListApi, QlxStringToStringMapApi,
-                     qlxIntlStringToStringMapApi, QlxStringToObjMapApi, qlxIntlStringToObjMapApi,
-                     QlxStringToObjCfgMapApi, qlxIntlStringToObjCfgMapApi,
-                     QlxStringToObjClassMapApi, qlxIntlStringToObjClassMapApi>;
 using PublicContainers =
     ::testing::Types<QlxStringGroupApi, QlxListenerGroupApi, QlxStringListApi, QlxParmListApi,
                      QlxStringToStringMapApi, QlxStringToObjMapApi, QlxStringToObjCfgMapApi,
                      QlxStringToObjClassMapApi>;
 
+using AllContainers = Joined<AllGroups, Joined<AllLists, AllMaps>>;
 TYPED_TEST_SUITE(ContainerTest, AllContainers, ApiNames);
 
 TYPED_TEST(ContainerTest, IsEmptyAtFirst) {
@@ -102,10 +96,7 @@ TYPED_TEST(ContainerTest, IsNullWhenItCannotBeAllocated) {
 
 template <typename Api>
 class IterRemTest : public ContainerTest<Api> {};
-using IterRemContainers =
-    ::testing::Types<QlxStringGroupApi, qlxIntlStringGroupApi, QlxListenerGroupApi,
-                     qlxIntlListenerGroupApi, QlxStringListApi, qlxIntlStringListApi,
-                     QlxParmListApi, qlxIntlParmListApi>;
+using IterRemContainers = Joined<AllGroups, AllLists>;
 TYPED_TEST_SUITE(IterRemTest, IterRemContainers, ApiNames);
 
 TYPED_TEST(IterRemTest, OnEveryNodeEmptiesTheContainerAndEndsWithNull) {
@@ -154,12 +145,7 @@ class RemTest : public ContainerTest<Api> {
     return removed;
   }
 };
-using RemContainers =
-    ::testing::Types<QlxStringGroupApi, qlxIntlStringGroupApi, QlxListenerGroupApi,
-                     qlxIntlListenerGroupApi, QlxStringToStringMapApi, qlxIntlStringToStringMapApi,
-                     QlxStringToObjMapApi, qlxIntlStringToObjMapApi, QlxStringToObjCfgMapApi,
-                     qlxIntlStringToObjCfgMapApi, QlxStringToObjClassMapApi,
-                     qlxIntlStringToObjClassMapApi>;
+using RemContainers = Joined<AllGroups, AllMaps>;
 TYPED_TEST_SUITE(RemTest, RemContainers, ApiNames);
 
 TYPED_TEST(RemTest, RemovesTheElementThatMatches) {
@@ -232,6 +218,19 @@ Answers callEach(typename Api::Head *container, Elements<Api> &elements) {
   return answers;
 }
 
+// A container with the first two elements, made and freed by the twins.
+template <typename Api>
+struct Filled {
+  using Twins = typename Api::Twins;
+  Filled() {
+    for (int i = 0; i < 2; i++) EXPECT_EQ(insert<Twins>(container, elements, i), 1);
+  }
+  ~Filled() { Twins::free(container); }
+
+  Elements<Api> elements;
+  typename Api::Head *const container = Twins::alloc();
+};
+
 // Counts what is allocated under the lock and what is not.
 struct LockWatch : CxMemoryHook {
   LockWatch() : CxMemoryHook{look, [](CxMemoryHook *) {}, [](CxMemoryHook *) {}} {
@@ -253,16 +252,11 @@ TYPED_TEST_SUITE(ContainerLockTest, PublicContainers, ApiNames);
 
 TYPED_TEST(ContainerLockTest, IsHeldWhereMemoryIsNeeded) {
   { const ApiLock made; }
-  Elements<TypeParam> elements;
-  auto *container = TypeParam::alloc();
-  for (int i = 0; i < 2; i++) insert<TypeParam>(container, elements, i);
-  {
-    const LockWatch watch;
-    EXPECT_EQ(callEach<TypeParam>(container, elements).refused, "");
-    EXPECT_GT(watch.inside, 0);
-    EXPECT_EQ(watch.outside, 0);
-  }
-  TypeParam::free(container);
+  Filled<TypeParam> filled;
+  const LockWatch watch;
+  EXPECT_EQ(callEach<TypeParam>(filled.container, filled.elements).refused, "");
+  EXPECT_GT(watch.inside, 0);
+  EXPECT_EQ(watch.outside, 0);
 }
 
 template <typename Api>
@@ -271,29 +265,24 @@ TYPED_TEST_SUITE(ContainerLockDeathTest, PublicContainers, ApiNames);
 
 TYPED_TEST(ContainerLockDeathTest, NothingHappensWhenTheLockCannotBeTaken) {
   inFreshProcess([] {
-    using Twins = typename TypeParam::Twins;
-    Elements<TypeParam> elements;
-    auto *container = Twins::alloc();
-    for (int i = 0; i < 2; i++) insert<Twins>(container, elements, i);
+    Filled<TypeParam> filled;
     {
       FailingMemory memory;
       memory.failFrom(1);
-      EXPECT_EQ(callEach<TypeParam>(container, elements).given, "");
-      TypeParam::free(container);
+      EXPECT_EQ(callEach<TypeParam>(filled.container, filled.elements).given, "");
+      TypeParam::free(filled.container);
     }
-    EXPECT_EQ(numbersIn(container, elements), (Numbers{0, 1}));
-    Twins::free(container);
+    EXPECT_EQ(numbersIn(filled.container, filled.elements), (Numbers{0, 1}));
   });
 }
 
 TYPED_TEST(ContainerLockDeathTest, TheTwinsTakeNoLock) {
   inFreshProcess([] {
-    using Twins = typename TypeParam::Twins;
-    Elements<TypeParam> elements;
-    auto *container = Twins::alloc();
-    for (int i = 0; i < 2; i++) insert<Twins>(container, elements, i);
-    EXPECT_EQ(callEach<Twins>(container, elements).refused, "");
-    Twins::free(container);
+    {
+      Filled<TypeParam> filled;
+      using Twins = typename TypeParam::Twins;
+      EXPECT_EQ(callEach<Twins>(filled.container, filled.elements).refused, "");
+    }
     FailingMemory memory;
     memory.failFrom(1);
     EXPECT_EQ(qlxAPIMutexLock(), 0);  // the first to ask for it

@@ -7,8 +7,6 @@ namespace {
 
 template <typename Api>
 class GroupTest : public ContainerTest<Api> {};
-using AllGroups = ::testing::Types<QlxStringGroupApi, qlxIntlStringGroupApi, QlxListenerGroupApi,
-                                   qlxIntlListenerGroupApi>;
 TYPED_TEST_SUITE(GroupTest, AllGroups, ApiNames);
 
 TYPED_TEST(GroupTest, AddsAnElementOnlyOnce) {

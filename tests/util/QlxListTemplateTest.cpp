@@ -19,8 +19,6 @@ class ListTest : public ContainerTest<Api> {
     Api::sort(this->container, this->elements.compare);
   }
 };
-using AllLists =
-    ::testing::Types<QlxStringListApi, qlxIntlStringListApi, QlxParmListApi, qlxIntlParmListApi>;
 TYPED_TEST_SUITE(ListTest, AllLists, ApiNames);
 
 TYPED_TEST(ListTest, HoldsAnElementTwice) {

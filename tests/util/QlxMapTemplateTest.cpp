@@ -7,10 +7,6 @@ namespace {
 
 template <typename Api>
 class MapTest : public ContainerTest<Api> {};
-using AllMaps =
-    ::testing::Types<QlxStringToStringMapApi, qlxIntlStringToStringMapApi, QlxStringToObjMapApi,
-                     qlxIntlStringToObjMapApi, QlxStringToObjCfgMapApi, qlxIntlStringToObjCfgMapApi,
-                     QlxStringToObjClassMapApi, qlxIntlStringToObjClassMapApi>;
 TYPED_TEST_SUITE(MapTest, AllMaps, ApiNames);
 
 TYPED_TEST(MapTest, KnowsOnlyItsKeys) {

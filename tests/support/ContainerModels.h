@@ -74,6 +74,20 @@ class Shortage {
   uint32_t nth_ = 0;
 };
 
+inline int anyNumber(Choices &choices) {
+  return static_cast<int>(choices.below(kCount));
+}
+
+template <typename Entries>
+size_t anyPlace(Choices &choices, const Entries &entries) {
+  return choices.below(static_cast<uint32_t>(entries.size()));
+}
+
+template <typename Entries>
+void eraseAt(Entries &entries, size_t place) {
+  entries.erase(entries.begin() + static_cast<std::ptrdiff_t>(place));
+}
+
 inline bool contains(const std::vector<int> &numbers, int i) {
   return std::find(numbers.begin(), numbers.end(), i) != numbers.end();
 }
@@ -86,6 +100,20 @@ void requireReferences(Kind &elements, const Numbers &held) {
   for (int i = 0; i < kCount; ++i) {
     require(elements.references(i) == expected[static_cast<size_t>(i)]);
   }
+}
+
+// The elements of a group or a list.
+template <typename Head, typename Kind>
+void requireElements(Head *container, Kind &elements, const std::vector<int> &numbers) {
+  requireChain(container, numbers,
+               [&](const auto *node, int i) { return elements.is(node->value, i); });
+}
+
+// What was handed out is an element; it is given back.
+template <typename Kind, typename Element>
+void requireElement(Kind &elements, Element *handedOut, int i) {
+  require(elements.is(handedOut, i));
+  elements.discard(handedOut);
 }
 
 // ---- Groups
@@ -105,7 +133,7 @@ class GroupModel {
       else if (kind < 8)
         refuseNull();
       else if (sizes_.grows(choices_, model_.size()))
-        add(static_cast<int>(choices_.below(kCount)));
+        add(anyNumber(choices_));
       else
         remove();
       check();
@@ -125,11 +153,11 @@ class GroupModel {
 
   void remove() {
     if (model_.empty() || choices_.one(4)) {
-      const int i = static_cast<int>(choices_.below(kCount));
+      const int i = anyNumber(choices_);
       require(Api::rem(group_.get(), elements_.at(i)) == contains(model_, i));
       std::erase(model_, i);
     } else {
-      removeAt(choices_.below(static_cast<uint32_t>(model_.size())));
+      removeAt(anyPlace(choices_, model_));
     }
   }
 
@@ -137,7 +165,7 @@ class GroupModel {
     auto *it = iteratorAt<Api>(group_.get(), place);
     auto *successor = it->next;
     require(Api::iterRem(it) == successor);
-    model_.erase(model_.begin() + static_cast<std::ptrdiff_t>(place));
+    eraseAt(model_, place);
   }
 
   // In one go over the iterator.
@@ -150,7 +178,7 @@ class GroupModel {
         ++place;
       } else {
         it = Api::iterRem(it);
-        model_.erase(model_.begin() + static_cast<std::ptrdiff_t>(place));
+        eraseAt(model_, place);
       }
     }
     require(place == model_.size());
@@ -169,22 +197,19 @@ class GroupModel {
   }
 
   void check() {
-    requireChain(group_.get(), model_,
-                 [&](const auto *node, int i) { return elements_.is(node->value, i); });
+    requireElements(group_.get(), elements_, model_);
     auto *node = group_->head;
     for (const int i : model_) {
       require(Api::getLink(group_.get(), elements_.at(i)) == node);
       node = node->next;
     }
-    const int other = static_cast<int>(choices_.below(kCount));
+    const int other = anyNumber(choices_);
     require((Api::getLink(group_.get(), elements_.at(other)) != nullptr) ==
             contains(model_, other));
     requireReferences(elements_, model_);
     if (model_.empty()) return;
-    const size_t place = choices_.below(static_cast<uint32_t>(model_.size()));
-    auto *element = Api::get(iteratorAt<Api>(group_.get(), place));
-    require(elements_.is(element, model_[place]));
-    elements_.discard(element);
+    const size_t place = anyPlace(choices_, model_);
+    requireElement(elements_, Api::get(iteratorAt<Api>(group_.get(), place)), model_[place]);
   }
 
   Choices &choices_;
@@ -213,7 +238,7 @@ class ListModel {
       else if (kind < 8)
         refuse();
       else if (sizes_.grows(choices_, model_.size()))
-        append(static_cast<int>(choices_.below(kCount)));
+        append(anyNumber(choices_));
       else
         remove();
       check();
@@ -230,14 +255,14 @@ class ListModel {
 
   void remove() {
     if (model_.empty()) return;
-    const size_t place = choices_.below(static_cast<uint32_t>(model_.size()));
+    const size_t place = anyPlace(choices_, model_);
     auto *it = iteratorAt<Api>(list_.get(), place);
     auto *successor = it->next;
     if (choices_.one(2))
       require(Api::iterRem(it) == successor);
     else
       Api::remLink(list_.get(), it);
-    model_.erase(model_.begin() + static_cast<std::ptrdiff_t>(place));
+    eraseAt(model_, place);
   }
 
   void sort() {
@@ -251,8 +276,7 @@ class ListModel {
   void copy() {
     Container<Api> copied{Api::copy(list_.get())};
     if (choices_.one(2)) std::swap(copied, list_);
-    requireChain(copied.get(), model_,
-                 [&](const auto *node, int i) { return elements_.is(node->value, i); });
+    requireElements(copied.get(), elements_, model_);
     Api::remLink(list_.get(), copied->head);  // another list's: left alone
   }
 
@@ -272,20 +296,17 @@ class ListModel {
 
   void check() {
     require(list_->count == static_cast<int32_t>(model_.size()));
-    requireChain(list_.get(), model_,
-                 [&](const auto *node, int i) { return elements_.is(node->value, i); });
-    const int i = static_cast<int>(choices_.below(kCount));
+    requireElements(list_.get(), elements_, model_);
+    const int i = anyNumber(choices_);
     auto *link = Api::getLink(list_.get(), elements_.at(i));
     const auto first = std::find(model_.begin(), model_.end(), i);
     require((link != nullptr) == (first != model_.end()));
     if (link) require(link == iteratorAt<Api>(list_.get(), size_t(first - model_.begin())));
     if (model_.empty()) return;
-    const size_t place = choices_.below(static_cast<uint32_t>(model_.size()));
+    const size_t place = anyPlace(choices_, model_);
     auto *it = iteratorAt<Api>(list_.get(), place);
     require(Api::getIndex(list_.get(), static_cast<int32_t>(place)) == it->value);
-    auto *element = Api::get(it);
-    require(elements_.is(element, model_[place]));
-    elements_.discard(element);
+    requireElement(elements_, Api::get(it), model_[place]);
   }
 
   Choices &choices_;
@@ -312,7 +333,7 @@ class MapModel {
       else if (kind < 6)
         refuse();
       else if (sizes_.grows(choices_, model_.size()))
-        put(static_cast<int>(choices_.below(kCount)), static_cast<int>(choices_.below(kCount)));
+        put(anyNumber(choices_), anyNumber(choices_));
       else
         remove();
       check();
@@ -362,13 +383,13 @@ class MapModel {
 
   void remove() {
     if (model_.empty() || choices_.one(4)) {
-      const int key = static_cast<int>(choices_.below(kCount));
+      const int key = anyNumber(choices_);
       Api::rem(map_.get(), text(key));
       if (const Place there = placeOf(key); there != model_.end()) model_.erase(there);
     } else {
-      const size_t place = choices_.below(static_cast<uint32_t>(model_.size()));
+      const size_t place = anyPlace(choices_, model_);
       Api::remNode(map_.get(), iteratorAt<Api>(map_.get(), place));
-      model_.erase(model_.begin() + static_cast<std::ptrdiff_t>(place));
+      eraseAt(model_, place);
     }
   }
 
@@ -402,14 +423,14 @@ class MapModel {
   void check() {
     checkChain(map_.get());
     if (choices_.step() % kRarely == 0) lookEachUp();
-    const int key = static_cast<int>(choices_.below(kCount));
+    const int key = anyNumber(choices_);
     const Place there = placeOf(key);
     require(Api::hasKey(map_.get(), text(key)) == (there != model_.end()));
     auto *value = Api::get(map_.get(), text(key));
     require(isValue(value, there == model_.end() ? kNull : there->value));
     elements_.discard(value);
     if (model_.empty()) return;
-    const size_t place = choices_.below(static_cast<uint32_t>(model_.size()));
+    const size_t place = anyPlace(choices_, model_);
     auto *it = iteratorAt<Api>(map_.get(), place);
     require(take(Api::getKey(it)) == text(model_[place].key));
     value = Api::getVal(it);

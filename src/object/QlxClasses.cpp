@@ -51,8 +51,8 @@ void qlxToolkitInitObjClasses(void) {
 #undef QLX_ADD_CLASS
 }
 
-// The first of a name stays; it may be a built-in class that is registered just now. A record that is
-// new here is a host's, also when it began as a copy of one of the library's.
+// The first of a name stays; it may be a built-in class that is registered just now. A record that
+// is new here is a host's, also when it began as a copy of one of the library's.
 void qlxToolkitAddClassDef(const char *className, ObjClass *objClass) {
   if (!objClass) return;
   qlxToolkitInitObjClasses();

@@ -1,6 +1,7 @@
 #include "object/QlxObjClass.h"
 
 #include "object/QlxLocked.h"
+#include "support/BuiltInClasses.h"
 #include "support/FailingMemory.h"
 #include "support/ToolkitTest.h"
 
@@ -235,12 +236,10 @@ TEST_F(ObjClassTest, EveryKindListsItsClassesInTheOrderOfRegistration) {
   QlxAddUFormatterClass("u1", nullptr, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr,
                         nullptr);
   QlxAddLoggerClass("l2", nullptr, nullptr, nullptr, nullptr, nullptr);
-  EXPECT_EQ(joined(QlxGetLoggerClasses()), "qlx_basiclogger|qlx_pdlogger|l1|l2|");
-  EXPECT_EQ(joined(QlxGetFilterClasses()), "qlx_levelfilter|qlx_msgidfilter|f1|");
-  EXPECT_EQ(joined(QlxGetHandlerClasses()),
-            "qlx_consolehandler|qlx_filehandler|qlx_multiproc_filehandler|h1|");
-  EXPECT_EQ(joined(QlxGetFormatterClasses()),
-            "qlx_basicformatter|qlx_xmlformatter|qlx_vextraceformatter|u1|");
+  EXPECT_EQ(joined(QlxGetLoggerClasses()), builtInNames(Logger) + "l1|l2|");
+  EXPECT_EQ(joined(QlxGetFilterClasses()), builtInNames(Filter) + "f1|");
+  EXPECT_EQ(joined(QlxGetHandlerClasses()), builtInNames(Handler) + "h1|");
+  EXPECT_EQ(joined(QlxGetFormatterClasses()), builtInNames(Formatter) + "u1|");
 }
 
 // With each of its allocations failing in turn.

@@ -1,4 +1,4 @@
-// The text of an event's message, for who looks at it before it is written.
+// The text of an event's message, for formatters that look at it before they write it.
 #ifndef QLX_SRC_QLXBOUNDTEXT_H
 #define QLX_SRC_QLXBOUNDTEXT_H
 
@@ -11,8 +11,8 @@
 
 class BoundText {
  public:
-  // Binds as qlxIntlBindUI18Msg() does; empty where that gives null. Good as long as this and the
-  // message. The API lock is held.
+  // Binds as qlxIntlBindUI18Msg() does; empty where that gives null. The text is valid as long as
+  // this object and the message are. The API lock is held.
   std::u16string_view bind(Event *event, va_list *args);
 
  private:

@@ -13,8 +13,8 @@ void qlxDropCachedBuffers(void);
 
 QLX_END_DECLS
 
-// An empty buffer, which begins with a cached block and leaves it to the next one. The API lock is
-// held.
+// An empty buffer, which takes a cached block, if there is one, and leaves its own to the next. The
+// API lock is held.
 class CachedBuffer {
  public:
   CachedBuffer();

@@ -1,5 +1,5 @@
-// What the built-in formatters' records have of an event's properties, found in one walk. Also of
-// an event whose source is only noted and has not become properties (QlxLoggedEvent.h).
+// The properties of an event that the built-in formatters write, all found in one walk; also those
+// of an event whose source is only noted and has not become properties (QlxLoggedEvent.h).
 #ifndef QLX_SRC_QLXEVENTVALUES_H
 #define QLX_SRC_QLXEVENTVALUES_H
 
@@ -15,7 +15,7 @@
 // Texts are the event's own or the caller's; null for a key that is absent or has no value.
 struct EventValues {
   std::array<const char *, static_cast<size_t>(EventKey::kNone)> texts;
-  std::optional<int32_t> sourceLine;  // a number; none when the property is none
+  std::optional<int32_t> sourceLine;  // nothing when the property is no number
   uint32_t keys;                      // a bit for each key that the event has, also without a value
 
   const char *operator[](EventKey key) const { return texts[static_cast<size_t>(key)]; }

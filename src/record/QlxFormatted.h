@@ -28,7 +28,7 @@ class FormattedBytes {
   void narrow(std::u16string_view text);
 
   CxAsciiLine line_;
-  OwnedStr own_;  // what does not fit into the line, or is not ASCII
+  OwnedStr own_;  // the bytes when they do not fit into the line, or are not ASCII
   const char *data_ = nullptr;
   uint32_t length_ = 0;
 };

@@ -1,8 +1,9 @@
-// The event of a log call. It lives for the one call under the API lock, so its blocks are cached
-// and serve the next call: a call of a kind that was made before allocates nothing.
+// The event of a log call. It lives for one call under the API lock, and its blocks are cached for
+// the next call: a call like one that was made before allocates nothing.
 //
-// Where in the host's code the event comes from is only noted at first. Most lines are written
-// without anybody looking at the event's properties; before somebody may, the event is settled.
+// The event's source, which is where in the host's code it comes from, is only noted at first: most
+// records are written without a look at the event's properties. Before code that may look at them
+// runs, the event is settled: what is noted becomes properties.
 #ifndef QLX_SRC_QLXLOGGEDEVENT_H
 #define QLX_SRC_QLXLOGGEDEVENT_H
 
@@ -23,17 +24,17 @@ QLX_BEGIN_DECLS
 // What is noted for an event and not among its properties yet, or null.
 const EventSource *qlxNotedEventSource(const Event *event);
 
-// Makes what is noted properties of the event that it is noted for. To be called before anything
-// but the library's own code that asks for the note runs, also where that gets no event: it may log
-// too, and reuse the caller's texts for that.
+// Makes what is noted properties of its event. To be called before any code runs that does not ask
+// for the note, even when that code gets no event: it may log, which makes another note, or change
+// the caller's texts, which the note only points to.
 void qlxSettleNotedEvent(void);
 
-// Sets a property as QlxSetEventProp() does, in a cached block where there is one.
-// The event is settled. It is its status when memory ran out.
+// Sets a property of a settled event as QlxSetEventProp() does, in a cached block where there is
+// one. When memory runs out, the event's status tells it.
 void qlxStampEvent(Event *event, EventKey key, std::string_view value);
 void qlxStampEventInt(Event *event, EventKey key, int32_t value);
 
-// Sets the message identifier, of an event that has none, in the same way. For want of memory it
+// Sets the message identifier of an event that has none, in the same way; without memory the event
 // stays without one.
 void qlxStampEventMessageId(Event *event, std::string_view messageId);
 
@@ -42,8 +43,8 @@ void qlxDropCachedEvent(void);
 
 QLX_END_DECLS
 
-// An event as QlxVaAllocUEvent() makes it; its status tells when it has no message for want of
-// memory. The API lock is held.
+// An event as QlxVaAllocUEvent() makes it. When memory ran out for its message, it has none, and
+// its status tells that. The API lock is held.
 class LoggedEvent {
  public:
   LoggedEvent(int32_t level, const char *bundle, const char *key);

@@ -29,7 +29,7 @@ uint8_t qlxPDXMLCheckKey(const char *key);
 
 QLX_END_DECLS
 
-// The same for a record on its way, of what was found of the event.
+// The same for a RecordText, from values that were already found.
 struct ProductElements {
   bool component, product, instance, server;  // those that are selected
 };

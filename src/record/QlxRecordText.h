@@ -1,5 +1,5 @@
-// A record on its way to a handler: as UTF-16, or straight as bytes while all of it is ASCII. What
-// formatters write looks the same either way.
+// A record on its way to a handler: as UTF-16, or, while all of it is ASCII, as the bytes that the
+// handler writes. A formatter's code is the same for both.
 #ifndef QLX_SRC_QLXRECORDTEXT_H
 #define QLX_SRC_QLXRECORDTEXT_H
 
@@ -19,14 +19,16 @@
 // which ends at a piece that is not ASCII or does not fit.
 //
 // A record is whole or nothing: when a piece cannot be appended, all that was appended is dropped,
-// and what comes later is not appended any more. A buffer itself remembers a loss, so that several
-// of these, one after the other, build one record; CxUStringBuffTakeUStr() gives null then.
+// and what comes later is not appended any more. A loss is marked in the buffer itself (isLost()),
+// so that several RecordTexts, one after the other, can build one record in it; of a marked buffer
+// CxUStringBuffTakeUStr() gives null.
 class RecordText {
  public:
   explicit RecordText(CxUStringBuff *text) : text_(text) {}  // null: nothing is appended
   explicit RecordText(CxAsciiLine *line) : line_(line) {}    // with the default code page UTF-8
 
-  // From now on a piece that a buffer has no memory for is left out, and the event tells of it.
+  // From now on a piece for which a buffer has no memory is left out alone, and the event's status
+  // tells it.
   void leaveOutFor(Event *event) { missing_ = event; }
 
   // Words of the record's own, in ASCII.
@@ -70,11 +72,11 @@ class RecordText {
   bool isWhole() const { return line_ ? !isLost_ : text_ && text_->data; }
   bool isEmpty() const { return line_ ? line_->length() == 0 : !text_ || text_->length == 0; }
 
-  // Whether it is whole; the event tells when memory ran out.
+  // Whether it is whole; the event's status tells when memory ran out.
   bool isWholeFor(Event *event) const;
 
  private:
-  // Room without a block is what no buffer has otherwise.
+  // The mark of a loss: room without a block, which no buffer has otherwise.
   static bool isLost(const CxUStringBuff *text) { return !text->data && text->capacity > 0; }
   void losePiece();
   static void bindTo(CxUStringBuff *text, Event *event, va_list *args);
@@ -92,8 +94,8 @@ class RecordText {
 
   CxUStringBuff *text_ = nullptr;
   CxAsciiLine *line_ = nullptr;
-  bool isLost_ = false;       // of a line
-  Event *missing_ = nullptr;  // told of pieces that are left out; null: none may be
+  bool isLost_ = false;       // a line has lost a piece
+  Event *missing_ = nullptr;  // whose status tells of pieces left out; null: none may be left out
 };
 
 #endif

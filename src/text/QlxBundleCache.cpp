@@ -1,6 +1,6 @@
-// Resource bundles, cached by name and locale, and by the default locale, in which ICU looks for
-// them when it has no bundle of the locale. ICU keeps what it has loaded anyway, also when its data
-// directory is another one by now; cached is the handle.
+// Resource bundles are cached by name, locale and default locale: where ICU has no bundle of the
+// locale, it looks for one of the default locale. What is cached is the handle; ICU itself keeps
+// the data that it has loaded, even when its data directory changes.
 #include "QlxBundleCache.h"
 
 #include <algorithm>
@@ -27,10 +27,10 @@ struct BundleKey {
 static constexpr const char *BundleKey::*kKeyTexts[] = {&BundleKey::name, &BundleKey::locale,
                                                         &BundleKey::defaultLocale};
 
-// What is known of a key of a bundle. A text stays where it is while its bundle is cached.
+// What is cached for a key of a bundle. The text is the bundle's own, and valid as long as that.
 struct BundlePattern {
   std::array<char, 48> key;
-  std::u16string_view text;  // its data is null: nothing is known, all zero
+  std::u16string_view text;  // its data is null: a free place, all zero
   MessagePlace message;
   bool isScanned, isReadable;
   ArgTypes types;
@@ -70,8 +70,8 @@ static bool isSame(const BundleKey &a, const BundleKey &b) {
   return std::ranges::all_of(kKeyTexts, [&](auto text) { return qlxSameText(a.*text, b.*text); });
 }
 
-// A pattern of a cached bundle is in use while it is formatted, so nothing here is dropped when a
-// default turns out to be another one.
+// A changed default locale drops no bundle, since the pattern that is being formatted may be of one
+// of them. The bundles of the old default are just not found, as it is a part of their key.
 static CachedBundle *find(const BundleKey &key) {
   for (CachedBundle &cached : gBundles)
     if (cached.bundle && isSame(cached.key, key)) return &cached;
@@ -88,9 +88,9 @@ static icu::LocalUResourceBundlePointer open(const char *name, const char *local
   return icu::LocalUResourceBundlePointer{ures_open(separator + 1, locale, status)};
 }
 
-// Takes the bundle over when there is memory to hold it, unless the default locale, in which ICU
-// may have looked for it, became another one meanwhile. One that cannot be opened is not cached: it
-// may be there the next time.
+// Takes the bundle over when there is memory for its key, but not when the default locale has
+// changed meanwhile: ICU may have looked for it in either. That a bundle cannot be opened is not
+// cached: it may be there the next time.
 static void store(const BundleKey &key, icu::LocalUResourceBundlePointer &bundle) {
   if (!qlxSameText(uloc_getDefault(), key.defaultLocale)) return;
   BundleKey copy = key;
@@ -113,7 +113,7 @@ static BundlePattern *placeOf(CachedBundle *cached, const char *key) {
   return &cached->patterns[cxHashText(key) % cached->patterns.size()];
 }
 
-// The text ends at its first zero, where it has one.
+// A text that has a zero in it ends there.
 static void lookUp(BundlePattern *pattern, const UResourceBundle *bundle, const char *key,
                    UErrorCode *status) {
   *status = U_ZERO_ERROR;
@@ -121,7 +121,7 @@ static void lookUp(BundlePattern *pattern, const UResourceBundle *bundle, const 
   if (U_SUCCESS(*status)) *pattern = {{}, {text, cxUnitsLength(text)}, {}, false, false, {}};
 }
 
-// Null when there is no pattern. `room` takes one that has no place.
+// Null when there is no pattern. `room` is for the pattern of a key that has no place.
 static BundlePattern *patternOf(CachedBundle *cached, const char *key, BundlePattern *room,
                                 UErrorCode *status) {
   BundlePattern *const place = key ? placeOf(cached, key) : nullptr;

@@ -1,6 +1,7 @@
-// A message pattern taken apart into literal text and arguments of three plain types, so that a
-// text is put together without the machinery for all the other patterns. The numbers are written in
-// the shapes of the parsed message's own formatters, or by these.
+// A simple message pattern, taken apart into literal texts and arguments: strings, integers and
+// doubles. Its text is then put together piece by piece, which is much cheaper than ICU's message
+// format. A number is written by its shape (QlxNumberShape.h), or else by the number format that
+// the parsed message has for it.
 #ifndef QLX_SRC_QLXCOMPOSED_H
 #define QLX_SRC_QLXCOMPOSED_H
 
@@ -28,17 +29,17 @@ struct QlxComposed {
   int32_t argumentCount;
   ComposedPiece pieces[kMaxComposedPieces];
   ArgType types[kMaxComposedArguments];
-  bool isShaped[2];       // of integers and of doubles; false: the formatters write the numbers
-  NumberShape shapes[2];  // the same; formatters of one type are all made alike
+  bool isShaped[2];       // integers, doubles; false: the number formats write them
+  NumberShape shapes[2];  // integers, doubles; one for all arguments, whose formats are alike
 };
 
-// Takes a pattern apart that `message` was made of; both outlive the result. False when the pattern
-// has anything but text, {n}, {n,number} and {n,number,integer}, each number below 10 and none left
-// out, or is too long.
+// Takes apart the pattern that `message` was made of; both outlive the result. False when the
+// pattern has anything but text, {n}, {n,number} and {n,number,integer}, when an n is 10 or more
+// or has two types, when one below the highest n is missing, and when there are too many pieces.
 bool qlxCompose(QlxComposed *composed, std::u16string_view pattern, const UMessageFormat *message);
 
-// Appends the text; no argument lies in the buffer's own block. False, with the buffer's text
-// unchanged, when an argument is a null string or memory ran out.
+// Appends the text. No argument may lie in the buffer's own block, which may move. False, with the
+// buffer's text unchanged, when an argument is a null string or memory ran out.
 bool qlxAppendComposed(CxUStringBuff *text, const QlxComposed *composed, va_list *args);
 
 #endif

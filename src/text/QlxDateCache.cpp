@@ -27,7 +27,7 @@ struct CachedDate {
   UDateFormat *format;  // null: a free place, all zero
   DateStyle style;      // with a copy of the pattern, owned; the offset from UTC follows a null one
   uint64_t lastUse;     // larger is later
-  bool varies;          // texts of one second differ in more than three digits: none is kept
+  bool varies;          // texts of one second differ in more than three digits: none is cached
 
   // The text of `second` at its millisecond 0, when hasText.
   bool hasText;
@@ -106,7 +106,7 @@ static CachedDate *fetch(const DateStyle &style, UErrorCode *status) {
 
 // ---- The zone's clock
 
-// In the zone that was checked: the default one may be another by now.
+// In the zone of the last look, since the default zone may be another one by now.
 static UCalendar *openCalendar(UErrorCode *status) {
   const char *locale = qlxGoodLocale(qlxDefaultLocale());
   UCalendar *calendar = ucal_open(nullptr, -1, locale, UCAL_TRADITIONAL, status);
@@ -181,14 +181,14 @@ static uint8_t appendDate(CxUStringBuff *text, const CachedDate &cached, double 
   return cached.style.pattern ? 1 : appendOffset(text, offsetAt(cached.style, time));
 }
 
-// Three times the zero of a script's decimal digits, behind which the other nine stand in order.
+// Whether a text is three zeros of one script. In Unicode the digits 1 to 9 follow their zero.
 static bool isZeros(const UChar *digits, int32_t length) {
   return length == kMillisDigits && u_charDigitValue(digits[0]) == 0 && digits[1] == digits[0] &&
          digits[2] == digits[0];
 }
 
-// Finds the milliseconds in the text of a whole second: three zeros in one place at most. Nothing
-// when another text of the same second may differ in more than that.
+// Finds where the milliseconds stand in the text of a whole second, as three zeros; -1 when they
+// stand nowhere. Nothing when texts of the same second may differ elsewhere too.
 static std::optional<int32_t> findFraction(const CxUStringBuff &text,
                                            UFieldPositionIterator *fields) {
   int32_t found = -1;
@@ -203,8 +203,8 @@ static std::optional<int32_t> findFraction(const CxUStringBuff &text,
   return found;
 }
 
-// Makes the text of a second the kept one; false when none can be kept.
-static bool keep(CachedDate &cached, int64_t second) {
+// Makes the text of a second the cached one; false when none can be.
+static bool cacheSecond(CachedDate &cached, int64_t second) {
   if (cached.hasText && cached.second == second) return true;
   if (cached.varies) return false;
   cached.hasText = false;
@@ -244,7 +244,8 @@ static uint8_t appendCached(CxUStringBuff *text, const CachedDate &cached, int32
   return 1;
 }
 
-// Nothing for a time that is not a whole number, or is not one any more with a zone's offset added.
+// Nothing for a time that is no whole number, or so large that it may be none once a zone's offset
+// is added.
 static std::optional<Moment> momentOf(double time) {
   constexpr double kMaxWhole = 4503599627370496.0;  // 2 to the power 52
   if (!(time >= -kMaxWhole && time <= kMaxWhole)) return std::nullopt;
@@ -256,7 +257,8 @@ static std::optional<Moment> momentOf(double time) {
 
 static uint8_t appendBy(CachedDate &cached, CxUStringBuff *text, double time) {
   const std::optional<Moment> moment = momentOf(time);
-  if (moment && keep(cached, moment->second)) return appendCached(text, cached, moment->millis);
+  if (moment && cacheSecond(cached, moment->second))
+    return appendCached(text, cached, moment->millis);
   UErrorCode status = U_ZERO_ERROR;
   return appendDate(text, cached, time, nullptr, &status);
 }
@@ -273,7 +275,7 @@ bool qlxAppendCachedDateAscii(CxAsciiLine *line, const DateStyle &style, double 
   UErrorCode status = U_ZERO_ERROR;
   CachedDate *cached = fetch(style, &status);
   const std::optional<Moment> moment = cached ? momentOf(time) : std::nullopt;
-  if (!moment || !keep(*cached, moment->second) || cached->asciiLength == 0) return false;
+  if (!moment || !cacheSecond(*cached, moment->second) || cached->asciiLength == 0) return false;
   std::array<char, 64> text = cached->ascii;
   addMillis(text.data(), *cached, moment->millis);
   return line->append({text.data(), cached->asciiLength});

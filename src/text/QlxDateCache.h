@@ -1,6 +1,7 @@
-// Date formats, cached by pattern, each with the text of the last second that it was asked for:
-// opening one costs several times what formatting with it does, and the text of a second changes
-// only in its milliseconds. Bounded; the one not used for longest goes.
+// Date formats, cached by style, each with the text of the last second that it was asked for: to
+// open one costs several times what it costs to format with it, and the texts of one second differ
+// only in their milliseconds. When all places are taken, the one that was not used for longest is
+// dropped.
 #ifndef QLX_SRC_QLXDATECACHE_H
 #define QLX_SRC_QLXDATECACHE_H
 
@@ -20,11 +21,12 @@ struct DateStyle {
 // The default pattern is "yyyy-MM-dd HH:mm:ss.SSS".
 //
 // Appends a time in milliseconds since 1970-01-01 UTC, formatted in the default locale. Returns 1,
-// or 0 when memory ran out; what ICU cannot format is empty, and nothing is appended, not even to a
-// buffer without a block, where it has no format.
+// or 0 when memory ran out. A time that ICU cannot format is an empty text; where ICU has no date
+// format at all, the buffer is not touched, so that one without a block stays without.
 uint8_t qlxAppendCachedDate(CxUStringBuff *text, const DateStyle &style, double time);
 
-// The same as bytes; false when the text is not ASCII, or not one that is cached for its second.
+// The same as bytes; false, with nothing appended, when the text is not ASCII, is too long, or is
+// not one that can be cached for its second.
 bool qlxAppendCachedDateAscii(CxAsciiLine *line, const DateStyle &style, double time);
 
 #endif

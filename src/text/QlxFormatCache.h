@@ -1,9 +1,13 @@
-// What ICU's formats are made under, and how long they are good: a cached format, message or number
-// is what opening anew under the default locale, time zone and code page of that moment gives, byte
-// for byte. Who finds that one of these defaults has changed drops everything that is cached by it.
+// What all caches of ICU's formats share: when they are emptied, and their lock.
 //
-// A lock of its own guards all caches of this folder, since formatting a date takes no API lock.
-// Who holds it calls nothing that takes a lock of this library, and no host's code.
+// A format depends on the defaults under which it was opened: ICU's default locale, time zone and
+// code page. A cached one must give the same text, byte for byte, as one that is opened now. So the
+// defaults are looked at before a cached format is used, as often as CxLook.h says, and a change
+// empties the caches.
+//
+// One lock guards all caches of this folder. It is not the API lock, which those who format a date
+// need not have. While it is held nothing is called that takes a lock of this library, and no
+// host's code.
 #ifndef QLX_SRC_QLXFORMATCACHE_H
 #define QLX_SRC_QLXFORMATCACHE_H
 
@@ -41,7 +45,7 @@ class FormatCache {
   FormatCache(const FormatCache &) = delete;
   FormatCache &operator=(const FormatCache &) = delete;
 
-  static void dropAll(Until until);  // those that last until then or shorter
+  static void dropAll(Until until);  // kClose: all caches; kDefaultsChange: those that end with it
 
  private:
   void (*const drop_)();
@@ -53,21 +57,21 @@ class FormatCache {
 
 enum QlxDefaults : uint8_t { kLocaleOnly, kZoneOnly, kEveryDefault };
 
-// Looks whether defaults are still the same, when `look` says that it is time for that; with a null
-// look, and while they are not known, in any case.
+// Looks whether the defaults are still the same, and empties caches when they are not. With a null
+// `look` in any case; else when that says that it is time for it, or when a default is not known:
+// never looked at, or a name too long to compare.
 void qlxCheckDefaults(QlxDefaults which, CxLook *look);
 
-// The defaults as they were when they were looked at last: the locale's name, and the zone, which
-// is null when it is not known.
+// The defaults at the last look: the locale's name, and the zone, null when it is not known.
 const char *qlxDefaultLocale(void);
 const icu::TimeZone *qlxDefaultZone(void);
 
-// Whether ICU takes a name for one of a locale: its own parser can read it, and what that makes of
-// it keeps to ICU's lengths. By some other names ICU cannot make dates and plural rules without
-// ending the process.
+// Whether a name is safe as a locale's: ICU's parser can read it, and the name that the parser
+// makes of it keeps to ICU's lengths. With some other names ICU ends the process when it makes
+// dates or plural rules.
 bool qlxIsGoodLocale(const char *name);
 
-// The name, or the root's for one that is not good.
+// The name, or "", the root locale's, in place of one that is not good.
 const char *qlxGoodLocale(const char *name);
 
 // Whether two texts by which something is cached are the same; null is the same as null alone.
@@ -75,9 +79,10 @@ inline bool qlxSameText(const char *a, const char *b) {
   return a && b ? std::strcmp(a, b) == 0 : a == b;
 }
 
-// Appends what format(room, units, status) writes straight into the buffer's block. As ICU's calls
-// do, it answers the units needed, and is asked again only when they did not fit. Returns the units
-// appended; 0 with the text unchanged when *status is a failure.
+// Appends what format(room, units, status) writes: straight into the buffer's block, which has room
+// for that many units. As ICU's calls do, format answers the units needed; when they did not fit it
+// is asked again, with more room. Returns the units appended; 0 with the text unchanged when
+// *status is a failure.
 template <typename Format>
 uint32_t qlxAppendFormatted(CxUStringBuff *text, UErrorCode *status, const Format &format) {
   for (uint32_t needed = 0;;) {

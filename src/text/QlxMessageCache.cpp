@@ -35,12 +35,12 @@ struct CachedMessage {
   QlxComposed composed;
   PatternKey key;  // with copies of the two texts, owned
   bool usesZone;
-  uint64_t serial;   // another one for whatever is cached
+  uint64_t serial;   // no two cached messages ever have the same
   uint64_t lastUse;  // larger is later
 };
 
 static CachedMessage gMessages[kMaxCachedMessages];
-static std::array<MessagePlace, kMaxCachedMessages> gLatest;  // by tag: the callers' patterns
+static std::array<MessagePlace, kMaxCachedMessages> gLatest;  // by tag: what was asked for last
 static uint64_t gUses;
 static CxLook gLocaleLook, gZoneLook;
 
@@ -83,7 +83,7 @@ static bool isCurrent(const CachedMessage &cached) {
   return cached.format;
 }
 
-// Behind the white space that ICU leaves out at a place.
+// The place behind the white space that begins at a place, which ICU leaves out.
 static size_t skipSpace(std::u16string_view pattern, size_t at) {
   while (at < pattern.size() && u_hasBinaryProperty(pattern[at], UCHAR_PATTERN_WHITE_SPACE)) ++at;
   return at;
@@ -104,21 +104,23 @@ static bool mayHaveType(std::u16string_view pattern,
   return false;
 }
 
-// Where no argument is a date or time, the zone, which is costly to ask for, need not be looked at.
+// Whether an argument may be a date or a time. For other patterns the zone need not be looked at,
+// which is costly.
 static bool mayUseZone(std::u16string_view pattern) {
   return mayHaveType(pattern, {u"date", u"time"});
 }
 
-// Worded numbers take the forms of their words from them too, and so do long names of currencies
-// and what skeletons of numbers know: short notations and units.
+// Whether ICU may need plural rules for the pattern. They give the forms of the words also in
+// worded numbers, in long names of currencies, and in the short notations and units of number
+// skeletons.
 static bool mayUsePluralRules(std::u16string_view pattern) {
   return mayHaveType(pattern,
                      {u"plural", u"selectordinal", u"ordinal", u"spellout", u"duration", u"::"}) ||
          pattern.find(u"\u00a4\u00a4\u00a4") != pattern.npos;
 }
 
-// Whether ICU can be given the pattern. What has a type takes data of its locale, and where there
-// are none those of the default one.
+// Whether ICU can be given the pattern. An argument with a type takes data of the locale, and where
+// that has none, of the default locale.
 static bool isSafe(std::u16string_view pattern, const char *locale, const char *defaultLocale,
                    bool usesZone) {
   const bool hasTypes = pattern.find(u',') != pattern.npos;
@@ -127,8 +129,8 @@ static bool isSafe(std::u16string_view pattern, const char *locale, const char *
          !qlxNestsTooDeep(pattern);
 }
 
-// The default locale is the one that was checked: ICU, asked for no locale, would take the one of a
-// moment later.
+// Names the default locale, since ICU, given no name, would take the default of a moment later,
+// which nobody has checked.
 static icu::LocalUMessageFormatPointer open(const PatternKey &key, bool usesZone,
                                             UErrorCode *status) {
   qlxCheckDefaults(usesZone ? kEveryDefault : kLocaleOnly, nullptr);
@@ -139,7 +141,7 @@ static icu::LocalUMessageFormatPointer open(const PatternKey &key, bool usesZone
       key.pattern.data(), static_cast<int32_t>(key.pattern.size()), locale, nullptr, status)};
 }
 
-// Takes the format over when there is memory to hold it.
+// Takes the format over when there is memory for its key.
 static void store(const PatternKey &key, bool usesZone, icu::LocalUMessageFormatPointer &format) {
   OwnedStr locale{OslStringDup(key.locale)};
   OwnedUStr pattern{CxUStringDup(key.pattern.data())};
@@ -175,8 +177,9 @@ static int32_t formatList(const UMessageFormat *format, UChar *room, int32_t uni
   return needed;
 }
 
-// Numbers and pointers travel in registers of two kinds and then on the stack: with this many zeros
-// of both kinds whatever is read is a zero.
+// Doubles travel in registers of one kind, integers and pointers in those of another, and what
+// finds no register on the stack: with this many zeros of both kinds each argument that ICU reads
+// is zero.
 template <size_t... index>
 static int32_t formatZeros(const UMessageFormat *format, UChar *room, int32_t units,
                            UErrorCode *status, std::index_sequence<index...>) {
@@ -237,15 +240,15 @@ static uint32_t appendCached(CxUStringBuff *text, CachedMessage &cached, va_list
 }
 
 // The pattern is not a plain one.
-static uint32_t appendParsed(CxUStringBuff *text, MessagePlace *known, PatternKey key,
+static uint32_t appendParsed(CxUStringBuff *text, MessagePlace *place, PatternKey key,
                              va_list *args, UErrorCode *status) {
-  CachedMessage *cached = known->cached;
-  if (!cached || cached->serial != known->serial) {
+  CachedMessage *cached = place->cached;
+  if (!cached || cached->serial != place->serial) {
     key.tag = cxHashEnds(key.pattern);
     cached = find(key);
   }
   if (cached && isCurrent(*cached)) {
-    *known = {cached, cached->serial};
+    *place = {cached, cached->serial};
     return appendCached(text, *cached, args, status);
   }
   const bool usesZone = mayUseZone(key.pattern);
@@ -257,9 +260,9 @@ static uint32_t appendParsed(CxUStringBuff *text, MessagePlace *known, PatternKe
   return append(text, format, key.pattern, args, status);
 }
 
-// A message that is known has no plain pattern.
-static bool isPlain(const MessagePlace &known, std::u16string_view pattern) {
-  return !known.cached && qlxIsPlainPattern(pattern);
+// A plain pattern never gets a place, so one that has a place need not be searched.
+static bool isPlain(const MessagePlace &place, std::u16string_view pattern) {
+  return !place.cached && qlxIsPlainPattern(pattern);
 }
 
 uint32_t qlxAppendCachedMessageAt(MessagePlace *place, CxUStringBuff *text, const char *locale,
@@ -274,10 +277,10 @@ uint32_t qlxAppendCachedMessage(CxUStringBuff *text, const char *locale, const U
   const std::u16string_view whole{pattern, cxUnitsLength(pattern)};
   const PatternKey key{locale, whole, cxHashEnds(whole)};
   MessagePlace &latest = gLatest[key.tag % gLatest.size()];
-  MessagePlace known = latest.cached && isAt(*latest.cached, key) ? latest : MessagePlace{};
-  if (isPlain(known, whole)) return appendPlain(text, whole, status);
+  MessagePlace place = latest.cached && isAt(*latest.cached, key) ? latest : MessagePlace{};
+  if (isPlain(place, whole)) return appendPlain(text, whole, status);
   qlxCheckDefaults(kLocaleOnly, &gLocaleLook);
-  const uint32_t appended = appendParsed(text, &known, key, args, status);
-  latest = known;
+  const uint32_t appended = appendParsed(text, &place, key, args, status);
+  latest = place;
   return appended;
 }

@@ -1,6 +1,7 @@
-// What a plain decimal format does to a number, as data, so that common numbers are written without
-// ICU. A shape is used only after it wrote a set of numbers just as its format does; numbers whose
-// rounding is not plain are left to the format.
+// The shape of a plain decimal format: its digits, separators, groups and signs as data, by which
+// common numbers are written without ICU. A shape is used only when it has written a fixed set of
+// numbers just as its format does. Numbers that are very large, or whose rounding is in doubt, are
+// left to the format.
 #ifndef QLX_SRC_QLXNUMBERSHAPE_H
 #define QLX_SRC_QLXNUMBERSHAPE_H
 
@@ -25,17 +26,17 @@ struct NumberShape {
   int32_t otherGroupSize;                     // of the groups before that one
   uint64_t groupsFrom;                        // the least whole number that has groups
   int32_t fractionDigits;                     // at most; trailing zeros are left out
-  std::array<NumberAffix, 2> prefix, suffix;  // of numbers that are not negative, and of negative
+  std::array<NumberAffix, 2> prefix, suffix;  // [0]: of zero and positive numbers, [1]: negative
 };
 
-// More than any number that a shape writes has.
+// Room for any number that a shape writes.
 inline constexpr uint32_t kMaxShapedUnits = 64;
 
 // Takes the shape of a format for integers or doubles; false when it has none.
 bool qlxTakeNumberShape(NumberShape *shape, const icu::NumberFormat *format, ArgType type);
 
-// Write a number at `out`, which has room for kMaxShapedUnits, and return its end; null when it is
-// left to the format. Every integer is written.
+// Write a number at `out`, which has room for kMaxShapedUnits, and return the end of what they
+// wrote. Null: the format has to write it; no integer is such a number.
 UChar *qlxWriteShapedInteger(const NumberShape &shape, int32_t value, UChar *out);
 UChar *qlxWriteShapedDouble(const NumberShape &shape, double value, UChar *out);
 

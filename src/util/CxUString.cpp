@@ -131,11 +131,11 @@ char *CxUStringParmToStr(const Parm *parm) {
   return CxUStringDupUCharToStr(text.data());
 }
 
-// ICU's handle on the standard output stream, kept between calls; null while a call uses it. It is
-// never closed at the end, as closing has nothing to give back but memory.
+// ICU's handle on the standard output stream, cached between calls; null while a call uses it. It
+// is never closed at the end, as closing has nothing to give back but memory.
 static std::atomic<UFILE *> keptStdout;
 
-// Takes the kept handle, or makes one: also when the stream or the code page is another by now.
+// Takes the cached handle, or makes one: also when the stream or the code page is another by now.
 static UFILE *takeStdout() {
   UFILE *handle = keptStdout.exchange(nullptr);
   if (handle && u_fgetfile(handle) == stdout &&

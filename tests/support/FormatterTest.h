@@ -24,7 +24,9 @@ class FormatterTest : public ToolkitTest {
   using EventPtr = Owned<Event, QlxFreeEvent>;
   using Format = UChar *(QlxObject *, Event *, va_list *);
 
-  FormatterTest(const char *className, Format *format) : className_(className), format_(format) {}
+  // Without a format: the class's own.
+  explicit FormatterTest(const char *className, Format *format = nullptr)
+      : className_(className), format_(format) {}
 
   void SetUp() override {
     ToolkitTest::SetUp();
@@ -70,7 +72,7 @@ class FormatterTest : public ToolkitTest {
   }
   std::u16string formattedBy(QlxObject *object, Event *event, va_list *args = nullptr) const {
     const ApiLock lock;
-    return ::take(format_(object, event, args));
+    return ::take((format_ ? format_ : object->objClass->op1.fFormat)(object, event, args));
   }
 
   const IcuDefaults defaults;

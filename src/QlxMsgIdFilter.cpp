@@ -126,12 +126,12 @@ static int64_t repeatEnd(int64_t last, int64_t repeatTime) {
   return overflows ? std::numeric_limits<int64_t>::max() : end;
 }
 
-// Whether the event's identifier passed less than the repeat time ago; notes the event's time when
-// it did not. Deliberate: a blocked repeat does not extend the interval.
+// Whether the event's identifier passed less than the repeat time ago; stores the event's time
+// when it did not. Deliberate: a blocked repeat does not extend the interval.
 static bool isRepeat(MsgIdFilterVars *vars, const Event *event) {
   const int64_t now = wholeTime(event->time);
-  if (const char *noted = qlxPeekMapProp(vars->lastTimes, event->messageId)) {
-    const int64_t last = qlxPropStrToInt64(noted, nullptr);  // no number: 0
+  if (const char *stored = qlxPeekMapProp(vars->lastTimes, event->messageId)) {
+    const int64_t last = qlxPropStrToInt64(stored, nullptr);  // no number: 0
     if (repeatEnd(last, vars->repeatTime) > now) return true;
   }
   char text[24];

@@ -2,12 +2,15 @@
 // src/file/README.md: what the modules of that folder include.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <regex>
 #include <set>
 #include <string>
+
+#include <fnmatch.h>
 
 namespace {
 
@@ -18,7 +21,7 @@ std::filesystem::path root() {
 // What stands between grave accents in the table's rows.
 std::set<std::string> namesOfTheTable() {
   std::ifstream in(root() / "docs/architecture.md");
-  static const std::regex name("`(Qlx[A-Za-z0-9]*[*]?)`");
+  static const std::regex name("`(Qlx[A-Za-z0-9*]*)`");
   std::set<std::string> names;
   for (std::string line; std::getline(in, line);) {
     if (!line.starts_with("| ")) continue;
@@ -39,8 +42,18 @@ std::set<std::string> modules() {
   return names;
 }
 
+// Some stand there by a part of their names.
+bool isIn(const std::set<std::string> &names, const std::string &module) {
+  return std::any_of(names.begin(), names.end(), [&](const std::string &name) {
+    return fnmatch(name.c_str(), module.c_str(), 0) == 0;
+  });
+}
+
 TEST(ArchitecturePageTest, HasEveryModuleInItsTableAndNoOther) {
-  EXPECT_EQ(namesOfTheTable(), modules());
+  const std::set<std::string> names = namesOfTheTable(), there = modules();
+  for (const std::string &module : there) EXPECT_TRUE(isIn(names, module)) << module;
+  for (const std::string &name : names)
+    EXPECT_TRUE(there.contains(name) || name.find('*') != name.npos) << name;
 }
 
 // Headers of the project that are included with their folder, or stand beside the source.

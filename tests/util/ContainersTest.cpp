@@ -184,37 +184,52 @@ struct Answers {
   std::string given, refused;
 };
 
-// Calls each function that takes the lock when it is public, but `free` and `sort`.
 template <typename Api>
-Answers callEach(typename Api::Head *container, Elements<Api> &elements) {
-  Answers answers;
-  auto *node = container->head;
-  typename Api::Head *const made = Api::alloc();
-  answers.note("alloc", made);
-  if (made) Api::free(made);
+void makeEach(typename Api::Head *container, Elements<Api> &elements, Answers &answers) {
+  const auto noteMade = [&](const char *function, typename Api::Head *made) {
+    answers.note(function, made);
+    if (made) Api::free(made);
+  };
+  noteMade("alloc", Api::alloc());
+  if constexpr (requires { Api::copy; }) noteMade("copy", Api::copy(container));
+  answers.note("insert", insert<Api>(container, elements, 2));
+}
+
+template <typename Api>
+void lookUpEach(typename Api::Head *map, Elements<Api> &elements, Answers &answers) {
+  auto *const found = Api::get(map, kKeys[0]);
+  answers.note("get", found);
+  elements.discard(found);
+  answers.note("hasKey", Api::hasKey(map, kKeys[0]));
+  answers.note("getKey", OwnedStr{Api::getKey(map->head)} != nullptr);
+}
+
+template <typename Api>
+void iterateEach(typename Api::Head *container, Elements<Api> &elements, Answers &answers) {
   answers.note("iterator", Api::iterator(container));
-  answers.note("hasNext", Api::hasNext(node));
-  answers.note("next", Api::next(node));
-  auto *const handed = handOut<Api>(node);
+  answers.note("hasNext", Api::hasNext(container->head));
+  answers.note("next", Api::next(container->head));
+  auto *const handed = handOut<Api>(container->head);
   answers.note("handOut", handed);
   elements.discard(handed);
-  answers.note("insert", insert<Api>(container, elements, 2));
-  if constexpr (requires { Api::copy; }) {
-    typename Api::Head *const copy = Api::copy(container);
-    answers.note("copy", copy);
-    if (copy) Api::free(copy);
-  }
-  if constexpr (kHasKeys<Api>) {
-    auto *const found = Api::get(container, kKeys[0]);
-    answers.note("get", found);
-    elements.discard(found);
-    answers.note("hasKey", Api::hasKey(container, kKeys[0]));
-    answers.note("getKey", OwnedStr{Api::getKey(node)} != nullptr);
-  }
+}
+
+template <typename Api>
+void removeEach(typename Api::Head *container, Elements<Api> &elements, Answers &answers) {
   if constexpr (requires { Api::rem; })
     answers.note("rem", shrinks(container, [&] { Api::rem(container, idOf<Api>(elements, 0)); }));
   if constexpr (requires { Api::iterRem; })
     answers.note("iterRem", shrinks(container, [&] { Api::iterRem(container->head); }));
+}
+
+// Calls each function that takes the lock when it is public, but `free` and `sort`.
+template <typename Api>
+Answers callEach(typename Api::Head *container, Elements<Api> &elements) {
+  Answers answers;
+  makeEach<Api>(container, elements, answers);
+  iterateEach<Api>(container, elements, answers);
+  if constexpr (kHasKeys<Api>) lookUpEach<Api>(container, elements, answers);
+  removeEach<Api>(container, elements, answers);
   return answers;
 }
 

@@ -1,5 +1,7 @@
 #include "object/QlxObjClass.h"
 
+#include <qlx/memory.h>
+
 #include "object/QlxLocked.h"
 #include "support/BuiltInClasses.h"
 #include "support/FailingMemory.h"
@@ -214,6 +216,34 @@ TEST_F(ObjClassTest, TheFirstRegistrationOfANameStays) {
   EXPECT_EQ(first->op1.fProcess, process);
   EXPECT_EQ(first->fAllocVars, nullptr);
   EXPECT_EQ(joined(QlxGetLoggerClasses()).find("twice"), std::string::npos);
+}
+
+// Registers a host's copy of a record of the library under a name of its own.
+static ObjClass *addCopyOf(const char *name) {
+  const ApiLock lock;
+  auto *copy = static_cast<ObjClass *>(OslMemoryMalloc(sizeof(ObjClass)));
+  *copy = *qlxToolkitGetClassDef(name);
+  copy->name = OslStringDup("copy");
+  qlxToolkitAddClassDef("copy", copy);
+  return copy;
+}
+
+TEST_F(ObjClassTest, ACopyOfARecordOfTheLibraryIsItsHosts) {
+  ASSERT_NE(find("qlx_filehandler")->own, nullptr);
+  const ObjClass *copy = addCopyOf("qlx_filehandler");
+  EXPECT_EQ(find("copy"), copy);
+  EXPECT_EQ(copy->own, nullptr);
+}
+
+TEST_F(ObjClassTest, ARecordOfTheLibraryStaysItsOwnUnderAnotherName) {
+  ObjClass *known = find("qlx_filehandler");
+  const QlxOwnClass *own = known->own;
+  {
+    const ApiLock lock;
+    qlxToolkitAddClassDef("alias", known);
+  }
+  EXPECT_EQ(find("alias"), known);
+  EXPECT_EQ(known->own, own);
 }
 
 TEST_F(ObjClassTest, NamesAreToldApartByCase) {

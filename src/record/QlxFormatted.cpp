@@ -51,8 +51,9 @@ bool FormattedBytes::formatByHosts(QlxObject *formatter, Event *event, va_list *
   if (!objClass->op1.fFormat) return false;
   const OwnedUStr text{
       qlxCall({objClass, "fFormat"}, objClass->op1.fFormat, formatter, event, args)};
-  if (text) narrow({text.get(), cxUnitsLength(text.get())});
-  return text != nullptr;
+  if (!text) return qlxMissedMemory(event);
+  narrow({text.get(), cxUnitsLength(text.get())});
+  return true;
 }
 
 // The text ends with a terminator.

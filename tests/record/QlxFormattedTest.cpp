@@ -17,6 +17,7 @@
 #include <qlx/class/object.h>
 
 #include "support/ChainTest.h"
+#include "support/FailingMemory.h"
 #include "support/IcuDefaults.h"
 #include "support/Take.h"
 #include "util/CxOwned.h"
@@ -276,6 +277,46 @@ TEST_F(FormattedTest, AsksAHostsFormatter) {
   formatter->silent = true;
   EXPECT_EQ(bytes(event.get()), kNothing);
   EXPECT_EQ(wide(event.get()), kNothing);
+}
+
+UChar *formatOwn(QlxObject *, Event *, va_list *) {
+  return CxUStringDup(u"of the host's formatter");
+}
+
+TEST_F(FormattedTest, AsksAFormatterOfAHostsCopyOfTheLibrarysRecord) {
+  {
+    const ApiLock lock;
+    auto *copy = static_cast<ObjClass *>(OslMemoryMalloc(sizeof(ObjClass)));
+    *copy = *qlxToolkitGetClassDef("qlx_basicformatter");
+    copy->name = OslStringDup("test_copy");
+    copy->op1.fFormat = formatOwn;
+    qlxToolkitAddClassDef("test_copy", copy);
+  }
+  const Handle own = get("copy", "test_copy");
+  QlxHandlerSetFormatter(handler.get(), own.get());
+  const EventPtr event = eventOf(u"text");
+  EXPECT_EQ(bytes(event.get()), "of the host's formatter");
+  EXPECT_EQ(wide(event.get()), "of the host's formatter");
+}
+
+TEST_F(FormattedTest, TellsThatTheLibrarysOperationHadNoMemoryInAHostsClass) {
+  QlxAddUFormatterClass("test_xml", nullptr, QlxPDXMLFormatterFAllocVars,
+                        QlxPDXMLFormatterFFreeVars, nullptr, QlxPDXMLUFormatterFFormat, nullptr,
+                        nullptr, nullptr);
+  const Handle own = get("xml", "test_xml");
+  QlxHandlerSetFormatter(handler.get(), own.get());
+  int lost = 0;
+  for (uint64_t nth = 1, failures = 1; failures > 0; ++nth) {
+    const EventPtr event = eventOf(u"text");
+    const ApiLock lock;
+    FailingMemory memory;
+    memory.failOnce(nth);
+    FormattedBytes text;
+    EXPECT_TRUE(text.format(handler.get(), event.get(), nullptr)) << nth;
+    lost += text.data() == nullptr;
+    failures = memory.failures();
+  }
+  EXPECT_GT(lost, 0);
 }
 
 TEST_F(FormattedTest, IsNothingWithoutAFormatter) {

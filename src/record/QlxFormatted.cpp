@@ -49,9 +49,10 @@ bool FormattedBytes::formatByOwn(QlxObject *formatter, Event *event, va_list *ar
 bool FormattedBytes::formatByHosts(QlxObject *formatter, Event *event, va_list *args) {
   const ObjClass *objClass = formatter->objClass;
   if (!objClass->op1.fFormat) return false;
+  const bool missedBefore = qlxMissedMemory(event);  // of another handler
   const OwnedUStr text{
       qlxCall({objClass, "fFormat"}, objClass->op1.fFormat, formatter, event, args)};
-  if (!text) return qlxMissedMemory(event);
+  if (!text) return !missedBefore && qlxMissedMemory(event);
   narrow({text.get(), cxUnitsLength(text.get())});
   return true;
 }

@@ -108,7 +108,7 @@ QlxLogResult logIdentifiedMessage() {
 
 template <QlxLogResult (*Log)()>
 void logs(benchmark::State &state) {
-  for (auto _ : state) {
+  for ([[maybe_unused]] auto _ : state) {
     if (Log().statusKind != '-') state.SkipWithError("a record was not written");
   }
 }
@@ -126,14 +126,14 @@ void writesTheSameBytes(benchmark::State &state) {
   }
   const std::string path = gHost->path() + ".floor";
   const int fd = open(path.c_str(), O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0600);
-  for (auto _ : state) {
+  for ([[maybe_unused]] auto _ : state) {
     if (write(fd, record.data(), record.size()) < 0) state.SkipWithError("write failed");
   }
   close(fd);
 }
 
 void suppressed(benchmark::State &state) {
-  for (auto _ : state) {
+  for ([[maybe_unused]] auto _ : state) {
     benchmark::DoNotOptimize(QlxLogDebugMax(gHost->logger(), "transfer.c", "run", 42, kText));
   }
 }

@@ -13,7 +13,7 @@ jobs=$(nproc)
 build_packages=(g++ cmake ninja-build pkg-config libicu-dev icu-devtools libcli11-dev
                 libgtest-dev libbenchmark-dev)
 # What .ci/run needs beyond that.
-check_packages=(clang libclang-rt-14-dev llvm clang-format python3)
+check_packages=(clang libclang-rt-14-dev llvm clang-format clang-tidy python3)
 
 fail() {
   echo "$me: $*" >&2

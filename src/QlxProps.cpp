@@ -22,7 +22,7 @@ uint8_t qlxPropStrToBool(const char *value, uint8_t *ok) {
 
 char qlxPropStrToChar(const char *value, uint8_t *ok) {
   report(ok, value != nullptr);
-  return value ? *value : 0;
+  return value ? *value : '\0';
 }
 
 // Success is that exactly one value was converted: what follows it does not matter.
@@ -107,7 +107,7 @@ static void setParm(StringToStringMap *map, const char *key, const Parm &parm) {
     return Convert(qlxPeekMapProp(map, key), ok);                                  \
   }                                                                                \
   void QlxSetMapProp##Name(StringToStringMap *map, const char *key, Type value) {  \
-    setParm(map, key, Parm{.type = Code, .value = {.member = value}});             \
+    setParm(map, key, Parm{.type = (Code), .value = {.member = value}});           \
   }
 
 QLX_MAP_PROPERTY(Char, char, qlxPropStrToChar, ParmChar, c)

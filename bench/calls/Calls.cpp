@@ -88,7 +88,7 @@ Calls recordUsual(QlxObject *logger) {
 }
 
 void print(const Calls &calls) {
-  Dl_info library;
+  Dl_info library = {};
   for (const Call &call : calls) {
     if (!dladdr(call.function, &library)) fail("a function of no library");
     printf("%d %#tx\n", call.depth,

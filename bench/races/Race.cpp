@@ -222,7 +222,7 @@ void checkEachIsWritten(const Field &field, const Row &row, const std::string &f
 constexpr int64_t kRollingRecords = 10'000;  // about 1.5 MB
 
 void logRolling(const Field &field, const Row &row, const std::string &folder) {
-  const Setup setup = setupOf(row, folder, 256 * 1024, 11);
+  const Setup setup = setupOf(row, folder, kMiB / 4, 11);
   field.withLogger(setup, row.call, [&](const Log &log) { log(kRollingRecords); });
 }
 
@@ -280,6 +280,7 @@ int64_t elapsed(const Meeting &meeting, int workers) {
 void runThreads(Meeting *meeting, int threads, int64_t each, const Log &log) {
   if (threads == 1) return work(meeting, 0, each, log);
   std::vector<std::thread> workers;
+  workers.reserve(threads);
   for (int i = 0; i < threads; i++) workers.emplace_back(work, meeting, i, each, log);
   for (std::thread &worker : workers) worker.join();
 }
@@ -288,7 +289,7 @@ int workersOf(const Row &row) {
   return row.threads * row.processes;
 }
 int64_t recordsOfEach(const Row &row, double scale) {
-  const int64_t all = row.records * std::min(scale, 1.0);
+  const auto all = static_cast<int64_t>(static_cast<double>(row.records) * std::min(scale, 1.0));
   return std::max(all, row.least) / workersOf(row);
 }
 int64_t warmUpOf(int64_t each) {
@@ -309,9 +310,9 @@ void report(const Field &field, const Row &row, const std::string &folder, int64
   // Three generations cannot keep all, which is not a loss.
   const int64_t lost = row.name == "rolling" ? 0 : logged - count.records;
   const std::string wrong = field.rolls ? checkGenerations(row, folder) : "";
-  printf("%s\t%s\t%.2f\t%jd\t%jd\t%jd\t%s\n", field.name, row.name.data(), nanoseconds / timed,
-         static_cast<intmax_t>(logged), static_cast<intmax_t>(lost),
-         static_cast<intmax_t>(count.malformed), wrong.c_str());
+  printf("%s\t%s\t%.2f\t%jd\t%jd\t%jd\t%s\n", field.name, row.name.data(),
+         nanoseconds / static_cast<double>(timed), static_cast<intmax_t>(logged),
+         static_cast<intmax_t>(lost), static_cast<intmax_t>(count.malformed), wrong.c_str());
 }
 
 // Every process opens a logger of its own, warms it up, and waits for the others.
@@ -343,6 +344,7 @@ void race(const Field &field, const Row &row, const std::string &folder, double 
   int meetingFile;
   const Meeting *meeting = openMeeting(workersOf(row), meetingFile);
   std::vector<pid_t> children;
+  children.reserve(row.processes);
   for (int i = 0; i < row.processes; i++) {
     children.push_back(start({"--work", name, folder, std::to_string(scale), std::to_string(i),
                               std::to_string(meetingFile)}));

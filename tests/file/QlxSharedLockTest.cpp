@@ -34,7 +34,7 @@ class SharedLockTest : public ::testing::Test {
   }
 
   // Adds 1 without regard to anything, as another program may.
-  void raise() { semctl(vars.semId, 0, SETVAL, static_cast<unsigned long>(key.value() + 1)); }
+  void raise() { semctl(vars.semId, 0, SETVAL, static_cast<unsigned long>(key.value()) + 1); }
 
   SemaphoreKey key;
   SystemCalls calls;

@@ -40,7 +40,7 @@ static constexpr const char *kLocales[] = {"en", "de_CH", "hi", "ar_EG", "bn", "
 
 static void change(icu::DecimalFormat *format, Input *input) {
   format->setMaximumFractionDigits(input->take<uint8_t>() % 9);
-  format->setGroupingUsed(input->take<uint8_t>() % 4 != 0);
+  format->setGroupingUsed(static_cast<UBool>(input->take<uint8_t>() % 4 != 0));
   format->setGroupingSize(input->take<uint8_t>() % 10);
   format->setSecondaryGroupingSize(input->take<uint8_t>() % 10);
   format->setMinimumGroupingDigits(input->take<uint8_t>() % 10);

@@ -61,8 +61,8 @@ constexpr const char *kValues[] = {
     "",
     "value",
     "a value with blanks",
-    "gr\xc3\xb6\xc3\x9f"
-    "e",
+    ("gr\xc3\xb6\xc3\x9f"
+     "e"),
     "\xff\xfe",
     "-7",
     "42",

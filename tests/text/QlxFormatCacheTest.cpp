@@ -232,9 +232,9 @@ const char *const kDatePatterns[] = {
     "HH P ss.SSS",
     "ss.SSS P",
     "HH\xC3\xA9SSS",
-    "EEEEEEE MMMMM "
-    "yyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyy"
-    "'a text that makes the date longer than one hundred and thirty-six units of text' ss.SSS",
+    ("EEEEEEE MMMMM "
+     "yyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyyy"
+     "'a text that makes the date longer than one hundred and thirty-six units of text' ss.SSS"),
 };
 
 const double kTimes[] = {0,

@@ -76,8 +76,8 @@ const double kValues[] = {0.0,
                           4503599627370495.5,
                           std::nan(""),
                           -std::nan(""),
-                          INFINITY,
-                          -INFINITY};
+                          HUGE_VAL,
+                          -HUGE_VAL};
 
 using Append = uint8_t (*)(CxUStringBuff *, double);
 

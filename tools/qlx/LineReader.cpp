@@ -37,7 +37,7 @@ void LineReader::decode(std::u16string &line, size_t count, bool isLineEnd) {
     UChar *target = line.data() + length;
     status = U_ZERO_ERROR;
     ucnv_toUnicode(converter_.getAlias(), &target, line.data() + line.size(), &source, sourceEnd,
-                   nullptr, isLineEnd, &status);
+                   nullptr, static_cast<UBool>(isLineEnd), &status);
     line.resize(target - line.data());
   } while (status == U_BUFFER_OVERFLOW_ERROR);
 }

@@ -25,6 +25,6 @@ void Progress::update(uint64_t bytesRead) {
           name_.c_str(), records_);
 }
 
-void Progress::finish() {
+void Progress::finish() const {
   if (totalBytes_ != 0) fputs("\r\033[K", stderr);
 }

@@ -16,7 +16,7 @@ class Progress {
   void update(uint64_t bytesRead);
 
   // Clears the line.
-  void finish();
+  void finish() const;
 
  private:
   using Clock = std::chrono::steady_clock;

@@ -17,7 +17,7 @@
 
 std::string platformErrorText(CxStatus status) {
   char *text = QlxGetPlatformErrStr(status);
-  const std::string result = text ? text : "error " + std::to_string(status.code);
+  std::string result = text ? text : "error " + std::to_string(status.code);
   OslMemoryFree(text);
   return result;
 }

@@ -21,6 +21,9 @@ void qlxIntlHandlerSetFormatter(QlxObject *handler, QlxObject *formatter) {
   qlxIntlReleaseObject(old);
 }
 
+// ---- The formatter's operations. One of them may give the handler another formatter: the one that
+// it belongs to is kept until it is done.
+
 // The class of the handler's formatter, or null.
 static const ObjClass *formatterClass(const QlxObject *handler) {
   if (!isKind(handler, Handler) || !isKind(handler->kind2.formatter, Formatter)) return nullptr;
@@ -30,18 +33,21 @@ static const ObjClass *formatterClass(const QlxObject *handler) {
 char *qlxIntlHandlerGetFmtHeader(QlxObject *handler) {
   const ObjClass *formatter = formatterClass(handler);
   if (!formatter || !formatter->op2.fGetHeader) return nullptr;
+  const KeptObject kept{handler->kind2.formatter};
   return qlxCall({formatter, "fGetHeader"}, formatter->op2.fGetHeader, handler->kind2.formatter);
 }
 
 char *qlxIntlHandlerGetFmtTrailer(QlxObject *handler) {
   const ObjClass *formatter = formatterClass(handler);
   if (!formatter || !formatter->op3.fGetTrailer) return nullptr;
+  const KeptObject kept{handler->kind2.formatter};
   return qlxCall({formatter, "fGetTrailer"}, formatter->op3.fGetTrailer, handler->kind2.formatter);
 }
 
 UChar *qlxIntlUHandlerDoFmt(QlxObject *handler, Event *event, va_list *args) {
   const ObjClass *formatter = formatterClass(handler);
   if (!formatter || !formatter->op1.fFormat) return nullptr;
+  const KeptObject kept{handler->kind2.formatter};
   return qlxCall({formatter, "fFormat"}, formatter->op1.fFormat, handler->kind2.formatter, event,
                  args);
 }

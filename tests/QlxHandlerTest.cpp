@@ -1,3 +1,4 @@
+#include "record/QlxFormatted.h"
 #include "support/ChainTest.h"
 
 namespace {
@@ -89,6 +90,43 @@ TEST_F(HandlerTest, GivesItsFormattersHeaderTrailerAndText) {
   EXPECT_EQ(std::u16string(text ? text : u"<null>"), u"body\n");
   OslMemoryFree(text);
   QlxFreeEvent(event);
+}
+
+// Operations of a formatter that takes itself from its handler, and then looks at itself.
+QlxObject *gHandler;
+std::string gNames;
+void leave(QlxObject *formatter) {
+  qlxIntlHandlerSetFormatter(gHandler, nullptr);
+  gNames += formatter->objClass ? std::string(formatter->name) + " " : "gone ";
+}
+
+TEST_F(HandlerTest, KeepsAFormatterWhoseOperationsTakeItAwayUntilTheyAreDone) {
+  QlxAddUFormatterClass(
+      "test_leaving", nullptr, nullptr, nullptr, nullptr,
+      [](QlxObject *formatter, Event *, va_list *) { return leave(formatter), CxUStringDup(u""); },
+      [](QlxObject *formatter) { return leave(formatter), OslStringDup(""); },
+      [](QlxObject *formatter) { return leave(formatter), OslStringDup(""); }, nullptr);
+  gHandler = handler.get();
+  gNames.clear();
+  const auto set = [this] {
+    const Handle leaving = get("leaving", "test_leaving");
+    QlxHandlerSetFormatter(handler.get(), leaving.get());
+  };
+  set();
+  take(QlxHandlerGetFmtHeader(handler.get()));
+  set();
+  take(QlxHandlerGetFmtTrailer(handler.get()));
+  set();
+  OslMemoryFree(QlxUHandlerDoFmt(handler.get(), nullptr, nullptr));
+  set();
+  {
+    const ApiLock lock;
+    Event *event = QlxVaAllocUEvent(INFO, nullptr, nullptr, u"");
+    FormattedBytes text;
+    EXPECT_TRUE(text.format(handler.get(), event, nullptr));
+    QlxFreeEvent(event);
+  }
+  EXPECT_EQ(gNames, "leaving leaving leaving leaving ");
 }
 
 TEST_F(HandlerTest, GivesNothingWithoutAFormatter) {

@@ -4,9 +4,9 @@
 
 #include "QlxCachedBuffer.h"
 #include "QlxEvent.h"
+#include "QlxObject.h"
 #include "QlxRecordText.h"
 #include "object/QlxObjClass.h"
-#include "object/QlxObjectFields.h"
 #include "object/QlxOperation.h"
 #include "util/CxUString.h"
 #include "util/CxUnits.h"
@@ -23,6 +23,7 @@ UChar *qlxFormatNew(QlxObject *formatter, Event *event, va_list *args,
 bool FormattedBytes::format(const QlxObject *handler, Event *event, va_list *args) {
   QlxObject *formatter = isKind(handler, Handler) ? handler->kind2.formatter : nullptr;
   if (!isKind(formatter, Formatter)) return false;
+  const KeptObject kept{formatter};  // an operation may give the handler another one
   const QlxOwnClass *own = formatter->objClass->own;
   return own ? formatByOwn(formatter, event, args) : formatByHosts(formatter, event, args);
 }

@@ -34,8 +34,8 @@ QLX_API ObjClass *qlxToolkitGetClassDef(const char *className);
  * Registers a class record under a name, its own or another; under several by several calls. The
  * registry owns it from then on. The first record of a name stays. One that is refused, as the name
  * is taken or null or memory ran out, is freed unless it is registered under another name. A null
- * record is ignored. A record that a host makes may be a copy of a registered one: its `own` becomes
- * null here, so that its operations are the host's.
+ * record is ignored. A record that a host makes may be a copy of a registered one: its `own`
+ * becomes null here, so that its operations are the host's.
  */
 QLX_API void qlxToolkitAddClassDef(const char *className, ObjClass *objClass);
 

@@ -24,8 +24,8 @@ struct EventValues {
 
 QLX_BEGIN_DECLS
 
-// The key is not null.
-EventKey qlxEventKeyOf(const char *key);
+// The text is not null.
+EventKey qlxEventKeyOf(const char *text);
 
 QLX_END_DECLS
 

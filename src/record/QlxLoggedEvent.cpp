@@ -29,7 +29,7 @@ using Nodes = QlxMapTemplate<PropertyElements>::Nodes;
 }  // namespace
 
 // A block of an unusual size is not cached for all that come after it.
-static constexpr size_t kMaxCachedBytes = 64 * 1024;
+static constexpr size_t kMaxCachedBytes = size_t{64} * 1024;
 static constexpr int kMaxCachedNodes = 32;
 
 // Of the last event, emptied. All null while its successor is on its way: a log call that a class's

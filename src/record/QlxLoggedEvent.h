@@ -31,7 +31,7 @@ void qlxSettleNotedEvent(void);
 
 // Sets a property of a settled event as QlxSetEventProp() does, in a cached block where there is
 // one. When memory runs out, the event's status tells it.
-void qlxStampEvent(Event *event, EventKey key, std::string_view value);
+void qlxStampEvent(Event *event, EventKey which, std::string_view value);
 void qlxStampEventInt(Event *event, EventKey key, int32_t value);
 
 // Sets the message identifier of an event that has none, in the same way; without memory the event
